@@ -1,0 +1,48 @@
+#include "app/CCommandLine.h"
+
+#include "app/TavVersion.h"
+
+bool CCommandLine::Parse(const std::vector<std::string>& arguments_I) {
+  for (size_t i = 0; i < arguments_I.size(); ++i) {
+    const std::string& argument = arguments_I[i];
+    if (argument == "--help" || argument == "-h") {
+      mHelp = true;
+    } else if (argument == "--version") {
+      mVersion = true;
+    } else if (argument == "--verbose" || argument == "-v") {
+      mVerbose = true;
+    } else if (argument == "--log") {
+      if (i + 1 >= arguments_I.size()) {
+        mError = "--log needs a file name";
+        return false;
+      }
+      mLogFile = arguments_I[++i];
+    } else if (argument.rfind("--", 0) == 0) {
+      mError = "unknown option " + argument;
+      return false;
+    } else {
+      mUpdaterArguments.push_back(argument);
+    }
+  }
+  return true;
+}
+
+std::string CCommandLine::HelpText() {
+  return std::string("Usage: ") + TAV_PROGRAM_NAME +
+         " [options] [-p FILE] [-t FILE] [-b FILE] [-s FILE] [-f CONFIG]\n"
+         "\n"
+         "Updates the firmware of a pen tablet or pen display.\n"
+         "\n"
+         "Board arguments, one update each, in the given order:\n"
+         "  -p VALUE      update the pen controller\n"
+         "  -t VALUE      update the touch controller\n"
+         "  -b VALUE      update the Bluetooth module\n"
+         "  -s VALUE      update the display scalar\n"
+         "  -f CONFIG     path of the device configuration (fw_loader.ini)\n"
+         "\n"
+         "Options:\n"
+         "  -h, --help    show this text and exit\n"
+         "      --version show the version and exit\n"
+         "  -v, --verbose write log lines to standard error\n"
+         "      --log FILE  append log lines to FILE\n";
+}

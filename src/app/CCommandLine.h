@@ -1,0 +1,30 @@
+#pragma once
+// The program's own options, taken off the command line before the
+// updater reads its board arguments (-p, -t, -b, -s, -f).
+
+#include <string>
+#include <vector>
+
+class CCommandLine {
+ public:
+  // Returns false with an error text when an option is malformed.
+  bool Parse(const std::vector<std::string>& arguments_I);
+
+  bool GetHelp() const { return mHelp; }
+  bool GetVersion() const { return mVersion; }
+  bool GetVerbose() const { return mVerbose; }
+  const std::string& GetLogFile() const { return mLogFile; }
+  const std::string& GetError() const { return mError; }
+  // What is left for the updater, in order.
+  const std::vector<std::string>& GetUpdaterArguments() const { return mUpdaterArguments; }
+
+  static std::string HelpText();
+
+ private:
+  bool mHelp = false;
+  bool mVersion = false;
+  bool mVerbose = false;
+  std::string mLogFile;
+  std::string mError;
+  std::vector<std::string> mUpdaterArguments;
+};

@@ -1,0 +1,37 @@
+#include <cstdio>
+#include <string>
+#include <vector>
+
+#include "app/CCommandLine.h"
+#include "app/CLogOutputs.h"
+#include "app/TavVersion.h"
+#include "common/TavLog.h"
+
+int main(int argc, char** argv) {
+  CCommandLine commandLine;
+  if (!commandLine.Parse(std::vector<std::string>(argv + 1, argv + argc))) {
+    std::fprintf(stderr, "%s: %s\n", TAV_PROGRAM_NAME, commandLine.GetError().c_str());
+    std::fputs(CCommandLine::HelpText().c_str(), stderr);
+    return 1;
+  }
+  if (commandLine.GetHelp()) {
+    std::fputs(CCommandLine::HelpText().c_str(), stdout);
+    return 0;
+  }
+  if (commandLine.GetVersion()) {
+    std::printf("%s %s\n", TAV_PROGRAM_NAME, TAV_PROGRAM_VERSION);
+    return 0;
+  }
+
+  CLogOutputs logOutputs;
+  if (commandLine.GetVerbose()) logOutputs.AttachStandardError();
+  if (!commandLine.GetLogFile().empty() && !logOutputs.AttachFile(commandLine.GetLogFile())) {
+    std::fprintf(stderr, "%s: cannot open log file %s\n", TAV_PROGRAM_NAME,
+                 commandLine.GetLogFile().c_str());
+    return 1;
+  }
+  TavLog::Info("%s %s starting\n", TAV_PROGRAM_NAME, TAV_PROGRAM_VERSION);
+
+  std::fputs("No update can run yet: the updater is not built in this version.\n", stderr);
+  return 0;
+}

@@ -1,0 +1,52 @@
+#include "common/CSteadyClock.h"
+
+#include <chrono>
+
+namespace {
+using Seconds = std::chrono::duration<double>;
+}
+
+CSteadyClock::~CSteadyClock() {
+  {
+    std::lock_guard<std::mutex> guard(mLock);
+    mStopping = true;
+    mQueue.Clear();
+  }
+  mWake.notify_all();
+  if (mTimer.joinable()) mTimer.join();
+}
+
+void CSteadyClock::Sleep(double seconds_I) {
+  if (seconds_I > 0) std::this_thread::sleep_for(Seconds(seconds_I));
+}
+
+double CSteadyClock::Now() const {
+  return Seconds(std::chrono::steady_clock::now().time_since_epoch()).count();
+}
+
+void CSteadyClock::Schedule(double delay_I, std::function<void()> task_I) {
+  std::lock_guard<std::mutex> guard(mLock);
+  if (mStopping) return;
+  mQueue.Push(Now() + delay_I, std::move(task_I));
+  if (!mTimer.joinable()) mTimer = std::thread([this] { RunTimer(); });
+  mWake.notify_all();
+}
+
+void CSteadyClock::RunTimer() {
+  std::unique_lock<std::mutex> lock(mLock);
+  while (!mStopping) {
+    if (mQueue.Empty()) {
+      mWake.wait(lock);
+      continue;
+    }
+    const double wait = mQueue.NextDue() - Now();
+    if (wait > 0) {
+      mWake.wait_for(lock, Seconds(wait));
+      continue;
+    }
+    std::function<void()> task = mQueue.Pop();
+    lock.unlock();
+    task();
+    lock.lock();
+  }
+}

@@ -1,0 +1,63 @@
+#include "common/CVirtualClock.h"
+
+#include <algorithm>
+
+CVirtualClock::CVirtualClock() : mWorker([this] { RunTasks(); }) {}
+
+CVirtualClock::~CVirtualClock() {
+  {
+    std::lock_guard<std::mutex> guard(mLock);
+    mStopping = true;
+    mQueue.Clear();
+  }
+  mWake.notify_all();
+  mIdle.notify_all();
+  mWorker.join();
+}
+
+bool CVirtualClock::HasDueTask() const { return !mQueue.Empty() && mQueue.NextDue() <= mNow; }
+
+void CVirtualClock::Sleep(double seconds_I) {
+  std::unique_lock<std::mutex> lock(mLock);
+  mTotalSlept += std::max(0.0, seconds_I);
+  mNow += std::max(0.0, seconds_I);
+  // A task that sleeps only moves time; it must not wait for itself.
+  if (std::this_thread::get_id() == mWorker.get_id()) return;
+  mWake.notify_all();
+  mIdle.wait(lock, [this] { return mStopping || (!mRunning && !HasDueTask()); });
+  lock.unlock();
+  // Give threads woken by the tasks a chance to run before the next poll.
+  std::this_thread::yield();
+}
+
+double CVirtualClock::Now() const {
+  std::lock_guard<std::mutex> guard(mLock);
+  return mNow;
+}
+
+double CVirtualClock::GetTotalSlept() const {
+  std::lock_guard<std::mutex> guard(mLock);
+  return mTotalSlept;
+}
+
+void CVirtualClock::Schedule(double delay_I, std::function<void()> task_I) {
+  std::lock_guard<std::mutex> guard(mLock);
+  if (mStopping) return;
+  mQueue.Push(mNow + std::max(0.0, delay_I), std::move(task_I));
+  mWake.notify_all();
+}
+
+void CVirtualClock::RunTasks() {
+  std::unique_lock<std::mutex> lock(mLock);
+  while (true) {
+    mWake.wait(lock, [this] { return mStopping || HasDueTask(); });
+    if (mStopping) return;
+    std::function<void()> task = mQueue.Pop();
+    mRunning = true;
+    lock.unlock();
+    task();
+    lock.lock();
+    mRunning = false;
+    mIdle.notify_all();
+  }
+}
