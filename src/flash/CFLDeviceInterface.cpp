@@ -129,6 +129,11 @@ std::string CFLDeviceInterface::ToString() const {
   return text;
 }
 
+std::string CFLDeviceInterface::PathFromInfo(const DeviceInfo& info_I) {
+  return Dec(info_I.vendorId) + ":" + Dec(info_I.productId) + ":" + Dec(info_I.locationId) + ":" +
+         Dec(info_I.usage) + ":" + Dec(info_I.usagePage);
+}
+
 void CFLDeviceInterface::ReportLog(const std::string& text_I) {
   if (mCallback != nullptr) {
     mCallback->InterfaceLog(text_I);

@@ -147,6 +147,10 @@ class CFLDeviceInterface {
   // Pen and touch S-record files have only their first 39 blocks summed.
   virtual bool ValidBlockIndex(uint32_t index_I) const;
 
+  // The interface path of a DeviceInfo: its five numbers in decimal,
+  // joined by ":".
+  static std::string PathFromInfo(const DeviceInfo& info_I);
+
   void ReportLog(const std::string& text_I);
   void ReportError(const std::string& text_I);
   void ReportProgress(uint32_t percent_I);

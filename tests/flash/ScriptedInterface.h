@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "flash/CFLDeviceInterface.h"
+#include "support/RecordingNotifier.h"
 
 class ScriptedInterface : public CFLDeviceInterface {
  public:
@@ -47,28 +48,4 @@ class ScriptedInterface : public CFLDeviceInterface {
   std::vector<std::vector<uint8_t>> writes;
   std::vector<std::vector<uint8_t>> reads;
   int opens = 0;
-};
-
-// A notifier that keeps what it hears.
-class RecordingNotifier : public CInterfaceNotifier {
- public:
-  void InterfaceLog(const std::string& text_I) override { logs.push_back(text_I); }
-  void InterfaceError(const std::string& text_I) override { errors.push_back(text_I); }
-  void InterfaceProgress(unsigned int percent_I) override { progress.push_back(percent_I); }
-
-  bool Logged(const std::string& part_I) const {
-    for (const std::string& line : logs) {
-      if (line.find(part_I) != std::string::npos) return true;
-    }
-    return false;
-  }
-  size_t CountLogged(const std::string& part_I) const {
-    size_t count = 0;
-    for (const std::string& line : logs) count += line.find(part_I) != std::string::npos;
-    return count;
-  }
-
-  std::vector<std::string> logs;
-  std::vector<std::string> errors;
-  std::vector<unsigned int> progress;
 };
