@@ -32,7 +32,9 @@ struct SLabI2CDescription {
   uint16_t productId = 0x0331;
   uint16_t release = 0x0100;
   std::pair<uint16_t, uint16_t> usage{0xFF00, 0x00B0};
-  std::vector<SLabFlashLayout> cpus{SLabFlashLayout::Uniform(0x00000000, 1024, 40, 1, 128)};
+  // The tunnel carries at most 261 bytes, so the flash descriptor (10 bytes
+  // a block and the id) allows at most 26 blocks behind it.
+  std::vector<SLabFlashLayout> cpus{SLabFlashLayout::Uniform(0x00000000, 1024, 24, 1, 128)};
   uint16_t deviceInfo = 0x0331;
 };
 

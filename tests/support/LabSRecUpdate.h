@@ -81,7 +81,7 @@ class LabSRecUpdate {
     }
     loader->SwitchFromBLMode(true);
     loader->Close();
-    result.backToNormal = nonBL ? IsListed(mNormal) : WaitFor(mNormal);
+    result.backToNormal = (nonBL && IsListed(mNormal)) || WaitFor(mNormal);
     return result;
   }
 
