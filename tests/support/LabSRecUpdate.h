@@ -4,6 +4,7 @@
 // attach, Init, ProgramBoard, switch back and wait for normal mode. Used by
 // the end-to-end tests, the interruption campaign and the benchmark.
 
+#include <functional>
 #include <memory>
 #include <string>
 #include <vector>
@@ -30,6 +31,12 @@ class LabSRecUpdate {
   LabSRecUpdate(std::shared_ptr<CLabBus> bus_I, DeviceInfo normal_I, DeviceInfo loader_I)
       : mBus(std::move(bus_I)), mNormal(normal_I), mLoader(loader_I) {}
 
+  // Where the interfaces' HID nodes come from: the lab's by default.
+  void SetNodeFactory(std::function<std::unique_ptr<CHidNode>()> factory_I) {
+    mNodeFactory = std::move(factory_I);
+  }
+  // Runs after every one-second wait, as a device thread would see events.
+  void SetAfterWait(std::function<void()> afterWait_I) { mAfterWait = std::move(afterWait_I); }
   void SetProtocol(EFLProtocolType protocol_I) { mProtocol = protocol_I; }
   void SetFormat(EDataSourceFormat format_I) { mFormat = format_I; }
   RecordingNotifier& Notifier() { return mNotifier; }
@@ -45,14 +52,16 @@ class LabSRecUpdate {
   bool WaitFor(const DeviceInfo& info_I) const {
     for (int pass = 0; pass < 90; ++pass) {
       TavSleep(1.0);
+      if (mAfterWait) mAfterWait();
       if (IsListed(info_I)) return true;
     }
     return false;
   }
 
   std::unique_ptr<CLinuxHIDFLDeviceInterface> MakeInterface(const DeviceInfo& info_I) const {
-    return std::make_unique<CLinuxHIDFLDeviceInterface>(info_I,
-                                                        std::make_unique<CLabHidNode>(mBus));
+    std::unique_ptr<CHidNode> node =
+        mNodeFactory ? mNodeFactory() : std::make_unique<CLabHidNode>(mBus);
+    return std::make_unique<CLinuxHIDFLDeviceInterface>(info_I, std::move(node));
   }
 
   SResult Run(const std::vector<SContinuousDataBlock>& image_I) {
@@ -91,5 +100,7 @@ class LabSRecUpdate {
   DeviceInfo mLoader;
   EFLProtocolType mProtocol = EFL_PROTOCOL_LOADER;
   EDataSourceFormat mFormat = EDS_SREC_PEN;
+  std::function<std::unique_ptr<CHidNode>()> mNodeFactory;
+  std::function<void()> mAfterWait;
   RecordingNotifier mNotifier;
 };
