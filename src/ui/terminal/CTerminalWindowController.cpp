@@ -18,7 +18,8 @@ namespace {
 // Back to the line's start, then erase the whole line.
 constexpr const char* kRedrawLine = "\r\033[2K";
 constexpr int kDefaultColumns = 80;
-// The bar takes a quarter of the line, within these bounds.
+// The bar takes a sixth of the line, within these bounds, leaving room for
+// the longest status texts on an 80-column terminal.
 constexpr int kMinBarCells = 5;
 constexpr int kMaxBarCells = 30;
 // The plain form's bar, the same in every log.
@@ -239,7 +240,7 @@ bool CTerminalWindowController::IsMainLoopThread() const { return mLoop->IsLoopT
 
 void CTerminalWindowController::DrawStatusLine() {
   const int columns = GetColumns();
-  const int cells = std::clamp(columns / 4, kMinBarCells, kMaxBarCells);
+  const int cells = std::clamp(columns / 6, kMinBarCells, kMaxBarCells);
   std::string line = RenderBar(mProgress, cells) + " " + RenderPercent(mProgress);
   if (!mStatusText.empty()) line += " " + OneLine(mStatusText);
   // The last column stays free: writing into it makes some terminals wrap,

@@ -26,37 +26,37 @@ TEST(TerminalWindow, DrawsTheStatusLineInPlaceOnATerminal) {
   EXPECT_EQ(out.Take(), "");
 
   window->setStatusProgress(25);
-  EXPECT_EQ(out.Take(), kRedraw + "[#####...............]  25%");
+  EXPECT_EQ(out.Take(), kRedraw + "[###..........]  25%");
   window->setStatusProgress(25.9);  // same picture: not drawn again
   EXPECT_EQ(out.Take(), "");
 
   const std::string updating = "Updating, this may take several minutes";
   for (const char* dots : {".", "..", "..."}) {
     window->setStatusText(updating + dots);
-    EXPECT_EQ(out.Take(), kRedraw + "[#####...............]  25% " + updating + dots);
+    EXPECT_EQ(out.Take(), kRedraw + "[###..........]  25% " + updating + dots);
   }
   window->setStatusProgress(100);
-  EXPECT_EQ(out.Take(), kRedraw + "[####################] 100% " + updating + "...");
+  EXPECT_EQ(out.Take(), kRedraw + "[#############] 100% " + updating + "...");
   window->setStatusProgress(101);
   EXPECT_EQ(out.Take(), "");
   window->setStatusProgress(-5);
-  EXPECT_EQ(out.Take(), kRedraw + "[....................]   0% " + updating + "...");
+  EXPECT_EQ(out.Take(), kRedraw + "[.............]   0% " + updating + "...");
 
-  // 30 columns: a bar of 7 cells and 29 characters in all, cut between
+  // 30 columns: a bar of 5 cells and 29 characters in all, cut between
   // characters, not bytes.
   window->SetWidth(30);
   std::string umlauts;
-  for (int count = 0; count < 16; ++count) umlauts += "ä";
+  for (int count = 0; count < 20; ++count) umlauts += "ä";
   window->setStatusText(umlauts);
-  EXPECT_EQ(out.Take(), kRedraw + "[.......]   0% " + umlauts.substr(0, 14 * 2));
+  EXPECT_EQ(out.Take(), kRedraw + "[.....]   0% " + umlauts.substr(0, 16 * 2));
   window->setStatusText("a\tb\nc");
-  EXPECT_EQ(out.Take(), kRedraw + "[.......]   0% a b c");
+  EXPECT_EQ(out.Take(), kRedraw + "[.....]   0% a b c");
 
   // An alert starts below the status line; the line comes back afterwards.
   EXPECT_EQ(window->ShowAlert({EALERT_STYLE_INFORMATIONAL, "Title", "Body", {"OK"}}), 0);
   EXPECT_EQ(out.Take(), "\nTitle\nBody\n[OK]\n");
   window->setStatusText("a\tb\nc");
-  EXPECT_EQ(out.Take(), kRedraw + "[.......]   0% a b c");
+  EXPECT_EQ(out.Take(), kRedraw + "[.....]   0% a b c");
 
   // The line is ended when the window goes, so the shell starts afresh.
   window.reset();
@@ -69,7 +69,7 @@ TEST(TerminalWindow, TakesEightyColumnsWhenTheTerminalCannotTell) {
   CTerminalWindowController window(out.Stream(), in.Stream());
   window.SetOutputIsTerminal(true);
   window.setStatusProgress(50);
-  EXPECT_EQ(out.Take(), kRedraw + "[##########..........]  50%");
+  EXPECT_EQ(out.Take(), kRedraw + "[######.......]  50%");
 }
 
 TEST(TerminalWindow, WritesShortPlainLinesWhenNotATerminal) {
