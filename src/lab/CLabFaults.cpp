@@ -70,8 +70,14 @@ std::string LabFaultText(const SLabFault& fault_I) {
   for (const SKindName& entry : kKindNames) {
     if (entry.kind == fault_I.kind) text = entry.name;
   }
-  if (fault_I.kind != ELabFaultKind::eRefuseSwitch) text += "@" + std::to_string(fault_I.count);
-  if (!fault_I.board.empty()) text += ":" + fault_I.board;
+  if (fault_I.kind != ELabFaultKind::eRefuseSwitch) {
+    text.push_back('@');
+    text.append(std::to_string(fault_I.count));
+  }
+  if (!fault_I.board.empty()) {
+    text.push_back(':');
+    text.append(fault_I.board);
+  }
   return text;
 }
 
