@@ -38,6 +38,11 @@ bool CFLDeviceInterface::InitFlashVector() {
   mFlash.Clear();
   for (uint32_t i = 0; i < blocks; ++i) {
     const BL_FLASH_BLOCK_DESCRIPTOR& record = mBLDesc.blocks[i];
+    if (record.size > FlashConstants::kMaxFlashBlockBytes) {
+      TAVASSERT_TEXT("flash block size <= 16 MiB");
+      mFlash.Clear();
+      return false;
+    }
     mFlash.AddBlock(FLASH_BLOCK(record.startAddress, record.size, mBLParams.readSize,
                                 record.flags & kFlashBlockWordSizeMask, mBLParams.blockSize, 0, 0,
                                 (record.flags & kFlashBlockProtectedBit) != 0));

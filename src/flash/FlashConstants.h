@@ -1,6 +1,8 @@
 #pragma once
 // Every retry count and wait of the flash subsystem, with its reason.
 
+#include <cstdint>
+
 namespace FlashConstants {
 
 // SafeRead and SafeWrite: a retried failure is not yet an error.
@@ -22,6 +24,10 @@ inline constexpr int kWriteBlockTries = 10;
 // Under the non-BL protocol the expected block checksum covers this many
 // bytes, so blocks there are of this size.
 inline constexpr unsigned int kNonBLBlockSize = 4096;
+
+// A loader describing a bigger block than this is taken as broken: the
+// image of such a block would not fit in memory.
+inline constexpr uint32_t kMaxFlashBlockBytes = 16u << 20;
 
 // Only the first blocks of pen and touch S-record files enter the sums.
 inline constexpr unsigned int kSummedPenTouchBlocks = 39;

@@ -2,7 +2,6 @@
 
 #include <cstdio>
 #include <fstream>
-#include <sstream>
 
 namespace {
 const char kHeader[] = "tavik-lab-state 1\n";
@@ -54,15 +53,24 @@ bool CLabStateFile::Save(const std::string& path_I) const {
 
 bool CLabStateFile::Load(const std::string& path_I) {
   mEntries.clear();
-  std::ifstream in(path_I, std::ios::binary);
+  std::ifstream in(path_I, std::ios::binary | std::ios::ate);
   if (!in) return false;
+  const std::streamoff fileSize = in.tellg();
+  in.seekg(0);
   std::string line;
   if (!std::getline(in, line) || line + "\n" != kHeader) return false;
   while (std::getline(in, line)) {
-    std::istringstream fields(line);
-    std::string key;
-    size_t length = 0;
-    if (!(fields >> key >> length)) break;
+    // "key length": a length of digits only, and no more than the file holds.
+    const size_t blank = line.rfind(' ');
+    const std::string key = blank == std::string::npos ? std::string() : line.substr(0, blank);
+    const std::string digits = blank == std::string::npos ? std::string() : line.substr(blank + 1);
+    if (key.empty() || digits.empty() || digits.size() > 12 ||
+        digits.find_first_not_of("0123456789") != std::string::npos ||
+        std::stoll(digits) > fileSize) {
+      mEntries.clear();
+      return false;
+    }
+    const size_t length = static_cast<size_t>(std::stoll(digits));
     std::vector<uint8_t> bytes(length);
     in.read(reinterpret_cast<char*>(bytes.data()), static_cast<std::streamsize>(length));
     if (static_cast<size_t>(in.gcount()) != length || in.get() != '\n') {

@@ -13,7 +13,10 @@
 #include "lab/CLabI2CMaster.h"
 #include "lab/CLabOptions.h"
 #include "lab/CLabPenController.h"
+#include "lab/CLabScalarHid.h"
 #include "lab/CLabSession.h"
+#include "lab/CLabStateFile.h"
+#include "lab/LabCrc.h"
 #include "support/LabFixture.h"
 
 namespace {
@@ -142,7 +145,92 @@ TEST(LabFlash, ProgrammingRulesAndTheValidityOfAnImage) {
   EXPECT_EQ(flash.GetChecksum(2), flash.ContentChecksum(2));
 }
 
+TEST(LabCrc, TheChipsCheckValues) {
+  const uint8_t check[] = {'1', '2', '3', '4', '5', '6', '7', '8', '9'};
+  EXPECT_EQ(LabCrc::BluetoothPage(check, 9), 0x45);
+  EXPECT_EQ(LabCrc::ScalarBlock(check, 9), 0xF4);
+  const std::vector<uint8_t> zeroes(256, 0x00);
+  EXPECT_EQ(LabCrc::BluetoothPage(zeroes.data(), zeroes.size()), 0x00);
+}
+
 class LabBus : public LabFixture {};
+
+// A programming-report board as a host would drive it, report by report.
+TEST_F(LabBus, AProgrammingBoardRefusesABadPageAndStaysInvalid) {
+  auto scalar = std::make_shared<CLabScalarHid>();
+  mBus->Plug(scalar);
+  CLabHidNode node(mBus);
+  ASSERT_EQ(node.Open(Listed(*scalar)), EHidStatus::eSuccess);
+  auto frame = [](uint8_t phase_I) {
+    Bytes report(512, 0xFF);
+    report[0] = 0xE4;
+    report[1] = 4;
+    report[2] = phase_I;
+    return report;
+  };
+  auto status = [&]() {
+    Bytes report(512, 0);
+    report[0] = 0xE4;
+    EXPECT_EQ(node.GetFeatureReport(report), EHidStatus::eSuccess);
+    EXPECT_EQ(Bytes(report.begin(), report.begin() + 2), (Bytes{0xE4, 4}));
+    return report[3];
+  };
+  auto block = [&](uint32_t offset_I, uint8_t fill_I, bool goodCrc_I) {
+    Bytes report = frame(2);
+    report[3] = static_cast<uint8_t>(offset_I >> 16);
+    report[4] = static_cast<uint8_t>(offset_I >> 8);
+    report[5] = static_cast<uint8_t>(offset_I);
+    std::fill(report.begin() + 7, report.begin() + 263, fill_I);
+    report[6] = static_cast<uint8_t>(LabCrc::ScalarBlock(&report[7], 256) ^ (goodCrc_I ? 0 : 1));
+    return report;
+  };
+
+  EXPECT_TRUE(scalar->IsImageValid());
+  ASSERT_EQ(node.SetFeatureReport(frame(1)), EHidStatus::eSuccess);
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusBusy) << "erasing";
+  TavSleep(0.3);
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusReady);
+  EXPECT_FALSE(scalar->IsImageValid()) << "the start invalidates";
+  ASSERT_EQ(node.SetFeatureReport(block(0x100, 0x11, true)), EHidStatus::eSuccess);
+  TavSleep(0.1);
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusReady);
+  EXPECT_EQ(scalar->GetImage()[0x100], 0x11);
+  ASSERT_EQ(node.SetFeatureReport(block(0x200, 0x22, false)), EHidStatus::eSuccess);
+  TavSleep(0.1);
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusRefused);
+  EXPECT_EQ(scalar->GetImage()[0x200], 0xFF) << "a refused block is not written";
+  ASSERT_EQ(node.SetFeatureReport(frame(3)), EHidStatus::eSuccess);
+  EXPECT_FALSE(scalar->IsImageValid()) << "an end after a refusal stores no sum";
+  EXPECT_EQ(scalar->GetRefusals(), 1u);
+
+  // A report while busy is a violation, answered until the next start.
+  ASSERT_EQ(node.SetFeatureReport(frame(1)), EHidStatus::eSuccess);
+  ASSERT_EQ(node.SetFeatureReport(block(0, 0x33, true)), EHidStatus::eSuccess);
+  EXPECT_EQ(scalar->GetViolations().size(), 1u);
+  TavSleep(0.3);
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusBadFrame);
+
+  // A clean pass makes the image valid again.
+  ASSERT_EQ(node.SetFeatureReport(frame(1)), EHidStatus::eSuccess);
+  TavSleep(0.3);
+  ASSERT_EQ(node.SetFeatureReport(block(0, 0x33, true)), EHidStatus::eSuccess);
+  TavSleep(0.1);
+  ASSERT_EQ(node.SetFeatureReport(frame(3)), EHidStatus::eSuccess);
+  EXPECT_TRUE(scalar->IsImageValid());
+
+  // Busy faults show in byte 3, for the poll to wait out.
+  TavSleep(0.3);
+  scalar->Faults().Add({ELabFaultKind::eBusy, 2, ""});
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusBusy);
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusBusy);
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusReady);
+
+  // Cut off mid-update, the board comes back under its loader identity.
+  ASSERT_EQ(node.SetFeatureReport(frame(1)), EHidStatus::eSuccess);
+  scalar->PowerOn();
+  EXPECT_EQ(scalar->GetMode(), CLabProgrammingBoard::EMode::eLoader);
+  EXPECT_EQ(scalar->GetInterfaces().at(0).info.productId, 0x0352u);
+}
 
 TEST_F(LabBus, BoardsReenumerateWithEventsAndStaleNodesAreGone) {
   auto pen = std::make_shared<CLabPenController>();
@@ -244,6 +332,32 @@ TEST_F(LabBus, TheStateFolderCarriesBoardsIntoTheNextRun) {
   ASSERT_EQ(bus->ListInterfaces().size(), 2u);
   EXPECT_EQ(bus->ListInterfaces()[1].info.productId, 0x0302u);
   std::filesystem::remove_all(folder);
+}
+
+TEST(LabStateFile, ACorruptFileIsRefusedWhole) {
+  const std::string path =
+      (std::filesystem::temp_directory_path() / ("tavik-lab-corrupt-" + std::to_string(::getpid())))
+          .string();
+  CLabStateFile state;
+  state.PutNumber("mode", 1);
+  state.PutBytes("loader.cpu0.block3", {0x00, 0x0A, 0xFF});
+  ASSERT_TRUE(state.Save(path));
+  CLabStateFile again;
+  ASSERT_TRUE(again.Load(path));
+  std::vector<uint8_t> bytes;
+  ASSERT_TRUE(again.GetBytes("loader.cpu0.block3", bytes));
+  EXPECT_EQ(bytes, (std::vector<uint8_t>{0x00, 0x0A, 0xFF})) << "a line feed inside the bytes";
+  EXPECT_EQ(again.GetNumber("mode", 0), 1u);
+
+  for (const char* text : {"tavik-lab-state 1\nmode -1\n1\n", "tavik-lab-state 1\nmode 99\n1\n",
+                           "tavik-lab-state 1\nmode 1\n12", "tavik-lab-state 2\n"}) {
+    FILE* file = std::fopen(path.c_str(), "wb");
+    std::fputs(text, file);
+    std::fclose(file);
+    EXPECT_FALSE(again.Load(path)) << text;
+    EXPECT_FALSE(again.Has("mode"));
+  }
+  std::filesystem::remove(path);
 }
 
 TEST(LabOptions, StateFolderAndFastClock) {
