@@ -11,12 +11,14 @@
 //   Entries come in a stable order: by node path, then by collection order.
 // - ListUsbDevices() gives one SUsbEntry per USB device from `vendorId_I`
 //   (0 lists all).
-// - Watch() blocks on the calling thread and calls the watcher for every HID
-//   interface that is added or removed, until StopWatching() is called from
-//   another thread; it then returns true. It returns false at once when the
-//   watch cannot be set up. Each event carries the interface's primary (first)
-//   usage pair. A removal carries the identity the interface had when it was
-//   added, since a removed node can no longer be read.
+// - OpenWatch() sets up the watch of HID attach and detach without blocking;
+//   false when it cannot be set up. RunWatch() then blocks on the calling
+//   thread and calls the watcher for every HID interface that is added or
+//   removed, until StopWatching() is called from another thread (a stop that
+//   came first ends the next RunWatch at once). Each event carries the
+//   interface's primary (first) usage pair. A removal carries the identity
+//   the interface had when it was added, since a removed node can no longer
+//   be read. Events of one watch arrive on the RunWatch thread, in order.
 // - Errors never leave the seam as errno values: a list that cannot be read
 //   is an empty list.
 
@@ -53,6 +55,7 @@ class CDeviceRegistry {
   virtual ~CDeviceRegistry() = default;
   virtual std::vector<SHidEntry> ListHidInterfaces(uint32_t vendorId_I) = 0;
   virtual std::vector<SUsbEntry> ListUsbDevices(uint32_t vendorId_I) = 0;
-  virtual bool Watch(CRegistryWatcher& watcher_I) = 0;
+  virtual bool OpenWatch() = 0;
+  virtual void RunWatch(CRegistryWatcher& watcher_I) = 0;
   virtual void StopWatching() = 0;
 };
