@@ -78,15 +78,16 @@ class CUpdateController : public CInterfaceNotifier {
   void DeviceAttach(const std::string& path_I);
   void DeviceDetach(const std::string& path_I);
 
+  // Tells the notifier first and stores the state only when it returned:
+  // an attach arriving while the notifier holds the caller is judged by the
+  // old state. The driver sets ESTATE_PROGRAM through it when a run starts.
+  void ProcessStateChange(ECONTROLLER_STATE state_I);
+
  protected:
   void CallbackLog(const std::string& text_I);
   void CallbackError(ECONTROLLER_ERROR error_I, const std::string& text_I);
   void CallbackStatus(ECONTROLLER_STATE state_I);
   void CallbackProgress(unsigned int percent_I);
-  // Tells the notifier first and stores the state only when it returned:
-  // an attach arriving while the notifier holds the caller is judged by the
-  // old state.
-  void ProcessStateChange(ECONTROLLER_STATE state_I);
 
   InterfacePtr GetLoaderMode();
   InterfacePtr GetNormalMode();

@@ -7,13 +7,7 @@ namespace {
 class AttachDetach : public ControllerFixture {
  protected:
   // Puts the controller in `state_I` through its own operations.
-  void Reach(ECONTROLLER_STATE state_I) {
-    struct SReacher : CLinuxUpdateController {
-      using CUpdateController::ProcessStateChange;
-    };
-    static_cast<SReacher*>(static_cast<CUpdateController*>(mController.get()))
-        ->ProcessStateChange(state_I);
-  }
+  void Reach(ECONTROLLER_STATE state_I) { mController->ProcessStateChange(state_I); }
 };
 
 TEST_F(AttachDetach, AttachMovesOnlyTheTwoWaitingStatesWhateverThePath) {
