@@ -1,12 +1,13 @@
 #pragma once
-// A private D-Bus daemon for one test, reachable as the system bus of this
-// process (DBUS_SYSTEM_BUS_ADDRESS), so that nothing touches the machine's
-// own buses.
+// A private D-Bus daemon for one test, reachable as the system bus
+// (DBUS_SYSTEM_BUS_ADDRESS) or the session bus (DBUS_SESSION_BUS_ADDRESS) of
+// this process, so that nothing touches the machine's own buses.
 
 #include <signal.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <cstdint>
 #include <cstdio>
 #include <cstdlib>
 #include <filesystem>
@@ -15,9 +16,9 @@
 
 class CPrivateBus {
  public:
-  CPrivateBus() {
+  explicit CPrivateBus(const char* variable_I = "DBUS_SYSTEM_BUS_ADDRESS") : mVariable(variable_I) {
     if (access("/usr/bin/dbus-daemon", X_OK) != 0) return;
-    mFolder = std::filesystem::temp_directory_path() / ("bus-" + std::to_string(getpid()));
+    mFolder = std::filesystem::temp_directory_path() / ("bus-" + std::to_string(getpid()) + "-" + std::to_string(reinterpret_cast<uintptr_t>(this)));
     std::filesystem::create_directories(mFolder);
     const std::string config = (mFolder / "bus.conf").string();
     std::ofstream(config) << "<busconfig><type>system</type>"
@@ -46,7 +47,7 @@ class CPrivateBus {
       }
     }
     if (in != nullptr) std::fclose(in);
-    if (!mAddress.empty()) setenv("DBUS_SYSTEM_BUS_ADDRESS", mAddress.c_str(), 1);
+    if (!mAddress.empty()) setenv(mVariable, mAddress.c_str(), 1);
   }
 
   ~CPrivateBus() {
@@ -54,7 +55,7 @@ class CPrivateBus {
       kill(mPid, SIGTERM);
       waitpid(mPid, nullptr, 0);
     }
-    unsetenv("DBUS_SYSTEM_BUS_ADDRESS");
+    unsetenv(mVariable);
     if (!mFolder.empty()) std::filesystem::remove_all(mFolder);
   }
 
@@ -62,6 +63,7 @@ class CPrivateBus {
   const std::string& GetAddress() const { return mAddress; }
 
  private:
+  const char* mVariable;
   pid_t mPid = -1;
   std::string mAddress;
   std::filesystem::path mFolder;
