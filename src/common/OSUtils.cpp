@@ -1,8 +1,9 @@
 #include "common/OSUtils.h"
 
 #include <chrono>
-#include <future>
-#include <memory>
+#include <condition_variable>
+#include <exception>
+#include <mutex>
 
 #include "common/CMainThreadLoop.h"
 
@@ -31,12 +32,32 @@ void DispatchOnMainThread(std::function<void()> block_I) {
     block_I();
     return;
   }
-  // Shared with the posted task so that it lives as long as the main
-  // thread still touches it, even after this thread has woken.
-  auto task = std::make_shared<std::packaged_task<void()>>(std::move(block_I));
-  std::future<void> done = task->get_future();
-  if (!CMainThreadLoop::PostToMain([task] { (*task)(); })) (*task)();
-  done.get();
+  // Lives on this thread's stack. The main thread hands over the outcome
+  // under the lock and touches nothing of it afterwards, so everything it
+  // made (a thrown exception too) is released here.
+  struct SOutcome {
+    std::mutex mLock;
+    std::condition_variable mDone;
+    bool mFinished = false;
+    std::exception_ptr mError;
+  } outcome;
+  auto run = [&outcome, &block_I] {
+    std::exception_ptr error;
+    try {
+      block_I();
+    } catch (...) {
+      error = std::current_exception();
+    }
+    std::lock_guard<std::mutex> guard(outcome.mLock);
+    outcome.mError = std::move(error);
+    outcome.mFinished = true;
+    outcome.mDone.notify_all();
+  };
+  if (!CMainThreadLoop::PostToMain(run)) run();
+
+  std::unique_lock<std::mutex> lock(outcome.mLock);
+  outcome.mDone.wait(lock, [&outcome] { return outcome.mFinished; });
+  if (outcome.mError) std::rethrow_exception(outcome.mError);
 }
 
 FileVersion GetMainBundleVersion() {
