@@ -22,9 +22,11 @@ class CDesktop {
 
   // The process id of whoever started this program, 0 when unknown.
   virtual int GetLaunchSenderPid() = 0;
-  // The application id of a running process, empty when it is no
-  // application of the desktop.
+  // The application id of a running process; for a process that is no
+  // application of the desktop, its executable's name; empty when unknown.
   virtual std::string GetApplicationIdOfProcess(int pid_I) = 0;
+  // True when the process is an application of the desktop.
+  virtual bool IsApplicationProcess(int pid_I) = 0;
   // The number of arguments this process was started with, its name included.
   virtual int GetProcessArgumentCount() = 0;
 

@@ -230,7 +230,7 @@ bool OFLUpdater::setupUpdate() {
         mDelegate->notifyDialog("Error: An option at the end of the arguments has no value.");
       });
     }
-    Terminate();
+    Terminate(ERUN_FAILED);
     return false;
   }
   mFlagCommandLine = true;
@@ -272,7 +272,7 @@ void OFLUpdater::runThreadDevice() {
   mHIDMgrSemaphore->RequestSemaphore();
   if (!mSetup.registry || !mSetup.registry->OpenWatch()) {
     TavLog::Error("Could not secure USB for Firmware Updater.");
-    Terminate();
+    Terminate(ERUN_FAILED);
     mHIDMgrSemaphore->ReleaseSemaphore();
     return;
   }
@@ -335,7 +335,7 @@ void OFLUpdater::runThreadProgram() {
                 "Error: The specified file does not appear to be a valid firmware file.");
           });
         }
-        Terminate();
+        Terminate(ERUN_REFUSED_FILE);
         mProgramFinished = true;
         return;
       }
@@ -343,6 +343,9 @@ void OFLUpdater::runThreadProgram() {
     runUpdateStep(value);
   }
   mProgramFinished = true;
+  if (mDelegate != nullptr && !mDeviceUpdates.empty()) {
+    OSUtils::DispatchOnMainThread([this] { mDelegate->updatesFinished(); });
+  }
 }
 
 void OFLUpdater::runUpdateStep(const std::string& value_I) {
@@ -398,7 +401,7 @@ void OFLUpdater::updateDeviceList(bool toLoader_I) {
   }
 }
 
-void OFLUpdater::Terminate() {
+void OFLUpdater::Terminate(ERunOutcome outcome_I) {
   if (mDelegate == nullptr) return;
-  OSUtils::DispatchOnMainThread([this] { mDelegate->terminate(); });
+  OSUtils::DispatchOnMainThread([this, outcome_I] { mDelegate->terminate(outcome_I); });
 }

@@ -95,7 +95,7 @@ class OFLUpdater : public CRegistryWatcher {
   void runThreadProgram();
   void runUpdateStep(const std::string& value_I);
   static bool MatchesWatchedUsage(const DeviceInfo& info_I);
-  void Terminate();
+  void Terminate(ERunOutcome outcome_I);
 
   SUpdaterSetup mSetup;
   CApplicationDelegate* mDelegate = nullptr;  // the application object

@@ -254,6 +254,7 @@ TEST_F(Updater, RefusedAutoUpdateFileShowsTheDialogAndEnds) {
   EXPECT_TRUE(mDelegate.mJournal.Contains(
       "dialog:Error: The specified file does not appear to be a valid firmware file."));
   EXPECT_TRUE(mDelegate.mJournal.Contains("terminate"));
+  EXPECT_EQ(mDelegate.mOutcome, ERUN_REFUSED_FILE);
   EXPECT_FALSE(mJournal.Contains("pen.ProgramBoard"));
 }
 

@@ -99,7 +99,11 @@ class CRecordingDelegate : public CApplicationDelegate {
   void doStateMachine(ECONTROLLER_STATE state_I) override { mJournal.Add("state:" + std::to_string(state_I)); }
   void updateProgressBar(double percent_I) override { mJournal.Add("bar:" + std::to_string(percent_I)); }
   void notifyDialog(const std::string& text_I) override { mJournal.Add("dialog:" + text_I); }
-  void terminate() override { mJournal.Add("terminate"); }
+  void terminate(ERunOutcome outcome_I) override {
+    mJournal.Add("terminate");
+    mOutcome = outcome_I;
+  }
+  ERunOutcome mOutcome = ERUN_SUCCESS;
 
   bool mUserLaunched = true;
   CJournal mJournal;

@@ -59,6 +59,12 @@ std::string CLinuxDesktop::GetApplicationIdOfProcess(int pid_I) {
   return executable.substr(executable.rfind('/') + 1);
 }
 
+bool CLinuxDesktop::IsApplicationProcess(int pid_I) {
+  if (pid_I <= 0) return false;
+  const std::string executable = ExecutableOf(pid_I);
+  return !executable.empty() && CDesktopEntries::FindByProgram(executable).has_value();
+}
+
 int CLinuxDesktop::GetProcessArgumentCount() {
   std::ifstream in("/proc/self/cmdline", std::ios::binary);
   std::string content((std::istreambuf_iterator<char>(in)), std::istreambuf_iterator<char>());

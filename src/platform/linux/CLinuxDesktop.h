@@ -17,6 +17,7 @@ class CLinuxDesktop : public CDesktop {
 
   int GetLaunchSenderPid() override;
   std::string GetApplicationIdOfProcess(int pid_I) override;
+  bool IsApplicationProcess(int pid_I) override;
   int GetProcessArgumentCount() override;
   std::vector<int> RunningApplications(const std::string& applicationId_I) override;
   bool TerminateApplication(int pid_I) override;

@@ -84,6 +84,8 @@ TEST_F(LinuxDesktop, LaunchedApplicationRunsIsNamedAndQuitsOnRequest) {
     return running.size() == 1;
   }));
   EXPECT_EQ(mDesktop.GetApplicationIdOfProcess(running[0]), "com.tavik.TestDriver");
+  EXPECT_TRUE(mDesktop.IsApplicationProcess(running[0]));
+  EXPECT_FALSE(mDesktop.IsApplicationProcess(getpid()));
   EXPECT_FALSE(mDesktop.IsTerminated(running[0]));
 
   EXPECT_TRUE(mDesktop.TerminateApplication(running[0]));
