@@ -480,53 +480,58 @@ bool CUpdateController::InitCheckForSRecData(const InterfacePtr& interface_I, ui
   return false;
 }
 
-bool CUpdateController::InitCheckForIntelHexData(const InterfacePtr& interface_I) {
-  CallbackLog("InitCheckForIntelHexData: starting...");
+// The texts of one of the three parser checks.
+struct CUpdateController::SParserCheckTexts {
+  const char* start;
+  const char* nullInterface;
+  const char* success;
+  const char* failure;
+};
+
+template <typename TParser>
+bool CUpdateController::InitCheckForParserData(
+    const InterfacePtr& interface_I, const std::shared_ptr<TParser>& data_I,
+    void (CFLDeviceInterface::*handOver_I)(std::shared_ptr<TParser>),
+    const SParserCheckTexts& texts_I) {
+  CallbackLog(texts_I.start);
   if (!interface_I) {
-    InterfaceError("InitCheckForIntelHexData: NULL CFLDeviceInterface");
+    InterfaceError(texts_I.nullInterface);
     return false;
   }
-  const std::shared_ptr<CIntelHex> data = mDataSource.GetIntelHexData();
-  if (!data || !data->IsLoaded()) {
-    CallbackLog("InitCheckForIntelHexData: ERROR - IntelHex file not loaded!");
+  if (!data_I || !data_I->IsLoaded()) {
+    CallbackLog(texts_I.failure);
     return false;
   }
-  interface_I->SetIntelHexData(data);
-  CallbackLog("InitCheckForIntelHexData: IntelHex file data is loaded; we're good to go...");
+  ((*interface_I).*handOver_I)(data_I);
+  CallbackLog(texts_I.success);
   return true;
+}
+
+bool CUpdateController::InitCheckForIntelHexData(const InterfacePtr& interface_I) {
+  return InitCheckForParserData(
+      interface_I, mDataSource.GetIntelHexData(), &CFLDeviceInterface::SetIntelHexData,
+      {"InitCheckForIntelHexData: starting...", "InitCheckForIntelHexData: NULL CFLDeviceInterface",
+       "InitCheckForIntelHexData: IntelHex file data is loaded; we're good to go...",
+       "InitCheckForIntelHexData: ERROR - IntelHex file not loaded!"});
 }
 
 bool CUpdateController::InitCheckForAiroFlashData(const InterfacePtr& interface_I) {
-  CallbackLog("InitCheckForAiroFlashData: starting...");
-  if (!interface_I) {
-    InterfaceError("InitCheckForAiroFlashData: NULL CFLDeviceInterface");
-    return false;
-  }
-  const std::shared_ptr<CBinaryAiroFlash> data = mDataSource.GetBinaryAiroFlashData();
-  if (!data || !data->IsLoaded()) {
-    CallbackLog("InitCheckForAiroFlashData: ERROR - BinaryAiroFlash file not loaded!");
-    return false;
-  }
-  interface_I->SetBinaryAiroFlashData(data);
-  CallbackLog("InitCheckForAiroFlashData: AeroFlash file data is loaded; we're good to go...");
-  return true;
+  return InitCheckForParserData(
+      interface_I, mDataSource.GetBinaryAiroFlashData(),
+      &CFLDeviceInterface::SetBinaryAiroFlashData,
+      {"InitCheckForAiroFlashData: starting...",
+       "InitCheckForAiroFlashData: NULL CFLDeviceInterface",
+       "InitCheckForAiroFlashData: AeroFlash file data is loaded; we're good to go...",
+       "InitCheckForAiroFlashData: ERROR - BinaryAiroFlash file not loaded!"});
 }
 
 bool CUpdateController::InitCheckForScalarBinaryData(const InterfacePtr& interface_I) {
-  CallbackLog("InitCheckForScalarBinaryData: starting...");
-  if (!interface_I) {
-    InterfaceError("InitCheckForScalarBinaryData: NULL CFLDeviceInterface");
-    return false;
-  }
-  const std::shared_ptr<CScalarBinary> data = mDataSource.GetScalarBinaryData();
-  if (!data || !data->IsLoaded()) {
-    CallbackLog("InitCheckForScalarBinaryData: ERROR - ScalarBinary file not loaded!");
-    return false;
-  }
-  interface_I->SetScalarBinaryData(data);
-  CallbackLog(
-      "InitCheckForScalarBinaryData: Scalar Binary file data is loaded; we're good to go...");
-  return true;
+  return InitCheckForParserData(
+      interface_I, mDataSource.GetScalarBinaryData(), &CFLDeviceInterface::SetScalarBinaryData,
+      {"InitCheckForScalarBinaryData: starting...",
+       "InitCheckForScalarBinaryData: NULL CFLDeviceInterface",
+       "InitCheckForScalarBinaryData: Scalar Binary file data is loaded; we're good to go...",
+       "InitCheckForScalarBinaryData: ERROR - ScalarBinary file not loaded!"});
 }
 
 bool CUpdateController::Program(const InterfacePtr& interface_I) {

@@ -98,6 +98,12 @@ class CUpdateController : public CInterfaceNotifier {
   bool InitCheckForIntelHexData(const InterfacePtr& interface_I);
   bool InitCheckForAiroFlashData(const InterfacePtr& interface_I);
   bool InitCheckForScalarBinaryData(const InterfacePtr& interface_I);
+  struct SParserCheckTexts;
+  template <typename TParser>
+  bool InitCheckForParserData(const InterfacePtr& interface_I,
+                              const std::shared_ptr<TParser>& data_I,
+                              void (CFLDeviceInterface::*handOver_I)(std::shared_ptr<TParser>),
+                              const SParserCheckTexts& texts_I);
   bool Program(const InterfacePtr& interface_I);
   void PostUpdate();
   void FailUpdate(ECONTROLLER_ERROR error_I, const std::string& text_I);

@@ -1,6 +1,7 @@
 // Updates that succeed: a pen that re-enumerates into its loader, one that
 // is already there, and one that switches in place.
 #include <chrono>
+#include <fstream>
 
 #include "update/ControllerFixture.h"
 
@@ -115,6 +116,41 @@ TEST_F(Flow, SaveFlagOnLeavingFollowsBoardAndPenProduct) {
                                   (save ? "true" : "false") + ")"))
         << penProduct;
   }
+}
+
+TEST_F(Flow, BinaryImagesAreHandedToTheInterfaceBeforeProgramming) {
+  // Bluetooth module and HID scalar of a product that switches in place.
+  auto pen = MakeInterface("pen", kNormalPath);
+  auto bluetooth = MakeInterface("bt", "31325:900:16777216:1:65289");
+  auto scalar = MakeInterface("scalar", "31325:4192:16777216:1:65280");
+  auto device = MakeDevice(pen, false, /*intoBLMode=*/false);
+  device->SetBluetoothSupported(true);
+  device->SetBluetoothInterface(bluetooth);
+  device->SetScalarSupported(true);
+  device->SetScalarInterfaceType(EHID_INTERFACE);
+  device->SetScalarInterface(scalar);
+  mBus->Set({device});
+  ASSERT_TRUE(mController->UpdateDeviceList());
+  const std::string image(4096, '\x5A');
+  std::ofstream(mFolder / "bt.airoflash", std::ios::binary) << image;
+  std::ofstream(mFolder / "scalar.bin", std::ios::binary) << image;
+
+  mController->SetUpdateType(EUPDATE_BLUETOOTH);
+  ASSERT_TRUE(mController->SetUpdateFile((mFolder / "bt.airoflash").string()));
+  EXPECT_TRUE(mController->UpdateDevice());
+  EXPECT_TRUE(mNotifier.Logged(
+      "InitCheckForAiroFlashData: AeroFlash file data is loaded; we're good to go..."));
+  EXPECT_LT(mJournal.IndexOf("bt.SetBinaryAiroFlashData"), mJournal.IndexOf("bt.ProgramBoard"));
+
+  mController->SetUpdateType(EUPDATE_SCALAR_HID);
+  ASSERT_TRUE(mController->SetUpdateFile((mFolder / "scalar.bin").string()));
+  EXPECT_TRUE(mController->UpdateDevice());
+  EXPECT_TRUE(mNotifier.Logged(
+      "InitCheckForScalarBinaryData: Scalar Binary file data is loaded; we're good to go..."));
+  EXPECT_LT(mJournal.IndexOf("scalar.SetScalarBinaryData"),
+            mJournal.IndexOf("scalar.ProgramBoard"));
+  EXPECT_TRUE(mNotifier.Logged("Switching Bluetooth to Loader mode... "));
+  EXPECT_EQ(mNotifier.CountLogged("Switching Bluetooth to Loader mode... "), 2);
 }
 
 TEST_F(Flow, StateIsStoredOnlyAfterTheNotifierReturns) {

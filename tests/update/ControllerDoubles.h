@@ -94,6 +94,18 @@ class CFakeInterface : public CFLDeviceInterface {
     mBLParams.numFlashBlocks = mReportedBlocks;
     return mInitResult;
   }
+  void SetIntelHexData(std::shared_ptr<CIntelHex> data_I) override {
+    Record("SetIntelHexData");
+    CFLDeviceInterface::SetIntelHexData(std::move(data_I));
+  }
+  void SetBinaryAiroFlashData(std::shared_ptr<CBinaryAiroFlash> data_I) override {
+    Record("SetBinaryAiroFlashData");
+    CFLDeviceInterface::SetBinaryAiroFlashData(std::move(data_I));
+  }
+  void SetScalarBinaryData(std::shared_ptr<CScalarBinary> data_I) override {
+    Record("SetScalarBinaryData");
+    CFLDeviceInterface::SetScalarBinaryData(std::move(data_I));
+  }
   bool ProgramBoard() override {
     Record("ProgramBoard");
     if (mNotifier != nullptr) mNotifier->InterfaceProgress(50);
