@@ -204,6 +204,9 @@ TEST_F(CLinuxDeviceRegistryTest, WatchReportsAttachAndDetachWithTheIdentityTheDe
 
   const std::string arriving = mBus->AddUsbDevice(mRootHub, 1, "2.1", kVendor, 0x301, 0x0100);
   const auto arrivingNode = mBus->AddHidInterface(arriving, 0, 1, kVendorOnly);
+  // Read before it goes: a node unplugged before its arrival is read shows
+  // no usage, as with real hardware that vanishes that fast.
+  watch.GetWatcher().WaitFor(1);
   mBus->Unplug(arrivingNode);
   // Present before the watch opened: its removal still says who it was.
   mBus->Unplug(presentNode);
@@ -228,6 +231,7 @@ TEST_F(CLinuxDeviceRegistryTest, WatchFollowsADeviceThatReenumeratesUnderAnother
   mBus->Unplug(normalNode);
   const std::string loader = mBus->AddUsbDevice(mRootHub, 1, "3", kVendor, 0x94, 0x0001);
   const auto loaderNode = mBus->AddHidInterface(loader, 0, 0, kVendorOnly);
+  watch.GetWatcher().WaitFor(2);
   mBus->Unplug(loaderNode);
   const std::string back = mBus->AddUsbDevice(mRootHub, 1, "3", kVendor, 0x374, 0x0103);
   mBus->AddHidInterface(back, 0, 0, kPenAndVendor);
