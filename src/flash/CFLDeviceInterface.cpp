@@ -19,6 +19,9 @@ CFLDeviceInterface::CFLDeviceInterface() = default;
 
 CFLDeviceInterface::CFLDeviceInterface(const std::string& path_I) : mPath(path_I) {}
 
+CFLDeviceInterface::CFLDeviceInterface(EINTERFACE_TYPE interfaceType_I)
+    : mInterfaceType(interfaceType_I) {}
+
 CFLDeviceInterface::~CFLDeviceInterface() = default;
 
 void CFLDeviceInterface::UpdateChecksums(uint32_t oldSum_I, uint32_t newSum_I, uint32_t fwSum_I) {
@@ -135,16 +138,16 @@ std::string CFLDeviceInterface::PathFromInfo(const DeviceInfo& info_I) {
 }
 
 void CFLDeviceInterface::ReportLog(const std::string& text_I) {
-  if (mCallback != nullptr) {
-    mCallback->InterfaceLog(text_I);
+  if (mNotifier != nullptr) {
+    mNotifier->InterfaceLog(text_I);
   } else {
     TavLog::Info("Log: %s\n", text_I.c_str());
   }
 }
 
 void CFLDeviceInterface::ReportError(const std::string& text_I) {
-  if (mCallback != nullptr) {
-    mCallback->InterfaceError(text_I);
+  if (mNotifier != nullptr) {
+    mNotifier->InterfaceError(text_I);
   } else {
     TavLog::Error("Error: %s\n", text_I.c_str());
   }
@@ -152,7 +155,7 @@ void CFLDeviceInterface::ReportError(const std::string& text_I) {
 
 void CFLDeviceInterface::ReportProgress(uint32_t percent_I) {
   // The receiver takes 0 as "not started"; any report means started.
-  if (mCallback != nullptr) mCallback->InterfaceProgress(percent_I == 0 ? 1 : percent_I);
+  if (mNotifier != nullptr) mNotifier->InterfaceProgress(percent_I == 0 ? 1 : percent_I);
 }
 
 bool CFLDeviceInterface::LoaderReady() { return IsOpen() && GetIsFlashLoader(); }

@@ -5,7 +5,7 @@
 #include <cstdlib>
 #include <memory>
 
-#include "platform/linux/LinuxUsbTopology.h"
+#include "platform/linux/CLinuxDeviceRegistry.h"
 
 namespace {
 
@@ -52,8 +52,10 @@ bool CLinuxUsbControl::FindDevice(const DeviceInfo& info_I, int& bus_O, int& add
     if (device == nullptr) continue;
     const char* devpath = udev_device_get_sysattr_value(device, "devpath");
     const unsigned long bus = Attribute(device, "busnum", 10);
-    const uint32_t location =
-        LocationIdFromTopology(static_cast<unsigned int>(bus), devpath ? devpath : "");
+    // The registry's rule, so that both name a device by the same number.
+    const uint32_t location = devpath != nullptr ? CLinuxDeviceRegistry::LocationIdFromTopology(
+                                                       static_cast<uint32_t>(bus), devpath)
+                                                 : 0;
     if (Attribute(device, "idVendor", 16) == info_I.vendorId &&
         Attribute(device, "idProduct", 16) == info_I.productId && location == info_I.locationId) {
       bus_O = static_cast<int>(bus);
@@ -136,14 +138,13 @@ EUsbStatus CLinuxUsbControl::ClaimVendorInterface() {
 
 EUsbStatus CLinuxUsbControl::ControlTransfer(uint8_t requestType_I, uint8_t request_I,
                                              uint16_t value_I, uint16_t index_I,
-                                             std::vector<uint8_t>& data_IO,
-                                             size_t& transferred_O) {
+                                             std::vector<uint8_t>& data_IO, size_t& transferred_O) {
   transferred_O = 0;
   if (mHandle == nullptr) return EUsbStatus::eGone;
   if (data_IO.size() > 0xFFFF) return EUsbStatus::eOther;
-  const int result = libusb_control_transfer(
-      mHandle, requestType_I, request_I, value_I, index_I, data_IO.data(),
-      static_cast<uint16_t>(data_IO.size()), kUsbControlTimeoutMs);
+  const int result =
+      libusb_control_transfer(mHandle, requestType_I, request_I, value_I, index_I, data_IO.data(),
+                              static_cast<uint16_t>(data_IO.size()), kUsbControlTimeoutMs);
   if (result < 0) return StatusFromLibusb(result);
   transferred_O = static_cast<size_t>(result);
   return EUsbStatus::eSuccess;

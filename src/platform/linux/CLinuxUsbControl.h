@@ -30,8 +30,7 @@ class CLinuxUsbControl : public CUsbControl {
 
   // The bus number and address of the attached device that `info_I`
   // names, and its release number; false when nothing matches.
-  static bool FindDevice(const DeviceInfo& info_I, int& bus_O, int& address_O,
-                         uint16_t& release_O);
+  static bool FindDevice(const DeviceInfo& info_I, int& bus_O, int& address_O, uint16_t& release_O);
 
  private:
   libusb_context* mContext = nullptr;

@@ -51,12 +51,13 @@ TEST_F(Umockdev, HidrawNodesAreFoundAndSpokenToThroughIoctls) {
   const DeviceInfo penUsage{0x7A71, 0x0301, 0x01100000, 0x0002, 0x000D};
   std::string node;
   uint16_t release = 0;
-  ASSERT_TRUE(CLinuxHidNode::FindNode(penUsage, node, release));
+  CLinuxHidNode finder;
+  ASSERT_TRUE(finder.FindNode(penUsage, node, release));
   EXPECT_EQ(node.rfind("/dev/hidraw", 0), 0u);
   EXPECT_EQ(release, 0x0120);
   DeviceInfo elsewhere = penUsage;
   elsewhere.locationId = 0x01200000;
-  EXPECT_FALSE(CLinuxHidNode::FindNode(elsewhere, node, release));
+  EXPECT_FALSE(finder.FindNode(elsewhere, node, release));
 
   CLinuxHidNode hid;
   ASSERT_EQ(hid.Open(penUsage), EHidStatus::eSuccess);
