@@ -5,9 +5,11 @@
 
 #include <cstdlib>
 #include <filesystem>
+#include <thread>
 
 #include "common/CClock.h"
 #include "common/CVirtualClock.h"
+#include "lab/CLabDeviceRegistry.h"
 #include "lab/CLabFlash.h"
 #include "lab/CLabHidNode.h"
 #include "lab/CLabI2CMaster.h"
@@ -16,6 +18,8 @@
 #include "lab/CLabScalarHid.h"
 #include "lab/CLabSession.h"
 #include "lab/CLabStateFile.h"
+#include "lab/CLabTouchBulk.h"
+#include "lab/CLabUsbControl.h"
 #include "lab/LabCrc.h"
 #include "support/LabFixture.h"
 
@@ -271,6 +275,56 @@ TEST_F(LabBus, BoardsReenumerateWithEventsAndStaleNodesAreGone) {
   Bytes status{0x14, 0, 0, 0, 0};
   EXPECT_EQ(node.GetFeatureReport(status), EHidStatus::eGone);
   EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eLoader);
+}
+
+TEST_F(LabBus, TheRegistryListsAndWatchesWhatTheBusShows) {
+  auto pen = std::make_shared<CLabPenController>();
+  auto touch = std::make_shared<CLabTouchBulk>();
+  mBus->Plug(pen);
+  mBus->Plug(touch);
+  CLabDeviceRegistry registry(mBus);
+  const std::vector<SHidEntry> hid = registry.ListHidInterfaces(0x7A71);
+  ASSERT_EQ(hid.size(), 2u) << "the pen's two usages; the touch is vendor-class";
+  EXPECT_EQ(hid[0].nodePath, "lab:01100000:000D:0002");
+  EXPECT_EQ(hid[0].version, 0x0120);
+  EXPECT_TRUE(registry.ListHidInterfaces(0x1234).empty());
+  EXPECT_EQ(registry.ListUsbDevices(0).size(), 2u);
+
+  struct SWatcher : CRegistryWatcher {
+    std::mutex lock;
+    std::vector<std::string> seen;
+    void DeviceAdded(const DeviceInfo& info_I) override {
+      std::lock_guard<std::mutex> guard(lock);
+      seen.push_back("+" + std::to_string(info_I.productId));
+    }
+    void DeviceRemoved(const DeviceInfo& info_I) override {
+      std::lock_guard<std::mutex> guard(lock);
+      seen.push_back("-" + std::to_string(info_I.productId));
+    }
+  } watcher;
+  ASSERT_TRUE(registry.OpenWatch());
+  std::thread watch([&] { registry.RunWatch(watcher); });
+
+  // The touch controller leaves its vendor interface for a HID loader.
+  CLabUsbControl usb(mBus);
+  ASSERT_EQ(usb.Open(Listed(*touch)), EUsbStatus::eSuccess);
+  std::vector<uint8_t> none;
+  size_t transferred = 0;
+  ASSERT_EQ(usb.ControlTransfer(0x41, 0xF0, 0xFFFF, 0, none, transferred), EUsbStatus::eSuccess);
+  TavSleep(1.0);
+  for (int i = 0; i < 1000; ++i) {
+    std::lock_guard<std::mutex> guard(watcher.lock);
+    if (!watcher.seen.empty()) break;
+    std::this_thread::sleep_for(std::chrono::milliseconds(1));
+  }
+  registry.StopWatching();
+  watch.join();
+  EXPECT_EQ(watcher.seen, (std::vector<std::string>{"+786"})) << "only HID comes and goes";
+  EXPECT_EQ(registry.ListHidInterfaces(0).size(), 3u);
+
+  // A stop that came first ends the next watch at once.
+  registry.StopWatching();
+  registry.RunWatch(watcher);
 }
 
 TEST_F(LabBus, ARefusedSwitchIsAcknowledgedAndIgnored) {
