@@ -62,7 +62,8 @@ TEST_F(FlashImage, ABlankWordInsideTheRangeIsSentAndAnOddTailIsTrimmed) {
   SContinuousDataBlock record = Bytes(0x1002, 14, 0x33);
   record.data[6] = record.data[7] = record.data[8] = record.data[9] = 0xFF;  // the word at 8
   ASSERT_TRUE(mDevice.LoadSRecData({record}));
-  const FLASH_BLOCK& block = mDevice.GetFlash().GetBlock(0);
+  const Flash flash = mDevice.GetFlash();
+  const FLASH_BLOCK& block = flash.GetBlock(0);
   EXPECT_EQ(block.GetWriteStartOffset(), 0u);
   EXPECT_EQ(block.GetWriteSize(), 16u);
 }

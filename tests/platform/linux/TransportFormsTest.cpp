@@ -170,7 +170,7 @@ class I2CTransport : public LabFixture {
     return {0xB2, status_I, 0, 0, 0, id_I};
   }
   static Bytes ReadReply(uint8_t status_I, size_t length_I, uint8_t id_I) {
-    Bytes reply(5 + length_I, 0x5A);
+    Bytes reply(std::max<size_t>(6, 5 + length_I), 0x5A);
     reply[0] = 0xB1;
     reply[1] = status_I;
     reply[2] = 0;
