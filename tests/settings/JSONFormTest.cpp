@@ -107,10 +107,9 @@ TEST(JSONReadTest, StringEscapesDecodeAndBadOnesFailTheDocument) {
 
 TEST(JSONReadTest, UnusableDocumentsGiveEmptyResults) {
   LogCapture capture;
-  for (const char* bad :
-       {"", "   \n\t", "// only a comment", "\"just a string\"", "42", "{", "[", "[1 2]", "[,]",
-        "[1,,2]", "{\"a\" 1}", "{\"\": 1}", "{\"a\": 1 \"b\": 2}", "{a: 1}",
-        "{\"a\": 1,", "[1+2]", "[tru]", "{\"a\": [1, 2}"}) {
+  for (const char* bad : {"", "   \n\t", "// only a comment", "\"just a string\"", "42", "{", "[",
+                          "[1 2]", "[,]", "[1,,2]", "{\"a\" 1}", "{\"\": 1}", "{\"a\": 1 \"b\": 2}",
+                          "{a: 1}", "{\"a\": 1,", "[1+2]", "[tru]", "{\"a\": [1, 2}"}) {
     EXPECT_EQ(CSettingsObject::ReadFromJSONBuffer(bad), nullptr) << bad;
   }
 }
