@@ -1,0 +1,216 @@
+#include <gtest/gtest.h>
+
+#include "common/CTavException.h"
+#include "common/StringUtilities.h"
+#include "support/LogCapture.h"
+
+namespace {
+
+using namespace StringUtilities;
+using Strings = std::vector<std::string>;
+using Bytes = std::vector<uint8_t>;
+
+TEST(Tokenize, EmptyTokensTrailingDelimiterAndEmptyText) {
+  EXPECT_EQ(Tokenize("a::b", ":", false), (Strings{"a", "", "b"}));
+  EXPECT_EQ(Tokenize("a::b", ":", true), (Strings{"a", "b"}));
+  // A delimiter at the very end adds nothing; one at the start does.
+  EXPECT_EQ(Tokenize("a:", ":", false), (Strings{"a"}));
+  EXPECT_EQ(Tokenize("a::", ":", false), (Strings{"a", ""}));
+  EXPECT_EQ(Tokenize(":a", ":", false), (Strings{"", "a"}));
+  EXPECT_EQ(Tokenize(":a", ":", true), (Strings{"a"}));
+  EXPECT_TRUE(Tokenize("", ":", false).empty());
+  EXPECT_TRUE(Tokenize(":::", ":", true).empty());
+  // Any character of the set splits; no delimiter in the text gives it whole.
+  EXPECT_EQ(Tokenize("1133:222 3,4", ": ,", true), (Strings{"1133", "222", "3", "4"}));
+  EXPECT_EQ(Tokenize("whole", ":", false), (Strings{"whole"}));
+  EXPECT_EQ(Tokenize(std::wstring(L"x;;y;"), std::wstring(L";"), false),
+            (std::vector<std::wstring>{L"x", L"", L"y"}));
+}
+
+TEST(StringUtilities, CaseTrimAndSearch) {
+  std::string text = "MiXeD 123 \xC3\x84";
+  ToLower(text);
+  EXPECT_EQ(text, "mixed 123 \xC3\x84");  // bytes above ASCII stay as they are
+  EXPECT_EQ(ToUpper_Copy("ab-Cd"), "AB-CD");
+  EXPECT_EQ(ToLower_Copy("HID"), "hid");
+
+  EXPECT_EQ(Trim_Copy(" \t\r\n x y \v\f"), "x y");
+  EXPECT_EQ(Trim_Copy("   "), "");
+  std::string padded = "  pen  ";
+  Trim(padded);
+  EXPECT_EQ(padded, "pen");
+
+  EXPECT_TRUE(IEquals("1386:890:123:1:13", "1386:890:123:1:13"));
+  EXPECT_TRUE(IEquals("Touch", "tOUCH"));
+  EXPECT_FALSE(IEquals("Touch", "Touch "));
+  EXPECT_TRUE(IEquals(std::wstring(L"Pen"), std::wstring(L"pEN")));
+  EXPECT_FALSE(IEquals(std::wstring(L"Pen"), std::wstring(L"Pan")));
+
+  EXPECT_EQ(IFindFirst("Firmware/PEN.pen", "pen"), 9u);
+  EXPECT_EQ(IFindFirst("abc", "x"), std::string::npos);
+  EXPECT_TRUE(IContains("Display Scalar", "SCALAR"));
+  EXPECT_FALSE(Contains("Display Scalar", "SCALAR"));
+  EXPECT_TRUE(Contains("Display Scalar", "Scalar"));
+
+  EXPECT_TRUE(IStartsWith("COM.tavik.x", "com.TAVIK"));
+  EXPECT_FALSE(StartsWith("COM.tavik.x", "com"));
+  EXPECT_TRUE(IEndsWith("image.HEX", ".hex"));
+  EXPECT_FALSE(EndsWith("image.HEX", ".hex"));
+  EXPECT_FALSE(IEndsWith("x", "longer"));
+}
+
+TEST(StringUtilities, IReplaceAllReplacesEveryMatchOnce) {
+  std::string text = "Pen pen PEN";
+  IReplaceAll(text, "pen", "pen-pen");
+  EXPECT_EQ(text, "pen-pen pen-pen pen-pen");
+  std::string untouched = "abc";
+  IReplaceAll(untouched, "", "x");
+  EXPECT_EQ(untouched, "abc");
+  std::string shrink = "aAaA";
+  IReplaceAll(shrink, "aa", "b");
+  EXPECT_EQ(shrink, "bb");
+}
+
+TEST(StringUtilities, FormatAndCharArrays) {
+  EXPECT_EQ(Format("%s-%04X-%d", "id", 0xBEEFu, -3), "id-BEEF--3");
+  EXPECT_EQ(Format("%s", ""), "");
+  const std::string longText(5000, 'z');
+  EXPECT_EQ(Format("<%s>", longText.c_str()).size(), 5002u);
+  EXPECT_EQ(StringFromCharArray(nullptr), "");
+  EXPECT_EQ(StringFromCharArray("abc"), "abc");
+  const std::string now = CurrentSystemTime();
+  ASSERT_EQ(now.size(), 19u);
+  EXPECT_EQ(now[4], '-');
+  EXPECT_EQ(now[13], ':');
+}
+
+TEST(UTF8, EncodeAtEveryLengthBoundary) {
+  EXPECT_EQ(EncodeUnicodePointToUTF8(0x00), std::string(1, '\0'));
+  EXPECT_EQ(EncodeUnicodePointToUTF8(0x7F), "\x7F");
+  EXPECT_EQ(EncodeUnicodePointToUTF8(0x80), "\xC2\x80");
+  EXPECT_EQ(EncodeUnicodePointToUTF8(0x7FF), "\xDF\xBF");
+  EXPECT_EQ(EncodeUnicodePointToUTF8(0x800), "\xE0\xA0\x80");
+  EXPECT_EQ(EncodeUnicodePointToUTF8(0xFFFF), "\xEF\xBF\xBF");
+  EXPECT_EQ(EncodeUnicodePointToUTF8(0x10000), "\xF0\x90\x80\x80");
+  EXPECT_EQ(EncodeUnicodePointToUTF8(0x10FFFF), "\xF4\x8F\xBF\xBF");
+  EXPECT_EQ(EncodeUnicodePointToUTF8(1114112), "");
+  EXPECT_EQ(EncodeUnicodePointToUTF8(0xFFFFFFFF), "");
+}
+
+TEST(UTF8, DecodeTakesBackEveryEncodedPoint) {
+  for (uint32_t point : {0x0u, 0x41u, 0x7Fu, 0x80u, 0x7FFu, 0x800u, 0xD800u, 0xFFFDu, 0xFFFFu,
+                         0x10000u, 0x1F600u, 0x10FFFFu}) {
+    const std::string bytes = EncodeUnicodePointToUTF8(point);
+    size_t position = 0;
+    uint32_t decoded = 0xDEAD;
+    ASSERT_TRUE(DecodeUTF8ToUnicodePoint(bytes, position, decoded)) << std::hex << point;
+    EXPECT_EQ(decoded, point);
+    EXPECT_EQ(position, bytes.size());
+    EXPECT_TRUE(IsValidUTF8(bytes));
+  }
+  // Several points in a row, the position walking over each.
+  const std::string text = "a\xC3\xA9\xE2\x82\xAC\xF0\x9F\x98\x80";
+  size_t position = 0;
+  uint32_t point = 0;
+  std::vector<uint32_t> points;
+  while (DecodeUTF8ToUnicodePoint(text, position, point)) points.push_back(point);
+  EXPECT_EQ(points, (std::vector<uint32_t>{0x61, 0xE9, 0x20AC, 0x1F600}));
+  EXPECT_EQ(position, text.size());
+}
+
+TEST(UTF8, RefusesMalformedSequences) {
+  EXPECT_TRUE(IsValidUTF8(""));
+  EXPECT_TRUE(IsValidUTF8("plain ascii"));
+  const char* bad[] = {
+      "\x80",              // continuation without a lead
+      "\xC3",              // cut two-byte sequence
+      "\xE2\x82",          // cut three-byte sequence
+      "\xC3\x41",          // lead followed by a non-continuation
+      "\xC0\x80",          // overlong NUL
+      "\xC1\xBF",          // overlong 0x7F
+      "\xE0\x9F\xBF",      // overlong 0x7FF
+      "\xF0\x8F\xBF\xBF",  // overlong 0xFFFF
+      "\xF4\x90\x80\x80",  // 0x110000, beyond Unicode
+      "\xF8\x88\x80\x80\x80",
+      "\xFF",
+  };
+  for (const char* sequence : bad) {
+    const std::string text(sequence);
+    EXPECT_FALSE(IsValidUTF8(text)) << text.size();
+    size_t position = 0;
+    uint32_t point = 7;
+    EXPECT_FALSE(DecodeUTF8ToUnicodePoint(text, position, point));
+    EXPECT_EQ(position, 0u);
+    EXPECT_EQ(point, 7u);
+  }
+  EXPECT_FALSE(IsValidUTF8("ok\xC3"));
+  size_t past = 3;
+  uint32_t point = 0;
+  EXPECT_FALSE(DecodeUTF8ToUnicodePoint("abc", past, point));
+}
+
+TEST(StringUtilities, WirelessAndRemoteIdentifiers) {
+  EXPECT_EQ(StringFromWirelessID(0xABC), "TL#000ABC");
+  EXPECT_EQ(StringFromWirelessID(0x12345678), "TL#12345678");
+  EXPECT_EQ(StringFromRemoteID(0x12345678), "R#12-345678");
+  EXPECT_EQ(StringFromRemoteID(0x0000000F), "R#00-00000F");
+
+  EXPECT_EQ(StringToRemoteID("R#12-345678"), 0x12345678u);
+  EXPECT_EQ(StringToRemoteID(StringFromRemoteID(0xFEDCBA98)), 0xFEDCBA98u);
+  EXPECT_EQ(StringToRemoteID("R#12x345678"), 0x12345678u);  // separator not looked at
+  EXPECT_EQ(StringToRemoteID("R#12-34567"), 0u);            // ten characters
+  EXPECT_EQ(StringToRemoteID("R#12-3456789"), 0u);
+  EXPECT_EQ(StringToRemoteID("X#12-345678"), 0u);
+  EXPECT_EQ(StringToRemoteID(""), 0u);
+}
+
+TEST(Base64, RoundTripsEveryTailLength) {
+  EXPECT_EQ(GetBase64({}), "");
+  EXPECT_EQ(GetBase64({0xFF}), "/w");
+  EXPECT_EQ(GetBytesFromBase64("/w"), (Bytes{0xFF}));
+  EXPECT_EQ(GetBase64({'M', 'a'}), "TWE");
+  EXPECT_EQ(GetBase64({'M', 'a', 'n'}), "TWFu");
+  EXPECT_EQ(GetBase64StrFromString("Many hands"), "TWFueSBoYW5kcw");
+  EXPECT_EQ(GetStringFromBase64("TWFueSBoYW5kcw"), "Many hands");
+
+  Bytes all(256);
+  for (size_t i = 0; i < all.size(); ++i) all[i] = static_cast<uint8_t>(i);
+  for (size_t length = 0; length <= all.size(); ++length) {
+    const Bytes bytes(all.begin(), all.begin() + static_cast<long>(length));
+    const std::string text = GetBase64(bytes);
+    EXPECT_EQ(text.size(), (length * 4 + 2) / 3);
+    EXPECT_EQ(text.find('='), std::string::npos);
+    EXPECT_EQ(GetBytesFromBase64(text), bytes) << length;
+  }
+}
+
+TEST(Base64, BadCharacterThrowsOnlyFromTheCharDecoder) {
+  EXPECT_EQ(EncodeBase64Char(0), 'A');
+  EXPECT_EQ(EncodeBase64Char(63), '/');
+  EXPECT_EQ(EncodeBase64Char(64), '=');
+  EXPECT_EQ(DecodeBase64Char('+'), 62);
+  try {
+    DecodeBase64Char('=');
+    FAIL() << "no exception";
+  } catch (const CTavException& e) {
+    EXPECT_EQ(e.GetFile(), nullptr);
+    EXPECT_EQ(e.GetLine(), 0);
+    EXPECT_EQ(e.GetMessage(), "bad char");
+    EXPECT_EQ(e.GetStatus(), 65535);
+  }
+}
+
+TEST(Base64, PaddingOrAnyBadCharacterRefusesTheWholeText) {
+  LogCapture capture;
+  // Padding, a blank, a line break: all refused, even after good groups.
+  for (const char* text : {"TWE=", "TWFu/w==", "TWFu TWFu", "TWFu\nTWFu", "TW-u", "TWFu*"}) {
+    EXPECT_TRUE(GetBytesFromBase64(text).empty()) << text;
+    EXPECT_TRUE(GetStringFromBase64(text).empty()) << text;
+  }
+  EXPECT_TRUE(capture.LogContains("[W] Base64 exception: Status: ffff,  \"bad char\"\n"));
+  // A lone last character gives no byte but is still checked.
+  EXPECT_EQ(GetBytesFromBase64("TWFuT"), (Bytes{'M', 'a', 'n'}));
+  EXPECT_TRUE(GetBytesFromBase64("TWFu=").empty());
+}
+
+}  // namespace

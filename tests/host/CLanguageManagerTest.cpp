@@ -1,0 +1,51 @@
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include "host/CLanguageManager.h"
+#include "support/LogCapture.h"
+
+namespace {
+
+// A manager whose language number and texts the test chooses.
+class FakeLanguageManager : public CLanguageManager {
+ public:
+  uint32_t GetCurrentLanguage() override { return mLanguage; }
+  std::string GetLocalizedString(const std::string& key_I) override {
+    mLastKey = key_I;
+    return "text of " + key_I;
+  }
+  using CLanguageManager::GetLocalizedString;
+
+  uint32_t mLanguage = 0;
+  std::string mLastKey;
+};
+
+TEST(LanguageTable, CodesByNumberKeepTheSharedRowsAndRefuseUnknownNumbers) {
+  LogCapture capture;
+  FakeLanguageManager manager;
+  EXPECT_TRUE(capture.Assertions().empty());
+  ASSERT_EQ(manager.GetLanguageTable().size(), CLanguageManager::LAST_ELANGUAGE);
+  for (uint32_t row = 0; row < manager.GetLanguageTable().size(); ++row) {
+    EXPECT_EQ(manager.GetLanguageTable()[row].number, row);
+  }
+
+  const struct {
+    uint32_t language;
+    const char* code;
+  } cases[] = {{0, "en"},  {1, "zh_CN"}, {2, "zh_TW"}, {3, "en"}, {5, "de"},       {10, "pt"},
+               {11, "pt"}, {18, "no"},   {23, "sk"},   {24, ""},  {0xFFFFFFFF, ""}};
+  for (const auto& entry : cases) {
+    manager.mLanguage = entry.language;
+    EXPECT_EQ(manager.GetISOLanguageCode(), entry.code) << "language " << entry.language;
+  }
+}
+
+TEST(LanguageTable, NumberedKeysJoinTableAndIdWithAColon) {
+  FakeLanguageManager manager;
+  EXPECT_EQ(manager.GetLocalizedString("200", 250), "text of 200:250");
+  EXPECT_EQ(manager.GetLocalizedString("200", 65535), "text of 200:65535");
+  EXPECT_EQ(manager.GetLocalizedString("", 0), "text of :0");
+}
+
+}  // namespace
