@@ -1,17 +1,13 @@
 #include "settings/CLinuxPersistentSettings.h"
 
-#include <pwd.h>
-#include <unistd.h>
-
-#include <cstdlib>
 #include <filesystem>
 
+#include "common/LinuxPaths.h"
+#include "common/StringUtilities.h"
 #include "common/TavLog.h"
-#include "settings/SettingsText.h"
 
 namespace {
 
-constexpr char kFolderName[] = "tavik";
 constexpr char kLegacyFolderName[] = ".tavik";
 constexpr char kFileName[] = "tdc.xml";
 // The texts the data-store service kept booleans as.
@@ -19,29 +15,15 @@ constexpr char kTrueText[] = "YES";
 constexpr char kFalseText[] = "NO";
 constexpr char kLoggingEnabledKey[] = "LOGGING_ENABLED";
 
-std::string HomeFolder() {
-  const char* home = std::getenv("HOME");
-  if (home != nullptr && home[0] != '\0') return home;
-  const passwd* entry = getpwuid(getuid());
-  return entry != nullptr && entry->pw_dir != nullptr ? entry->pw_dir : "";
-}
-
 }  // namespace
 
 CLinuxPersistentSettings::CLinuxPersistentSettings()
     : CPersistentSettings((std::filesystem::path(ConfigFolder()) / kFileName).string()) {}
 
-std::string CLinuxPersistentSettings::ConfigFolder() {
-  const char* configHome = std::getenv("XDG_CONFIG_HOME");
-  // Relative paths are invalid there and are ignored.
-  if (configHome != nullptr && configHome[0] == '/') {
-    return (std::filesystem::path(configHome) / kFolderName).string();
-  }
-  return (std::filesystem::path(HomeFolder()) / ".config" / kFolderName).string();
-}
+std::string CLinuxPersistentSettings::ConfigFolder() { return LinuxPaths::GetConfigFolderPath(); }
 
 std::string CLinuxPersistentSettings::LegacyFolder() {
-  return (std::filesystem::path(HomeFolder()) / kLegacyFolderName).string();
+  return LinuxPaths::AppendPathComponent(LinuxPaths::GetUserFolderPath(), kLegacyFolderName);
 }
 
 void CLinuxPersistentSettings::Init() {
@@ -105,7 +87,7 @@ bool CLinuxPersistentSettings::SetKeyAndBool(const std::string& key_I, bool valu
 
 bool CLinuxPersistentSettings::GetBoolForKey(const std::string& key_I,
                                              const std::string& category_I) {
-  return SettingsText::IEquals(GetStringForKey(key_I, category_I), kTrueText);
+  return StringUtilities::IEquals(GetStringForKey(key_I, category_I), kTrueText);
 }
 
 bool CLinuxPersistentSettings::SaveFile() {

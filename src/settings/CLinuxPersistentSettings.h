@@ -32,7 +32,7 @@ class CLinuxPersistentSettings : public CPersistentSettings {
 
   void SetLoggingNotifier(LoggingNotifier notifier_I) { mLoggingNotifier = std::move(notifier_I); }
 
-  // $XDG_CONFIG_HOME/tavik, or ~/.config/tavik when that is unset or relative.
+  // The user's configuration folder of the program (LinuxPaths).
   static std::string ConfigFolder();
   // ~/.tavik, where older versions kept tdc.xml.
   static std::string LegacyFolder();

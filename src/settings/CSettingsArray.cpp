@@ -2,12 +2,12 @@
 
 #include <stdexcept>
 
+#include "common/StringUtilities.h"
 #include "common/TavAssert.h"
 #include "common/TavLog.h"
 #include "settings/ASN1Coding.h"
 #include "settings/CSettingsDepthGuard.h"
 #include "settings/CSettingsNULL.h"
-#include "settings/SettingsText.h"
 #include "settings/XmlUtils.h"
 
 namespace {
@@ -92,7 +92,7 @@ bool CSettingsArray::IsStringPresent(const std::string& text_I, bool ignoreCase_
   for (const auto& object : mObjectVector) {
     auto text = std::dynamic_pointer_cast<CSettingsString>(object);
     if (!text || text->GetValue().empty()) continue;
-    if (ignoreCase_I ? SettingsText::IEquals(text->GetValue(), text_I)
+    if (ignoreCase_I ? StringUtilities::IEquals(text->GetValue(), text_I)
                      : text->GetValue() == text_I) {
       return true;
     }

@@ -1,9 +1,9 @@
 #include "settings/CSettingsBool.h"
 
+#include "common/StringUtilities.h"
 #include "common/TavLog.h"
 #include "settings/ASN1Coding.h"
 #include "settings/MathUtilities.h"
-#include "settings/SettingsText.h"
 #include "settings/XmlUtils.h"
 
 CSettingsBool::CSettingsBool(CPasskeyToken token_I, bool value_I)
@@ -14,8 +14,8 @@ std::shared_ptr<CSettingsBool> CSettingsBool::New(bool value_I) {
 }
 
 bool CSettingsBool::StringToBool(const std::string& text_I, bool default_I) {
-  if (SettingsText::IEquals(text_I, "true")) return true;
-  if (SettingsText::IEquals(text_I, "false")) return false;
+  if (StringUtilities::IEquals(text_I, "true")) return true;
+  if (StringUtilities::IEquals(text_I, "false")) return false;
   return MathUtilities::StringToInteger(text_I, default_I ? 1 : 0) != 0;
 }
 
@@ -61,7 +61,7 @@ std::shared_ptr<CSettingsBool> CSettingsBool::ReadFromXMLNode(xmlNodePtr node_I)
     TavLog::Info("CSettingsBool::ReadFromXMLNode got object of type %s\n", type.c_str());
     return nullptr;
   }
-  return New(StringToBool(SettingsText::Trim_Copy(XmlUtils::GetNodeValue(node_I)), false));
+  return New(StringToBool(StringUtilities::Trim_Copy(XmlUtils::GetNodeValue(node_I)), false));
 }
 
 std::shared_ptr<CSettingsBool> CSettingsBool::ReadFromASN1Node(const Bytes& bytes_I,

@@ -1,9 +1,9 @@
 #include "settings/CSettingsBytes.h"
 
+#include "common/StringUtilities.h"
 #include "common/TavLog.h"
 #include "settings/ASN1Coding.h"
 #include "settings/CSettingsMap.h"
-#include "settings/SettingsText.h"
 #include "settings/XmlUtils.h"
 
 CSettingsBytes::CSettingsBytes(CPasskeyToken token_I, Bytes value_I)
@@ -31,7 +31,7 @@ std::shared_ptr<CSettingsBytes> CSettingsBytes::CastToBytes(
 
 std::shared_ptr<CSettingsObject> CSettingsBytes::DeepCopy() const { return New(mValue); }
 
-std::string CSettingsBytes::GetStringValue() const { return SettingsText::GetBase64(mValue); }
+std::string CSettingsBytes::GetStringValue() const { return StringUtilities::GetBase64(mValue); }
 
 std::string CSettingsBytes::GetTraceString() const {
   return GetTypeName() + "[" + GetStringValue() + "]";
@@ -57,7 +57,7 @@ std::shared_ptr<CSettingsBytes> CSettingsBytes::ReadFromXMLNode(xmlNodePtr node_
     TavLog::Info("CSettingsBytes::ReadFromXMLNode got object of type %s\n", type.c_str());
     return nullptr;
   }
-  return New(SettingsText::GetBytesFromBase64(XmlUtils::GetNodeValue(node_I)));
+  return New(StringUtilities::GetBytesFromBase64(XmlUtils::GetNodeValue(node_I)));
 }
 
 std::shared_ptr<CSettingsBytes> CSettingsBytes::ReadFromPListNode(xmlNodePtr node_I) {
@@ -66,7 +66,7 @@ std::shared_ptr<CSettingsBytes> CSettingsBytes::ReadFromPListNode(xmlNodePtr nod
     TavLog::Info("CSettingsBytes::ReadFromPListNode got object of type %s\n", name.c_str());
     return nullptr;
   }
-  return New(SettingsText::GetBytesFromBase64(XmlUtils::GetNodeValue(node_I)));
+  return New(StringUtilities::GetBytesFromBase64(XmlUtils::GetNodeValue(node_I)));
 }
 
 std::shared_ptr<CSettingsBytes> CSettingsBytes::ReadFromJSONNode(const std::string& buffer_I,

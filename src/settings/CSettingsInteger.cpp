@@ -1,9 +1,9 @@
 #include "settings/CSettingsInteger.h"
 
+#include "common/StringUtilities.h"
 #include "common/TavLog.h"
 #include "settings/ASN1Coding.h"
 #include "settings/MathUtilities.h"
-#include "settings/SettingsText.h"
 #include "settings/XmlUtils.h"
 
 CSettingsInteger::CSettingsInteger(CPasskeyToken token_I, int64_t value_I)
@@ -57,7 +57,7 @@ std::shared_ptr<CSettingsInteger> CSettingsInteger::ReadFromXMLNode(xmlNodePtr n
     TavLog::Info("CSettingsInteger::ReadFromXMLNode got object of type %s\n", type.c_str());
     return nullptr;
   }
-  const std::string text = SettingsText::Trim_Copy(XmlUtils::GetNodeValue(node_I));
+  const std::string text = StringUtilities::Trim_Copy(XmlUtils::GetNodeValue(node_I));
   if (!MathUtilities::IsInteger(text)) {
     TavLog::Error("CSettingsInteger::ReadFromXMLNode: ERROR: bad integer: %s\n", text.c_str());
   }
@@ -70,7 +70,7 @@ std::shared_ptr<CSettingsInteger> CSettingsInteger::ReadFromPListNode(xmlNodePtr
     TavLog::Info("CSettingsInteger::ReadFromPListNode got object of type %s\n", name.c_str());
     return nullptr;
   }
-  const std::string text = SettingsText::Trim_Copy(XmlUtils::GetNodeValue(node_I));
+  const std::string text = StringUtilities::Trim_Copy(XmlUtils::GetNodeValue(node_I));
   if (!MathUtilities::IsInteger(text)) {
     TavLog::Error("CSettingsInteger::ReadFromPListNode: ERROR: bad integer: %s\n", text.c_str());
   }
@@ -93,7 +93,7 @@ std::shared_ptr<CSettingsInteger> CSettingsInteger::ReadFromJSONNode(const std::
     }
   }
   position_IO = end;
-  const std::string text = SettingsText::Trim_Copy(buffer_I.substr(start, end - start));
+  const std::string text = StringUtilities::Trim_Copy(buffer_I.substr(start, end - start));
   if (!MathUtilities::IsInteger(text)) {
     TavLog::Error("CSettingsInteger::ReadFromJSONNode: ERROR: bad integer: %s\n", text.c_str());
   }

@@ -1,9 +1,9 @@
 #include "settings/CSettingsKEString.h"
 
+#include "common/StringUtilities.h"
 #include "common/TavLog.h"
 #include "settings/ASN1Coding.h"
 #include "settings/CSettingsString.h"
-#include "settings/SettingsText.h"
 #include "settings/XmlUtils.h"
 
 CSettingsKEString::CSettingsKEString(CPasskeyToken token_I, std::string value_I)
@@ -63,8 +63,9 @@ void CSettingsKEString::AddContentToNode(xmlNodePtr node_I, const std::string& c
 }
 
 std::string CSettingsKEString::TextFromNode(xmlNodePtr node_I) {
-  return SettingsText::IReplaceAll(SettingsText::Trim_Copy(XmlUtils::GetNodeValue(node_I)),
-                                   RSQBRACKETENTITY, "]");
+  std::string text = StringUtilities::Trim_Copy(XmlUtils::GetNodeValue(node_I));
+  StringUtilities::IReplaceAll(text, RSQBRACKETENTITY, "]");
+  return text;
 }
 
 std::shared_ptr<CSettingsKEString> CSettingsKEString::ReadFromXMLNode(xmlNodePtr node_I) {

@@ -2,11 +2,11 @@
 
 #include <stdexcept>
 
+#include "common/StringUtilities.h"
 #include "common/TavAssert.h"
 #include "settings/ASN1Coding.h"
 #include "settings/CSettingsDepthGuard.h"
 #include "settings/CSettingsNULL.h"
-#include "settings/SettingsText.h"
 #include "settings/XmlUtils.h"
 
 namespace {
@@ -267,7 +267,7 @@ std::shared_ptr<CSettingsMap> CSettingsMap::ReadFromPListNode(xmlNodePtr node_I)
        child = XmlUtils::GetNextNode(child)) {
     const std::string childName = XmlUtils::GetNodeName(child);
     if (pendingKey.empty() && childName == "key") {
-      pendingKey = SettingsText::Trim_Copy(XmlUtils::GetNodeValue(child));
+      pendingKey = StringUtilities::Trim_Copy(XmlUtils::GetNodeValue(child));
     } else if (!pendingKey.empty()) {
       if (childName == "key") TAVASSERT_TEXT("childName != \"key\"");
       auto object = CSettingsObject::ReadFromPListNode(child);
@@ -305,7 +305,7 @@ std::shared_ptr<CSettingsMap> CSettingsMap::ReadFromJSONNode(const std::string& 
       if (entryComplete) {
         // {"SbyteS":"<Base64>"} is the byte-string form.
         if (map->ObjectCount() == 0 && key == SETTINGS_JSON_BYTES_KEY) {
-          value = CSettingsBytes::New(SettingsText::GetBytesFromBase64(value->GetStringValue()));
+          value = CSettingsBytes::New(StringUtilities::GetBytesFromBase64(value->GetStringValue()));
         }
         map->SetKeyAndObject(key, value);
       }

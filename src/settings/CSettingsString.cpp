@@ -1,8 +1,8 @@
 #include "settings/CSettingsString.h"
 
+#include "common/StringUtilities.h"
 #include "common/TavLog.h"
 #include "settings/ASN1Coding.h"
-#include "settings/SettingsText.h"
 #include "settings/XmlUtils.h"
 
 namespace {
@@ -80,7 +80,7 @@ std::shared_ptr<CSettingsString> CSettingsString::ReadFromXMLNode(xmlNodePtr nod
     TavLog::Info("CSettingsString::ReadFromXMLNode got object of type %s\n", type.c_str());
     return nullptr;
   }
-  return New(SettingsText::Trim_Copy(XmlUtils::GetNodeValue(node_I)));
+  return New(StringUtilities::Trim_Copy(XmlUtils::GetNodeValue(node_I)));
 }
 
 std::shared_ptr<CSettingsString> CSettingsString::ReadFromPListNode(xmlNodePtr node_I) {
@@ -89,7 +89,7 @@ std::shared_ptr<CSettingsString> CSettingsString::ReadFromPListNode(xmlNodePtr n
     TavLog::Info("CSettingsString::ReadFromPListNode got object of type %s\n", name.c_str());
     return nullptr;
   }
-  return New(SettingsText::Trim_Copy(XmlUtils::GetNodeValue(node_I)));
+  return New(StringUtilities::Trim_Copy(XmlUtils::GetNodeValue(node_I)));
 }
 
 bool CSettingsString::ReadJSONText(const std::string& buffer_I, size_t& position_IO,
@@ -124,7 +124,7 @@ bool CSettingsString::ReadJSONText(const std::string& buffer_I, size_t& position
         if (buffer_I.size() - pos < kUnicodeEscapeLength) return false;
         if (!ParseHexPoint(buffer_I, pos, point)) return false;
         pos += kUnicodeEscapeLength;
-        text_O += SettingsText::EncodeUnicodePointToUTF8(point);
+        text_O += StringUtilities::EncodeUnicodePointToUTF8(point);
         break;
       }
       default: return false;

@@ -2,8 +2,8 @@
 
 #include <stdexcept>
 
+#include "common/StringUtilities.h"
 #include "common/TavLog.h"
-#include "settings/SettingsText.h"
 
 namespace MathUtilities {
 
@@ -18,7 +18,7 @@ bool IsInteger(const std::string& text_I) {
 }
 
 int64_t StringToInteger(const std::string& text_I, int64_t default_I) {
-  const std::string text = SettingsText::Trim_Copy(text_I);
+  const std::string text = StringUtilities::Trim_Copy(text_I);
   try {
     return std::stoll(text, nullptr, 10);
   } catch (const std::exception& error) {
@@ -29,7 +29,7 @@ int64_t StringToInteger(const std::string& text_I, int64_t default_I) {
 }
 
 double StringToDouble(const std::string& text_I, double default_I) {
-  const std::string text = SettingsText::Trim_Copy(text_I);
+  const std::string text = StringUtilities::Trim_Copy(text_I);
   try {
     return std::stod(text);
   } catch (const std::exception& error) {

@@ -8,9 +8,9 @@
 #include <memory>
 #include <stdexcept>
 
+#include "common/StringUtilities.h"
 #include "common/TavAssert.h"
 #include "common/TavLog.h"
-#include "settings/SettingsText.h"
 
 namespace XmlUtils {
 
@@ -410,8 +410,8 @@ void MergeNodes(xmlNodePtr target_IO, xmlNodePtr source_I) {
   if (target_IO == nullptr || source_I == nullptr) return;
 
   const std::string sourceName = GetNodeName(source_I);
-  if (!SettingsText::IEquals(sourceName, "text") &&
-      SettingsText::IEquals(sourceName, GetNodeName(target_IO)) && IsElement(source_I) &&
+  if (!StringUtilities::IEquals(sourceName, "text") &&
+      StringUtilities::IEquals(sourceName, GetNodeName(target_IO)) && IsElement(source_I) &&
       IsElement(target_IO)) {
     for (xmlAttrPtr attribute = source_I->properties; attribute != nullptr;
          attribute = attribute->next) {
@@ -447,9 +447,9 @@ xmlNodePtr ChildMatchingNode(xmlNodePtr parent_I, xmlNodePtr node_I) {
 bool NodesMatch(xmlNodePtr a_I, xmlNodePtr b_I, bool useAttributes_I) {
   if (a_I == nullptr || b_I == nullptr) return false;
   const std::string name = GetNodeName(a_I);
-  if (!SettingsText::IEquals(name, GetNodeName(b_I))) return false;
+  if (!StringUtilities::IEquals(name, GetNodeName(b_I))) return false;
   if (!useAttributes_I) return true;
-  if (SettingsText::IEquals(name, "text") || !IsElement(a_I) || a_I->properties == nullptr) {
+  if (StringUtilities::IEquals(name, "text") || !IsElement(a_I) || a_I->properties == nullptr) {
     return true;
   }
   if (!IsElement(b_I)) return false;
@@ -457,7 +457,7 @@ bool NodesMatch(xmlNodePtr a_I, xmlNodePtr b_I, bool useAttributes_I) {
     xmlAttrPtr other = FindAttribute(b_I, attribute->name);
     if (other == nullptr) return false;
     if (FromXml(attribute->name) == "matchUsingAttributes") continue;
-    if (!SettingsText::IEquals(AttributeValue(attribute), AttributeValue(other))) return false;
+    if (!StringUtilities::IEquals(AttributeValue(attribute), AttributeValue(other))) return false;
   }
   return true;
 }
