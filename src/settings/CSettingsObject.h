@@ -5,7 +5,8 @@
 // Nodes live behind shared pointers. A missing node is an empty pointer; a
 // value stored as explicitly null is a CSettingsNULL, which every lookup
 // treats as absent. No reader throws past its entry point: a document that
-// cannot be used gives an empty pointer.
+// cannot be used gives an empty pointer, and so does one whose containers
+// nest deeper than CSettingsDepthGuard::kMaxNestingDepth (200) levels.
 
 #include <libxml/tree.h>
 

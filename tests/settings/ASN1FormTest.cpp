@@ -5,11 +5,11 @@
 
 #include <stdexcept>
 
-#include "SettingsTestTrees.h"
 #include "settings/ASN1Coding.h"
 #include "settings/CSettingsMap.h"
 #include "settings/CSettingsNULL.h"
 #include "settings/CompressionUtils.h"
+#include "settings/SettingsTestTrees.h"
 #include "support/LogCapture.h"
 
 namespace {

@@ -7,9 +7,9 @@
 #include <filesystem>
 #include <stdexcept>
 
-#include "SettingsTestTrees.h"
 #include "settings/CSettingsMap.h"
 #include "settings/CSettingsNULL.h"
+#include "settings/SettingsTestTrees.h"
 #include "settings/XmlUtils.h"
 #include "support/LogCapture.h"
 
