@@ -25,6 +25,20 @@ function(tav_gettext_catalogs)
     if(ARG_INSTALL)
       install(FILES ${moDir}/${domain}.mo DESTINATION ${CMAKE_INSTALL_DATADIR}/locale/${language}/LC_MESSAGES)
     endif()
+    # The C locale never translates, so a run without a locale uses C.UTF-8,
+    # and the English texts are filed under that name as well.
+    if(language STREQUAL "en")
+      set(cDir ${ARG_OUTPUT_DIR}/C.UTF-8/LC_MESSAGES)
+      add_custom_command(OUTPUT ${cDir}/${domain}.mo
+        COMMAND ${CMAKE_COMMAND} -E make_directory ${cDir}
+        COMMAND ${CMAKE_COMMAND} -E copy ${moDir}/${domain}.mo ${cDir}/${domain}.mo
+        DEPENDS ${moDir}/${domain}.mo
+        VERBATIM)
+      list(APPEND outputs ${cDir}/${domain}.mo)
+      if(ARG_INSTALL)
+        install(FILES ${cDir}/${domain}.mo DESTINATION ${CMAKE_INSTALL_DATADIR}/locale/C.UTF-8/LC_MESSAGES)
+      endif()
+    endif()
   endforeach()
   add_custom_target(${ARG_TARGET} ALL DEPENDS ${outputs})
 endfunction()

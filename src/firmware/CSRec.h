@@ -5,15 +5,18 @@
 
 #include <memory>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "common/TavTypes.h"
+#include "firmware/CBlockMergeIndex.h"
 #include "firmware/SContinuousDataBlock.h"
 
 class CIntelHex;
 class CBinaryAiroFlash;
 class CScalarRTDISP;
 class CScalarBinary;
+class CTextLineReader;
 
 class CSRec {
  public:
@@ -32,12 +35,38 @@ class CSRec {
   void Clear();
 
   std::vector<SContinuousDataBlock> GetSRecData() const { return mSRecData; }
+  // The same blocks without a copy, for readers that only look (a 16 MiB
+  // image in small blocks would otherwise be held twice).
+  const std::vector<SContinuousDataBlock>& GetSRecDataRef() const { return mSRecData; }
   std::shared_ptr<CIntelHex> GetIntelHexData() const { return mIntelHex; }
   std::shared_ptr<CBinaryAiroFlash> GetBinaryAiroFlashData() const { return mBinaryAiroFlash; }
   std::shared_ptr<CScalarRTDISP> GetScalarRtdIspData() const { return mScalarRtdIsp; }
   std::shared_ptr<CScalarBinary> GetScalarBinaryData() const { return mScalarBinary; }
 
+  // Two hexadecimal characters at index_I and index_I + 1 to a number. Only
+  // the first character is folded to upper case, so "3a" gives 90 and not
+  // 58; the result is not reduced to 8 bits and no character is refused.
+  static int ParseByte(std::string_view line_I, size_t index_I);
+  static bool BlocksAscSorter(const SContinuousDataBlock& a_I, const SContinuousDataBlock& b_I);
+
  private:
+  enum class ELineResult { eRead, eSkipped, eFailed };
+
+  bool LoadSRecFile(const std::string& path_I);
+  bool LoadIntelHexFile(const std::string& path_I);
+  bool LoadAiroHaBinaryFile(const std::string& path_I);
+  bool LoadScalarRtdIspFile(const std::string& path_I);
+  bool LoadScalarBinaryFile(const std::string& path_I);
+
+  bool ReadSRecLines(CTextLineReader& reader_IO);
+  void PrefetchBlock(uint32_t block_I, bool data_I) const;
+  ELineResult ReadSRecLine(std::string_view line_I, int lineNumber_I,
+                           SContinuousDataBlock& record_O);
+  bool FinishSRecData();
+  bool AddRecordToSRecData(const SContinuousDataBlock& record_I);
+  void AppendToBlock(uint32_t block_I, const SContinuousDataBlock& record_I);
+  void PrependToBlock(uint32_t block_I, const SContinuousDataBlock& record_I);
+
   std::vector<SContinuousDataBlock> mSRecData;
   std::string mUpdateFile;
   EDataSourceFormat mDataSourceFormat = EDS_UNKNOWN;
@@ -45,4 +74,10 @@ class CSRec {
   std::shared_ptr<CBinaryAiroFlash> mBinaryAiroFlash;
   std::shared_ptr<CScalarRTDISP> mScalarRtdIsp;
   std::shared_ptr<CScalarBinary> mScalarBinary;
+
+  // Only while an S-record file is read: where each block of mSRecData may
+  // take a record, and how many unused bytes lie in front of each block's
+  // data, so that records in descending order cost no move of the block.
+  CBlockMergeIndex mMergeIndex;
+  std::vector<size_t> mFrontRoom;
 };

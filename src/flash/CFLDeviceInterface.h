@@ -38,6 +38,7 @@ class CFLDeviceInterface {
   virtual EINTERFACE_TYPE GetInterfaceType() const { return mInterfaceType; }
   virtual void SetPath(const std::string& path_I) { mPath = path_I; }
   virtual std::string GetPath() const { return mPath; }
+  virtual uint32_t GetVersion() const { return mVersion; }
   virtual std::string ToString() const = 0;
 
   // Reads the loader's parameters and lays the S-record image over its
@@ -70,6 +71,7 @@ class CFLDeviceInterface {
   CInterfaceNotifier* mNotifier = nullptr;  // borrowed
   EINTERFACE_TYPE mInterfaceType = EINVALID_INTERFACE;
   std::string mPath;
+  uint32_t mVersion = 0;
   bool mIsFlashLoader = false;
   EDataSourceFormat mDataSourceFormat = EDS_UNKNOWN;
   BL_HID_REP_GET_BL_PARAMETERS mBLParams{};

@@ -4,6 +4,7 @@
 
 #include <climits>
 #include <clocale>
+#include <cstring>
 #include <cstdlib>
 #include <filesystem>
 #include <mutex>
@@ -63,9 +64,15 @@ std::string ExecutableDirectory() {
 
 CLinuxLanguageManager::CLinuxLanguageManager(const std::string& localeDirectory_I)
     : mLocaleDirectory(localeDirectory_I) {
-  if (std::setlocale(LC_MESSAGES, "") == nullptr) {
+  const char* chosen = std::setlocale(LC_MESSAGES, "");
+  if (chosen == nullptr) {
     TavLog::Warning(
         "The message locale of the environment is not installed; texts stay in English\n");
+  }
+  // gettext never translates under C or POSIX, which would show the user
+  // bare keys; C.UTF-8 reads the English catalogs filed under that name.
+  if (chosen == nullptr || std::strcmp(chosen, "C") == 0 || std::strcmp(chosen, "POSIX") == 0) {
+    std::setlocale(LC_MESSAGES, "C.UTF-8");
   }
   BindDomain(kApplicationDomain, mLocaleDirectory);
   BindDomain(kDevicesDomain, mLocaleDirectory);

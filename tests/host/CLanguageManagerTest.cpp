@@ -7,18 +7,13 @@
 
 namespace {
 
-// A manager whose language number and texts the test chooses.
+// A manager whose language number the test chooses.
 class FakeLanguageManager : public CLanguageManager {
  public:
   uint32_t GetCurrentLanguage() override { return mLanguage; }
-  std::string GetLocalizedString(const std::string& key_I) override {
-    mLastKey = key_I;
-    return "text of " + key_I;
-  }
-  using CLanguageManager::GetLocalizedString;
+  std::string GetLocalizedString(const std::string& key_I) override { return key_I; }
 
   uint32_t mLanguage = 0;
-  std::string mLastKey;
 };
 
 TEST(LanguageTable, CodesByNumberKeepTheSharedRowsAndRefuseUnknownNumbers) {
@@ -39,13 +34,6 @@ TEST(LanguageTable, CodesByNumberKeepTheSharedRowsAndRefuseUnknownNumbers) {
     manager.mLanguage = entry.language;
     EXPECT_EQ(manager.GetISOLanguageCode(), entry.code) << "language " << entry.language;
   }
-}
-
-TEST(LanguageTable, NumberedKeysJoinTableAndIdWithAColon) {
-  FakeLanguageManager manager;
-  EXPECT_EQ(manager.GetLocalizedString("200", 250), "text of 200:250");
-  EXPECT_EQ(manager.GetLocalizedString("200", 65535), "text of 200:65535");
-  EXPECT_EQ(manager.GetLocalizedString("", 0), "text of :0");
 }
 
 }  // namespace

@@ -125,6 +125,8 @@ TEST(LinuxLanguageManager, EveryShippedLanguageHasEveryShownTextAndItsOwnNumber)
   LocaleEnvironment environment("en");
   std::vector<std::string> languages;
   for (const auto& entry : std::filesystem::directory_iterator(kShippedCatalogs)) {
+    // The English catalogs filed again for the C locale are no language.
+    if (entry.path().filename() == "C.UTF-8") continue;
     languages.push_back(entry.path().filename().string());
   }
   ASSERT_GE(languages.size(), 2u);
@@ -187,6 +189,28 @@ TEST(LinuxLanguageManager, AnExplicitLocaleFolderOverridesTheSearch) {
   CLinuxLanguageManager::SetLocaleDirectory("");
   EXPECT_EQ(std::filesystem::path(CLinuxLanguageManager::GetLocaleDirectory()),
             std::filesystem::path(kTestCatalogs).lexically_normal());
+}
+
+}  // namespace
+
+namespace {
+
+TEST(LinuxLanguageManager, NoLocaleOrAnUninstalledOneStillShowsTheEnglishTexts) {
+  // Neither the C locale nor a missing one may leave the user with bare keys.
+  for (const char* lang : {"", "xx_YY.UTF-8"}) {
+    LocaleEnvironment environment("en");
+    unsetenv("LANGUAGE");
+    unsetenv("LC_ALL");
+    if (lang[0] == '\0') {
+      unsetenv("LANG");
+    } else {
+      setenv("LANG", lang, 1);
+    }
+    CLinuxLanguageManager manager(kShippedCatalogs);
+    EXPECT_EQ(manager.GetLocalizedString("Programming Failed"), "Programming Failed") << lang;
+    EXPECT_NE(manager.GetLocalizedString("200:250"), "200:250") << lang;
+    EXPECT_EQ(manager.GetCurrentLanguage(), 0u);
+  }
 }
 
 }  // namespace

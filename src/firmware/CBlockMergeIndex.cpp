@@ -1,0 +1,262 @@
+#include "firmware/CBlockMergeIndex.h"
+
+#include <algorithm>
+
+CBlockMergeIndex::CBlockMergeIndex(unsigned pageBits_I)
+    : mPageBits(std::clamp(pageBits_I, 1u, 30u)), mOffsetMask((uint32_t{1} << mPageBits) - 1) {}
+
+void CBlockMergeIndex::Clear() {
+  mSlots = {};
+  mUsedSlots = 0;
+  mSlotBits = 0;
+  mOtherStarts = {};
+  mScratch = {};
+  mCachedKey = UINT64_MAX;
+  mCachedPage = nullptr;
+  mHintPage = nullptr;
+  mHintIndex = 0;
+}
+
+uint32_t CBlockMergeIndex::FirstTaker(uint64_t address_I, uint64_t size_I) const {
+  return std::min(LowestCoveringBlock(address_I), StartMinAt(address_I + size_I));
+}
+
+void CBlockMergeIndex::BlockAdded(uint32_t block_I, uint64_t start_I, uint64_t size_I) {
+  Paint(start_I, start_I + size_I, block_I, true);
+}
+
+void CBlockMergeIndex::BlockAppended(uint32_t block_I, uint64_t address_I, uint64_t size_I) {
+  Paint(address_I, address_I + size_I, block_I, false);
+}
+
+void CBlockMergeIndex::BlockPrepended(uint32_t block_I, uint64_t address_I, uint64_t size_I) {
+  // Without data the block neither grows nor moves its start.
+  if (size_I == 0) return;
+  Paint(address_I, address_I + size_I, block_I, true);
+  RemoveStart(address_I + size_I, block_I);
+}
+
+uint32_t CBlockMergeIndex::LowestCoveringBlock(uint64_t address_I) const {
+  const SPage* page = FindPage(address_I >> mPageBits);
+  if (page == nullptr) return kNoBlock;
+  const uint32_t offset = static_cast<uint32_t>(address_I) & mOffsetMask;
+  return page->entries[EntryAtOrBefore(*page, offset)].label;
+}
+
+uint32_t CBlockMergeIndex::StartMinAt(uint64_t point_I) const {
+  const SPage* page = FindPage(point_I >> mPageBits);
+  if (page == nullptr) return kNoBlock;
+  const uint32_t offset = static_cast<uint32_t>(point_I) & mOffsetMask;
+  const SEntry& entry = page->entries[EntryAtOrBefore(*page, offset)];
+  return entry.offset == offset ? entry.startMin : kNoBlock;
+}
+
+void CBlockMergeIndex::PrefetchSlot(uint64_t address_I) const {
+  if (mSlots.empty()) return;
+  const uint64_t key = address_I >> mPageBits;
+  __builtin_prefetch(
+      &mSlots[static_cast<size_t>((key * 0x9E3779B97F4A7C15ull) >> (64 - mSlotBits))]);
+}
+
+void CBlockMergeIndex::PrefetchEntries(uint64_t address_I) const {
+  static constexpr size_t kCacheLine = 64;
+  static constexpr size_t kMostLines = 8;
+  if (mSlots.empty()) return;
+  const SSlot& slot = mSlots[SlotOf(address_I >> mPageBits)];
+  if (slot.key == kNoKey) return;
+  const char* bytes = reinterpret_cast<const char*>(slot.page.entries.data());
+  const size_t size = std::min(slot.page.entries.size() * sizeof(SEntry), kMostLines * kCacheLine);
+  for (size_t offset = 0; offset < size; offset += kCacheLine) __builtin_prefetch(bytes + offset);
+}
+
+size_t CBlockMergeIndex::SlotOf(uint64_t key_I) const {
+  const size_t mask = mSlots.size() - 1;
+  size_t slot = static_cast<size_t>((key_I * 0x9E3779B97F4A7C15ull) >> (64 - mSlotBits));
+  while (mSlots[slot].key != key_I && mSlots[slot].key != kNoKey) slot = (slot + 1) & mask;
+  return slot;
+}
+
+const CBlockMergeIndex::SPage* CBlockMergeIndex::FindPage(uint64_t key_I) const {
+  if (key_I == mCachedKey) return mCachedPage;
+  if (mSlots.empty()) return nullptr;
+  const size_t slot = SlotOf(key_I);
+  if (mSlots[slot].key == kNoKey) return nullptr;
+  mCachedKey = key_I;
+  mCachedPage = const_cast<SPage*>(&mSlots[slot].page);
+  return mCachedPage;
+}
+
+CBlockMergeIndex::SPage& CBlockMergeIndex::GetPage(uint64_t key_I) {
+  if (key_I == mCachedKey) return *mCachedPage;
+  if ((mUsedSlots + 1) * 4 > mSlots.size() * 3) GrowSlots();
+  const size_t slot = SlotOf(key_I);
+  SSlot& place = mSlots[slot];
+  if (place.key == kNoKey) {
+    place.key = key_I;
+    place.page.entries.push_back({0, kNoBlock, kNoBlock});
+    ++mUsedSlots;
+  }
+  mCachedKey = key_I;
+  mCachedPage = &place.page;
+  return place.page;
+}
+
+// Doubles the table. Pages move, so the remembered page and search go.
+void CBlockMergeIndex::GrowSlots() {
+  std::vector<SSlot> old;
+  old.swap(mSlots);
+  mSlotBits = old.empty() ? 6 : mSlotBits + 1;
+  mSlots.resize(size_t{1} << mSlotBits);
+  for (SSlot& slot : old) {
+    if (slot.key == kNoKey) continue;
+    SSlot& place = mSlots[SlotOf(slot.key)];
+    place.key = slot.key;
+    place.page = std::move(slot.page);
+  }
+  mCachedKey = UINT64_MAX;
+  mCachedPage = nullptr;
+  mHintPage = nullptr;
+}
+
+size_t CBlockMergeIndex::EntryAtOrBefore(const SPage& page_I, uint32_t offset_I) const {
+  static constexpr int kShortWalk = 4;
+  const std::vector<SEntry>& entries = page_I.entries;
+  const size_t count = entries.size();
+  size_t found = count;
+  if (&page_I == mHintPage) {
+    size_t i = std::min(mHintIndex, count - 1);
+    if (entries[i].offset <= offset_I) {
+      for (int step = 0; step < kShortWalk && i + 1 < count && entries[i + 1].offset <= offset_I;
+           ++step) {
+        ++i;
+      }
+      if (i + 1 == count || entries[i + 1].offset > offset_I) found = i;
+    } else {
+      // Walking down from an entry past the offset: the first one at or
+      // before it is the answer. Entry 0 is at offset 0, so the walk ends.
+      for (int step = 0; step < kShortWalk && entries[i].offset > offset_I; ++step) --i;
+      if (entries[i].offset <= offset_I) found = i;
+    }
+  }
+  if (found == count) {
+    auto after = std::upper_bound(
+        entries.begin(), entries.end(), offset_I,
+        [](uint32_t offset_I, const SEntry& entry_I) { return offset_I < entry_I.offset; });
+    found = static_cast<size_t>(after - entries.begin()) - 1;
+  }
+  mHintPage = &page_I;
+  mHintIndex = found;
+  return found;
+}
+
+// Lowers the paint of every address from first_I to last_I, both included,
+// to block_I where it is higher. With startsAtFirst_I the block also starts
+// at first_I.
+void CBlockMergeIndex::Paint(uint64_t first_I, uint64_t last_I, uint32_t block_I,
+                             bool startsAtFirst_I) {
+  const uint64_t firstKey = first_I >> mPageBits;
+  const uint64_t lastKey = last_I >> mPageBits;
+  for (uint64_t key = firstKey; key <= lastKey; ++key) {
+    const uint32_t low = key == firstKey ? static_cast<uint32_t>(first_I) & mOffsetMask : 0;
+    const uint32_t high =
+        key == lastKey ? static_cast<uint32_t>(last_I) & mOffsetMask : mOffsetMask;
+    PaintInPage(GetPage(key), key << mPageBits, low, high, block_I,
+                startsAtFirst_I && key == firstKey);
+  }
+}
+
+// Builds the entries from low_I to high_I + 1 anew and puts them in place of
+// the old ones in one move: the point after the range keeps its paint, the
+// points in it take the lower of their paint and block_I, and entries that
+// repeat the paint before them without starting a block are left out.
+void CBlockMergeIndex::PaintInPage(SPage& page_I, uint64_t pageBase_I, uint32_t low_I,
+                                   uint32_t high_I, uint32_t block_I, bool startsAtLow_I) {
+  std::vector<SEntry>& entries = page_I.entries;
+  const size_t atLow = EntryAtOrBefore(page_I, low_I);
+  const bool haveLow = entries[atLow].offset == low_I;
+  size_t interiorEnd = atLow + 1;
+  while (interiorEnd < entries.size() && entries[interiorEnd].offset <= high_I) ++interiorEnd;
+  const bool lastInPage = high_I == mOffsetMask;
+  const bool haveAfter =
+      !lastInPage && interiorEnd < entries.size() && entries[interiorEnd].offset == high_I + 1;
+
+  mScratch.clear();
+  SEntry first{low_I, std::min(entries[atLow].label, block_I),
+               haveLow ? entries[atLow].startMin : kNoBlock};
+  if (startsAtLow_I) ClaimStart(pageBase_I + low_I, first.startMin, block_I);
+  mScratch.push_back(first);
+  for (size_t i = atLow + 1; i < interiorEnd; ++i) {
+    mScratch.push_back(
+        {entries[i].offset, std::min(entries[i].label, block_I), entries[i].startMin});
+  }
+  if (!lastInPage) {
+    const SEntry& source = haveAfter ? entries[interiorEnd] : entries[interiorEnd - 1];
+    mScratch.push_back({high_I + 1, source.label, haveAfter ? source.startMin : kNoBlock});
+  }
+
+  const size_t replaceBegin = haveLow ? atLow : atLow + 1;
+  const size_t replaceEnd = interiorEnd + (haveAfter ? 1 : 0);
+  // The entry at offset 0 stays whatever it holds.
+  const bool keepFirst = replaceBegin == 0;
+  uint32_t previous = keepFirst ? kNoBlock : entries[replaceBegin - 1].label;
+  size_t kept = 0;
+  for (size_t i = 0; i < mScratch.size(); ++i) {
+    const SEntry& entry = mScratch[i];
+    const bool needed =
+        (i == 0 && keepFirst) || entry.startMin != kNoBlock || entry.label != previous;
+    if (!needed) continue;
+    previous = entry.label;
+    mScratch[kept++] = entry;
+  }
+
+  const size_t oldCount = replaceEnd - replaceBegin;
+  const auto place = entries.begin() + static_cast<ptrdiff_t>(replaceBegin);
+  const size_t same = std::min(kept, oldCount);
+  std::copy(mScratch.begin(), mScratch.begin() + static_cast<ptrdiff_t>(same), place);
+  if (kept < oldCount) {
+    entries.erase(place + static_cast<ptrdiff_t>(kept), place + static_cast<ptrdiff_t>(oldCount));
+  } else if (kept > oldCount) {
+    entries.insert(place + static_cast<ptrdiff_t>(oldCount),
+                   mScratch.begin() + static_cast<ptrdiff_t>(oldCount),
+                   mScratch.begin() + static_cast<ptrdiff_t>(kept));
+  }
+  mHintPage = &page_I;
+  mHintIndex = replaceBegin;
+}
+
+// Several blocks can start at one point; the entry holds the lowest.
+void CBlockMergeIndex::ClaimStart(uint64_t point_I, uint32_t& startMin_IO, uint32_t block_I) {
+  if (startMin_IO == kNoBlock) {
+    startMin_IO = block_I;
+  } else if (block_I < startMin_IO) {
+    mOtherStarts[point_I].push_back(startMin_IO);
+    startMin_IO = block_I;
+  } else {
+    mOtherStarts[point_I].push_back(block_I);
+  }
+}
+
+void CBlockMergeIndex::RemoveStart(uint64_t point_I, uint32_t block_I) {
+  SPage& page = GetPage(point_I >> mPageBits);
+  const uint32_t offset = static_cast<uint32_t>(point_I) & mOffsetMask;
+  const size_t index = EntryAtOrBefore(page, offset);
+  SEntry& entry = page.entries[index];
+  if (entry.offset != offset) return;
+
+  auto others = mOtherStarts.find(point_I);
+  if (entry.startMin == block_I) {
+    entry.startMin = kNoBlock;
+    if (others != mOtherStarts.end()) {
+      auto lowest = std::min_element(others->second.begin(), others->second.end());
+      entry.startMin = *lowest;
+      others->second.erase(lowest);
+    }
+  } else if (others != mOtherStarts.end()) {
+    std::erase(others->second, block_I);
+  }
+  if (others != mOtherStarts.end() && others->second.empty()) mOtherStarts.erase(others);
+
+  const bool repeatsPaint =
+      index > 0 && entry.startMin == kNoBlock && entry.label == page.entries[index - 1].label;
+  if (repeatsPaint) page.entries.erase(page.entries.begin() + static_cast<ptrdiff_t>(index));
+}
