@@ -44,8 +44,10 @@ SToolResult RunTool(const std::string& command_I) {
   return result;
 }
 
+// Named after the running test too: ctest runs tests side by side.
 fs::path WriteTemp(const std::string& name_I, const std::string& content_I) {
-  const fs::path path = fs::temp_directory_path() / ("settings-interop-" + name_I);
+  const std::string test = ::testing::UnitTest::GetInstance()->current_test_info()->name();
+  const fs::path path = fs::temp_directory_path() / ("settings-interop-" + test + "-" + name_I);
   std::ofstream(path, std::ios::binary) << content_I;
   return path;
 }
