@@ -12,6 +12,7 @@ PACKAGES=(
   qt6-base-dev gettext
   umockdev libumockdev-dev libglib2.0-dev
   srecord binutils python3 dbus-daemon
+  openssl
 )
 
 missing=()
