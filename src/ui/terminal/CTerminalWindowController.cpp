@@ -249,13 +249,18 @@ bool CTerminalWindowController::IsMainLoopThread() const { return mLoop->IsLoopT
 void CTerminalWindowController::DrawStatusLine() {
   const int columns = GetColumns();
   const int cells = std::clamp(columns / 6, kMinBarCells, kMaxBarCells);
-  std::string line = RenderBar(mProgress, cells) + " " + RenderPercent(mProgress);
-  if (!mStatusText.empty()) line += " " + OneLine(mStatusText);
+  std::string line = RenderBar(mProgress, cells);
+  line += ' ';
+  line += RenderPercent(mProgress);
+  if (!mStatusText.empty()) {
+    line += ' ';
+    line += OneLine(mStatusText);
+  }
   // The last column stays free: writing into it makes some terminals wrap,
   // and the carriage return would then redraw the wrong line.
   line = CutToColumns(line, columns - 1);
   if (mLineOnScreen && line == mDrawnLine) return;
-  Write(kRedrawLine + line);
+  Write(std::string(kRedrawLine).append(line));
   mDrawnLine = line;
   mLineOnScreen = true;
 }
