@@ -21,6 +21,15 @@
 
 class CSRecBlockBuilder {
  public:
+  CSRecBlockBuilder() = default;
+  // Records live only while one file is read, and a front-end is copied
+  // between loads: a copy starts empty.
+  CSRecBlockBuilder(const CSRecBlockBuilder&) {}
+  CSRecBlockBuilder& operator=(const CSRecBlockBuilder&) {
+    Clear();
+    return *this;
+  }
+
   void Clear();
   // Keeps a copy of the record's data.
   void Add(uint32_t address_I, const uint8_t* data_I, size_t size_I);

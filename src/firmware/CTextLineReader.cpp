@@ -20,7 +20,9 @@ bool CTextLineReader::Next(char*& line_O, size_t& length_O) {
     mScanned = mEnd;
     if (!mAtEnd && Fill()) continue;
     if (mBegin == mEnd) return false;
-    // The last line has no line feed; the spare byte takes its NUL.
+    // The last line has no line feed; the spare byte takes its NUL. Fill may
+    // have moved the buffer.
+    start = mBuffer.data();
     start[mEnd] = '\0';
     line_O = start + mBegin;
     length_O = mEnd - mBegin;
