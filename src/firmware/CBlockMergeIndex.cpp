@@ -58,24 +58,6 @@ uint32_t CBlockMergeIndex::StartMinAt(uint64_t point_I) const {
   return page->offsets[index] == offset ? page->marks[index].startMin : kNoBlock;
 }
 
-void CBlockMergeIndex::PrefetchSlot(uint64_t address_I) const {
-  if (mSlots.empty()) return;
-  const uint64_t key = address_I >> mPageBits;
-  __builtin_prefetch(&mSlots[static_cast<size_t>((key * kHashFactor) >> (64 - mSlotBits))]);
-}
-
-void CBlockMergeIndex::PrefetchEntries(uint64_t address_I) const {
-  static constexpr size_t kCacheLine = 64;
-  static constexpr size_t kMostLines = 8;
-  if (mSlots.empty()) return;
-  const SSlot& slot = mSlots[SlotOf(address_I >> mPageBits)];
-  if (slot.key == kNoKey) return;
-  const char* bytes = reinterpret_cast<const char*>(slot.page.offsets.data());
-  const size_t size =
-      std::min(slot.page.offsets.size() * sizeof(uint16_t), kMostLines * kCacheLine);
-  for (size_t offset = 0; offset < size; offset += kCacheLine) __builtin_prefetch(bytes + offset);
-}
-
 size_t CBlockMergeIndex::SlotOf(uint64_t key_I) const {
   const size_t mask = mSlots.size() - 1;
   size_t slot = static_cast<size_t>((key_I * kHashFactor) >> (64 - mSlotBits));

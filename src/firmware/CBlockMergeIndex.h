@@ -44,11 +44,6 @@ class CBlockMergeIndex {
   // size_I bytes were put in front of the block, which now starts at address_I.
   void BlockPrepended(uint32_t block_I, uint64_t address_I, uint64_t size_I);
 
-  // Hints for a record that will be merged a few records later: bring the
-  // page slot, then the page's entries into the cache. They change nothing.
-  void PrefetchSlot(uint64_t address_I) const;
-  void PrefetchEntries(uint64_t address_I) const;
-
   // Tests look at the paint of a single address.
   uint32_t LowestCoveringBlock(uint64_t address_I) const;
 

@@ -1,5 +1,7 @@
 #include "firmware/CSRec.h"
 
+#include <sys/stat.h>
+
 #include <algorithm>
 #include <cerrno>
 #include <cstdio>
@@ -148,6 +150,10 @@ bool CSRec::LoadSRecFile(const std::string& path_I) {
   }
 
   TavLog::Info("LoadSRecFile - lines\n");
+  struct stat status;
+  if (fstat(fileno(file), &status) == 0 && S_ISREG(status.st_mode)) {
+    mBlockBuilder.ReserveFor(static_cast<uint64_t>(status.st_size));
+  }
   CTextLineReader reader(file);
   const bool read = ReadSRecLines(reader);
   std::fclose(file);

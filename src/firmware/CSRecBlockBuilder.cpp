@@ -1,5 +1,7 @@
 #include "firmware/CSRecBlockBuilder.h"
 
+#include <malloc.h>
+
 #include <algorithm>
 #include <cstring>
 
@@ -14,6 +16,13 @@ void CSRecBlockBuilder::Clear() {
   mBlocks = {};
 }
 
+void CSRecBlockBuilder::ReserveFor(uint64_t textBytes_I) {
+  // A data record takes at least ten characters and a line feed.
+  static constexpr uint64_t kShortestRecord = 11;
+  static constexpr uint64_t kMostReserved = uint64_t{1} << 26;
+  mRecords.reserve(static_cast<size_t>(std::min(textBytes_I / kShortestRecord, kMostReserved)));
+}
+
 void CSRecBlockBuilder::Add(uint32_t address_I, const uint8_t* data_I, size_t size_I) {
   mRecords.push_back({address_I, static_cast<uint32_t>(size_I)});
   if (size_I > 0) std::memcpy(mData.Append(size_I), data_I, size_I);
@@ -24,6 +33,7 @@ void CSRecBlockBuilder::Add(uint32_t address_I, const uint8_t* data_I, size_t si
 std::vector<SContinuousDataBlock> CSRecBlockBuilder::Build() {
   mBlockOf.assign(mRecords.size(), kDropped);
   mBlocks.clear();
+  mBlocks.reserve(mRecords.size());  // address space only, as above
   if (mAscending) {
     JoinNeighbours({});
   } else {
@@ -34,7 +44,10 @@ std::vector<SContinuousDataBlock> CSRecBlockBuilder::Build() {
       MergeOneByOne();
     }
   }
-  mBlocks.shrink_to_fit();  // held through the fill, when memory peaks
+  // The sort's buffers may have come from the heap, where freeing keeps
+  // them resident; hand their pages back before the blocks are filled,
+  // when memory peaks.
+  malloc_trim(0);
   std::vector<SContinuousDataBlock> blocks = Fill();
   Clear();
   return blocks;

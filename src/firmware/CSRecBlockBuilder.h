@@ -31,6 +31,10 @@ class CSRecBlockBuilder {
   }
 
   void Clear();
+  // Room for every record a text of this many bytes can hold. Only address
+  // space: the pages are touched as records come, and the list never has to
+  // move to grow, which would hold it twice for a moment.
+  void ReserveFor(uint64_t textBytes_I);
   // Keeps a copy of the record's data.
   void Add(uint32_t address_I, const uint8_t* data_I, size_t size_I);
   size_t RecordCount() const { return mRecords.size(); }

@@ -55,27 +55,38 @@ inline std::string HexBytes(const std::vector<uint8_t>& bytes_I) {
 // One S1, S2 or S3 line (type_I '1', '2' or '3') with its count and checksum.
 inline std::string SRecLine(char type_I, uint32_t address_I, const std::vector<uint8_t>& data_I) {
   const int addressBytes = type_I == '1' ? 2 : type_I == '2' ? 3 : 4;
-  std::vector<uint8_t> body{static_cast<uint8_t>(addressBytes + data_I.size() + 1)};
-  for (int i = addressBytes - 1; i >= 0; --i)
+  std::vector<uint8_t> body;
+  body.reserve(data_I.size() + 6);
+  body.push_back(static_cast<uint8_t>(addressBytes + data_I.size() + 1));
+  for (int i = addressBytes - 1; i >= 0; --i) {
     body.push_back(static_cast<uint8_t>(address_I >> (8 * i)));
+  }
   body.insert(body.end(), data_I.begin(), data_I.end());
   unsigned sum = 0;
   for (uint8_t byte : body) sum += byte;
   body.push_back(static_cast<uint8_t>(~sum));
-  return std::string("S") + type_I + HexBytes(body);
+  std::string line(1, 'S');
+  line.push_back(type_I);
+  line.append(HexBytes(body));
+  return line;
 }
 
 // One Intel hex record with its checksum, without line end.
 inline std::string HexRecord(uint8_t type_I, uint16_t address_I,
                              const std::vector<uint8_t>& data_I) {
-  std::vector<uint8_t> body{static_cast<uint8_t>(data_I.size()),
-                            static_cast<uint8_t>(address_I >> 8), static_cast<uint8_t>(address_I),
-                            type_I};
+  std::vector<uint8_t> body;
+  body.reserve(data_I.size() + 5);
+  body.push_back(static_cast<uint8_t>(data_I.size()));
+  body.push_back(static_cast<uint8_t>(address_I >> 8));
+  body.push_back(static_cast<uint8_t>(address_I));
+  body.push_back(type_I);
   body.insert(body.end(), data_I.begin(), data_I.end());
   unsigned sum = 0;
   for (uint8_t byte : body) sum += byte;
   body.push_back(static_cast<uint8_t>(-sum));
-  return ":" + HexBytes(body);
+  std::string record(1, ':');
+  record.append(HexBytes(body));
+  return record;
 }
 
 inline std::vector<uint8_t> Bytes(size_t count_I, uint8_t first_I = 0) {
