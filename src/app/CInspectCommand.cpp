@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <charconv>
 #include <cstring>
 #include <vector>
 
@@ -44,6 +45,22 @@ const SFormatText& TextOf(EDataSourceFormat format_I) {
 bool IsSRecord(EDataSourceFormat format_I) {
   return format_I == EDS_SREC_PEN || format_I == EDS_SREC_TOUCH || format_I == EDS_SREC_GENERIC;
 }
+
+// A listing can hold a line for each of a few hundred thousand blocks: the
+// lines are built by hand into one text rather than printed one by one.
+void AppendNumber(std::string& text_IO, uint64_t value_I) {
+  char digits[24];
+  const auto end = std::to_chars(digits, digits + sizeof digits, value_I).ptr;
+  text_IO.append(digits, end);
+}
+
+void AppendHex8(std::string& text_IO, uint32_t value_I) {
+  static constexpr char kDigits[] = "0123456789ABCDEF";
+  for (int shift = 28; shift >= 0; shift -= 4) text_IO += kDigits[(value_I >> shift) & 0x0F];
+}
+
+// How many blocks ahead a walk over blocks asks for their data.
+constexpr size_t kAhead = 48;
 
 uint64_t ByteSum(const std::vector<uint8_t>& data_I) {
   uint64_t sum = 0;
@@ -221,13 +238,27 @@ void CInspectCommand::PrintText(const CSRec& source_I, std::FILE* out_IO) const 
   if (IsSRecord(format)) {
     const std::vector<SContinuousDataBlock>& blocks = source_I.GetSRecDataRef();
     uint64_t total = 0;
-    std::fprintf(out_IO, "Blocks: %zu\n", blocks.size());
-    for (const SContinuousDataBlock& block : blocks) {
-      std::fprintf(out_IO, "  start 0x%08X  size %zu  sum %llu\n", block.startAddress,
-                   block.data.size(), static_cast<unsigned long long>(ByteSum(block.data)));
+    std::string text = "Blocks: ";
+    text.reserve(blocks.size() * 48 + 64);
+    AppendNumber(text, blocks.size());
+    text += '\n';
+    for (size_t i = 0; i < blocks.size(); ++i) {
+      const SContinuousDataBlock& block = blocks[i];
+      // Small blocks lie all over the heap; ask for one well ahead.
+      if (i + kAhead < blocks.size()) __builtin_prefetch(blocks[i + kAhead].data.data());
+      text += "  start 0x";
+      AppendHex8(text, block.startAddress);
+      text += "  size ";
+      AppendNumber(text, block.data.size());
+      text += "  sum ";
+      AppendNumber(text, ByteSum(block.data));
+      text += '\n';
       total += block.data.size();
     }
-    std::fprintf(out_IO, "Bytes: %llu\n", static_cast<unsigned long long>(total));
+    text += "Bytes: ";
+    AppendNumber(text, total);
+    text += '\n';
+    std::fwrite(text.data(), 1, text.size(), out_IO);
   } else if (format == EDS_INTEL_HEX) {
     const CIntelHex& hex = *source_I.GetIntelHexData();
     std::fprintf(out_IO, "Start address: 0x%08X\nSize: %u\nChecksum: 0x%04X\n", hex.StartAddress(),
@@ -252,10 +283,13 @@ void CInspectCommand::PrintJson(const CSRec& source_I, std::FILE* out_IO) const 
     json += ",\"blocks\":[";
     bool first = true;
     for (const SContinuousDataBlock& block : source_I.GetSRecDataRef()) {
-      json += first ? "" : ",";
-      json += "{\"start\":" + std::to_string(block.startAddress) +
-              ",\"size\":" + std::to_string(block.data.size()) +
-              ",\"sum\":" + std::to_string(ByteSum(block.data)) + "}";
+      json += first ? "{\"start\":" : ",{\"start\":";
+      AppendNumber(json, block.startAddress);
+      json += ",\"size\":";
+      AppendNumber(json, block.data.size());
+      json += ",\"sum\":";
+      AppendNumber(json, ByteSum(block.data));
+      json += '}';
       total += block.data.size();
       first = false;
     }
@@ -286,7 +320,9 @@ bool CInspectCommand::WriteImage(const CSRec& source_I, std::string& reason_O) c
   if (IsSRecord(format)) {
     const std::vector<SContinuousDataBlock>& blocks = source_I.GetSRecDataRef();
     uint64_t next = blocks.empty() ? 0 : blocks.front().startAddress;
-    for (const SContinuousDataBlock& block : blocks) {
+    for (size_t i = 0; i < blocks.size(); ++i) {
+      const SContinuousDataBlock& block = blocks[i];
+      if (i + kAhead < blocks.size()) __builtin_prefetch(blocks[i + kAhead].data.data());
       if (block.startAddress > next) writer.Fill(block.startAddress - next);
       writer.Write(block.data.data(), block.data.size());
       next = uint64_t{block.startAddress} + block.data.size();

@@ -255,8 +255,11 @@ bool CSRec::FinishSRecData() {
     return false;
   }
   // Stable, so that blocks with equal starts keep their order of appearance
-  // and a file reads the same everywhere.
-  std::stable_sort(mSRecData.begin(), mSRecData.end(), BlocksAscSorter);
+  // and a file reads the same everywhere. Files in address order, and files
+  // whose records share no byte, come sorted already.
+  if (!std::is_sorted(mSRecData.begin(), mSRecData.end(), BlocksAscSorter)) {
+    std::stable_sort(mSRecData.begin(), mSRecData.end(), BlocksAscSorter);
+  }
   for (size_t pair = 1; pair < mSRecData.size(); ++pair) {
     const SContinuousDataBlock& block = mSRecData[pair - 1];
     const uint64_t end = uint64_t{block.startAddress} + block.data.size();

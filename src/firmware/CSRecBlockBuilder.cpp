@@ -34,12 +34,14 @@ std::vector<SContinuousDataBlock> CSRecBlockBuilder::Build() {
   mBlockOf.assign(mRecords.size(), kDropped);
   mBlocks.clear();
   mBlocks.reserve(mRecords.size());  // address space only, as above
+  std::vector<uint32_t> placeOf;
   if (mAscending) {
     JoinNeighbours({});
   } else {
     const std::vector<uint32_t> byAddress = SortByAddress();
     if (Disjoint(byAddress)) {
       JoinNeighbours(byAddress);
+      placeOf = PlacesByAddress(byAddress);
     } else {
       MergeOneByOne();
     }
@@ -48,9 +50,22 @@ std::vector<SContinuousDataBlock> CSRecBlockBuilder::Build() {
   // them resident; hand their pages back before the blocks are filled,
   // when memory peaks.
   malloc_trim(0);
-  std::vector<SContinuousDataBlock> blocks = Fill();
+  std::vector<SContinuousDataBlock> blocks = Fill(placeOf);
   Clear();
   return blocks;
+}
+
+// Blocks of records that share no byte are runs in address order, so their
+// places in the sorted list follow from one walk; ties cannot occur there.
+std::vector<uint32_t> CSRecBlockBuilder::PlacesByAddress(
+    const std::vector<uint32_t>& byAddress_I) const {
+  std::vector<uint32_t> placeOf(mBlocks.size());
+  uint32_t next = 0;
+  for (size_t i = 0; i < byAddress_I.size(); ++i) {
+    const uint32_t block = mBlockOf[byAddress_I[i]];
+    if (i == 0 || block != mBlockOf[byAddress_I[i - 1]]) placeOf[block] = next++;
+  }
+  return placeOf;
 }
 
 // Record numbers in address order, ties in file order: a stable radix sort
@@ -104,7 +119,22 @@ void CSRecBlockBuilder::JoinNeighbours(const std::vector<uint32_t>& byAddress_I)
     return inFileOrder ? position_I : size_t{byAddress_I[position_I]};
   };
 
+  static constexpr size_t kAhead = 16;
   for (size_t record = 0; record < count; ++record) {
+    // In a shuffled file the neighbours lie anywhere: ask early for where
+    // they are, then for what they hold.
+    if (!inFileOrder && record + kAhead < count) {
+      __builtin_prefetch(&byAddress_I[rank[record + kAhead]]);
+    }
+    if (!inFileOrder && record + kAhead / 2 < count) {
+      const size_t later = rank[record + kAhead / 2];
+      for (const size_t side : {later - 1, later + 1}) {
+        if (side < count) {
+          __builtin_prefetch(&mRecords[byAddress_I[side]]);
+          __builtin_prefetch(&mBlockOf[byAddress_I[side]]);
+        }
+      }
+    }
     const uint64_t start = mRecords[record].address;
     const uint64_t end = start + mRecords[record].size;
     const size_t position = inFileOrder ? record : rank[record];
@@ -170,17 +200,31 @@ void CSRecBlockBuilder::MergeOneByOne() {
 // Copies each kept record to its place in its block, in file order, so that
 // the stored data is given back as it is used. A block filled from its start
 // upwards grows as it fills instead of being cleared first.
-std::vector<SContinuousDataBlock> CSRecBlockBuilder::Fill() {
+std::vector<SContinuousDataBlock> CSRecBlockBuilder::Fill(const std::vector<uint32_t>& placeOf_I) {
+  const auto place = [&placeOf_I](uint32_t block_I) {
+    return placeOf_I.empty() ? block_I : placeOf_I[block_I];
+  };
   std::vector<SContinuousDataBlock> blocks(mBlocks.size());
-  for (size_t i = 0; i < mBlocks.size(); ++i) {
-    blocks[i].startAddress = static_cast<uint32_t>(mBlocks[i].start);
+  for (uint32_t i = 0; i < mBlocks.size(); ++i) {
+    blocks[place(i)].startAddress = static_cast<uint32_t>(mBlocks[i].start);
   }
+  static constexpr size_t kAhead = 16;
   for (size_t record = 0; record < mRecords.size(); ++record) {
+    // The blocks of a shuffled file are visited at random: ask for the
+    // bookkeeping of a record well ahead, and for its block's data nearer.
+    if (record + kAhead < mRecords.size() && mBlockOf[record + kAhead] != kDropped) {
+      const uint32_t later = mBlockOf[record + kAhead];
+      __builtin_prefetch(&mBlocks[later]);
+      __builtin_prefetch(&blocks[place(later)]);
+    }
+    if (record + kAhead / 2 < mRecords.size() && mBlockOf[record + kAhead / 2] != kDropped) {
+      __builtin_prefetch(blocks[place(mBlockOf[record + kAhead / 2])].data.data());
+    }
     const size_t size = mRecords[record].size;
     const uint8_t* data = mData.ReadNext(size);
     const uint32_t block = mBlockOf[record];
     if (block == kDropped || size == 0) continue;
-    std::vector<uint8_t>& target = blocks[block].data;
+    std::vector<uint8_t>& target = blocks[place(block)].data;
     const size_t blockSize = static_cast<size_t>(mBlocks[block].end - mBlocks[block].start);
     const size_t offset = static_cast<size_t>(mRecords[record].address - mBlocks[block].start);
     if (target.capacity() == 0) target.reserve(blockSize);

@@ -39,7 +39,9 @@ class CSRecBlockBuilder {
   void Add(uint32_t address_I, const uint8_t* data_I, size_t size_I);
   size_t RecordCount() const { return mRecords.size(); }
 
-  // The blocks in their order of creation. Gives up the records.
+  // The blocks in their order of creation; where that order and the order
+  // of their starts give the same sorted list, already in the latter. Gives
+  // up the records.
   std::vector<SContinuousDataBlock> Build();
 
  private:
@@ -57,7 +59,9 @@ class CSRecBlockBuilder {
   bool Disjoint(const std::vector<uint32_t>& byAddress_I) const;
   void JoinNeighbours(const std::vector<uint32_t>& byAddress_I);
   void MergeOneByOne();
-  std::vector<SContinuousDataBlock> Fill();
+  std::vector<uint32_t> PlacesByAddress(const std::vector<uint32_t>& byAddress_I) const;
+  // placeOf_I empty: blocks stay in their order of creation.
+  std::vector<SContinuousDataBlock> Fill(const std::vector<uint32_t>& placeOf_I);
 
   std::vector<SRecord> mRecords;
   CByteArena mData;
