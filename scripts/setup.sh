@@ -11,7 +11,8 @@ PACKAGES=(
   libudev-dev libusb-1.0-0-dev libftdi1-dev libsystemd-dev
   qt6-base-dev gettext
   umockdev libumockdev-dev libglib2.0-dev
-  srecord binutils python3
+  srecord binutils python3 dbus-daemon
+  openssl
 )
 
 missing=()

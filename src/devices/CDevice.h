@@ -34,25 +34,25 @@ class CDevice {
   bool GetIsFlashLoader() const { return mIsFlashLoader; }
   void SetIsFlashLoader(bool isFlashLoader_I) { mIsFlashLoader = isFlashLoader_I; }
 
-#define TAV_BOARD_ACCESSORS(Board, member)                                                   \
-  const std::string& Get##Board##Update() const { return member.update; }                  \
-  void Set##Board##Update(const std::string& v_I) { member.update = v_I; }                 \
-  uint32_t Get##Board##VendorId() const { return member.vendorId; }                        \
-  void Set##Board##VendorId(uint32_t v_I) { member.vendorId = v_I; }                       \
-  uint32_t Get##Board##ProductId() const { return member.productId; }                      \
-  void Set##Board##ProductId(uint32_t v_I) { member.productId = v_I; }                     \
-  EINTERFACE_TYPE Get##Board##InterfaceType() const { return member.interfaceType; }        \
-  void Set##Board##InterfaceType(EINTERFACE_TYPE v_I) { member.interfaceType = v_I; }       \
-  uint8_t Get##Board##Topology() const { return member.topology; }                         \
-  void Set##Board##Topology(uint8_t v_I) { member.topology = v_I; }                        \
-  uint32_t Get##Board##FlashSectors() const { return member.flashSectors; }                \
-  void Set##Board##FlashSectors(uint32_t v_I) { member.flashSectors = v_I; }               \
-  uint32_t Get##Board##UsageId() const { return member.usageId; }                          \
-  void Set##Board##UsageId(uint32_t v_I) { member.usageId = v_I; }                         \
-  uint32_t Get##Board##UsagePage() const { return member.usagePage; }                      \
-  void Set##Board##UsagePage(uint32_t v_I) { member.usagePage = v_I; }                     \
-  InterfacePtr Get##Board##Interface() const { return member.interface; }                  \
-  void Set##Board##Interface(InterfacePtr v_I) { member.interface = std::move(v_I); }      \
+#define TAV_BOARD_ACCESSORS(Board, member)                                            \
+  const std::string& Get##Board##Update() const { return member.update; }             \
+  void Set##Board##Update(const std::string& v_I) { member.update = v_I; }            \
+  uint32_t Get##Board##VendorId() const { return member.vendorId; }                   \
+  void Set##Board##VendorId(uint32_t v_I) { member.vendorId = v_I; }                  \
+  uint32_t Get##Board##ProductId() const { return member.productId; }                 \
+  void Set##Board##ProductId(uint32_t v_I) { member.productId = v_I; }                \
+  EINTERFACE_TYPE Get##Board##InterfaceType() const { return member.interfaceType; }  \
+  void Set##Board##InterfaceType(EINTERFACE_TYPE v_I) { member.interfaceType = v_I; } \
+  uint8_t Get##Board##Topology() const { return member.topology; }                    \
+  void Set##Board##Topology(uint8_t v_I) { member.topology = v_I; }                   \
+  uint32_t Get##Board##FlashSectors() const { return member.flashSectors; }           \
+  void Set##Board##FlashSectors(uint32_t v_I) { member.flashSectors = v_I; }          \
+  uint32_t Get##Board##UsageId() const { return member.usageId; }                     \
+  void Set##Board##UsageId(uint32_t v_I) { member.usageId = v_I; }                    \
+  uint32_t Get##Board##UsagePage() const { return member.usagePage; }                 \
+  void Set##Board##UsagePage(uint32_t v_I) { member.usagePage = v_I; }                \
+  InterfacePtr Get##Board##Interface() const { return member.interface; }             \
+  void Set##Board##Interface(InterfacePtr v_I) { member.interface = std::move(v_I); } \
   void Set##Board##IntoBLMode(bool v_I) { member.intoBLMode = v_I; }
 
   TAV_BOARD_ACCESSORS(Pen, mPen)

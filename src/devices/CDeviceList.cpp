@@ -1,38 +1,42 @@
 #include "devices/CDeviceList.h"
 
-#include <strings.h>
-
 #include <cstdio>
-#include <sstream>
 
+#include "common/StringUtilities.h"
 #include "flash/CFLDeviceInterface.h"
 
 namespace {
 
-bool IEqualsText(const std::string& a_I, const std::string& b_I) {
-  return a_I.size() == b_I.size() && strcasecmp(a_I.c_str(), b_I.c_str()) == 0;
-}
-
-std::vector<std::string> SplitAtColon(const std::string& text_I) {
-  std::vector<std::string> tokens;
-  std::stringstream in(text_I);
-  std::string token;
-  while (std::getline(in, token, ':')) {
-    if (!token.empty()) tokens.push_back(token);
-  }
-  return tokens;
-}
+// Scalar boards that answer to either of these product ids.
+constexpr unsigned long kInterchangeableScalarProducts[] = {4192, 4195};
 
 bool PathMatches(const CDevice::InterfacePtr& interface_I, const char* board_I,
                  const std::string& wanted_I) {
   if (!interface_I) return false;
   const std::string path = interface_I->GetPath();
   std::printf("%s GetDevice %s to %s\n", board_I, wanted_I.c_str(), path.c_str());
-  return IEqualsText(wanted_I, path);
+  return StringUtilities::IEquals(wanted_I, path);
 }
 
 bool IsInterchangeableScalarProduct(unsigned long productId_I) {
-  return productId_I == 4192 || productId_I == 4195;
+  for (unsigned long product : kInterchangeableScalarProducts) {
+    if (productId_I == product) return true;
+  }
+  return false;
+}
+
+// The scalar board has no interface path of its own: it is matched by the
+// vendor and product at the head of the wanted path.
+bool ScalarMatches(const CDevice& device_I, const std::string& wanted_I) {
+  const std::vector<std::string> tokens = StringUtilities::Tokenize(wanted_I, ":", false);
+  if (tokens.size() < 2) return false;
+  // Conversion errors propagate to the caller on purpose.
+  const unsigned long vendor = std::stoul(tokens[0]);
+  const unsigned long product = std::stoul(tokens[1]);
+  if (device_I.GetScalarVendorId() != vendor) return false;
+  return device_I.GetScalarProductId() == product ||
+         (IsInterchangeableScalarProduct(product) &&
+          IsInterchangeableScalarProduct(device_I.GetScalarProductId()));
 }
 
 }  // namespace
@@ -49,7 +53,8 @@ CDeviceList::DevicePtr CDeviceList::GetDevice(unsigned short vendorId_I,
         (device->GetTouchVendorId() == vendorId_I && device->GetTouchProductId() == productId_I) ||
         (device->GetBluetoothVendorId() == vendorId_I &&
          device->GetBluetoothProductId() == productId_I) ||
-        (device->GetScalarVendorId() == vendorId_I && device->GetScalarProductId() == productId_I)) {
+        (device->GetScalarVendorId() == vendorId_I &&
+         device->GetScalarProductId() == productId_I)) {
       return device;
     }
   }
@@ -63,20 +68,7 @@ CDeviceList::DevicePtr CDeviceList::GetDevice(const std::string& path_I) const {
     bool matched = PathMatches(device->GetPenInterface(), "Pen", path_I);
     matched = PathMatches(device->GetTouchInterface(), "Touch", path_I) || matched;
     matched = PathMatches(device->GetBluetoothInterface(), "Bluetooth", path_I) || matched;
-    if (device->GetScalarSupported()) {
-      const std::vector<std::string> tokens = SplitAtColon(path_I);
-      if (tokens.size() >= 2) {
-        // Conversion errors propagate to the caller on purpose.
-        const unsigned long vendor = std::stoul(tokens[0]);
-        const unsigned long product = std::stoul(tokens[1]);
-        if (device->GetScalarVendorId() == vendor &&
-            (device->GetScalarProductId() == product ||
-             (IsInterchangeableScalarProduct(product) &&
-              IsInterchangeableScalarProduct(device->GetScalarProductId())))) {
-          matched = true;
-        }
-      }
-    }
+    if (device->GetScalarSupported() && ScalarMatches(*device, path_I)) matched = true;
     if (matched) return device;
   }
   return nullptr;

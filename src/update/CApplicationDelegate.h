@@ -1,0 +1,33 @@
+#pragma once
+// What the updater driver asks of the application object. All of it runs on
+// the main thread; the driver dispatches there first.
+
+#include <string>
+
+#include "update/UpdateTypes.h"
+
+// Why a run ends. A headless run exits with this number; a window run
+// exits with 0 whatever it was.
+enum ERunOutcome : int {
+  ERUN_SUCCESS = 0,
+  ERUN_FAILED = 1,        // an update failed, or the run could not go on
+  ERUN_NO_DEVICE = 2,     // no supported tablet, or it went away
+  ERUN_REFUSED_FILE = 3,  // the firmware file was not accepted
+  ERUN_DECLINED = 4,      // the user said no
+};
+
+class CApplicationDelegate {
+ public:
+  virtual ~CApplicationDelegate() = default;
+  // False when another program of the family, or a shell with arguments,
+  // started us; only then is the preferences file of arguments read.
+  virtual bool userLaunched() const = 0;
+  virtual void doStateMachine(ECONTROLLER_STATE state_I) = 0;
+  virtual void updateProgressBar(double percent_I) = 0;
+  virtual void notifyDialog(const std::string& text_I) = 0;
+  // Ends the process through the terminate handler. In the program it does
+  // not return; callers still return right after it.
+  virtual void terminate(ERunOutcome outcome_I) = 0;
+  // The update thread has gone through a non-empty list of updates.
+  virtual void updatesFinished() {}
+};

@@ -1,0 +1,407 @@
+#include "update/OFLUpdater.h"
+
+#include <cstdlib>
+#include <fstream>
+#include <mutex>
+#include <sstream>
+#include <stdexcept>
+#include <sys/stat.h>
+
+#include "common/CClock.h"
+#include "common/OSUtils.h"
+#include "common/StringUtilities.h"
+#include "common/SystemState.h"
+#include "common/TavLog.h"
+#include "devices/IOUtils.h"
+
+namespace {
+
+constexpr uint32_t kFamilyVendorId = 0x7A5D;
+
+// The usage pairs of the interfaces whose attach and detach are watched,
+// as (usage, usage page). Pairs with usage 0 are never watched.
+struct SUsagePair {
+  uint32_t usage;
+  uint32_t usagePage;
+};
+constexpr SUsagePair kWatchedUsages[] = {
+    {0x01, 0x000D}, {0x01, 0xFF00}, {0x05, 0xFF00}, {0x11, 0xFF00}, {0x80, 0xFF00},
+    {0x80, 0xFF01}, {0x11, 0xFF09}, {0x01, 0xFF0D}, {0x02, 0xFF0D},
+};
+
+// setupUpdate's device-list tries, one second apart.
+constexpr int kDeviceListTries = 6;
+// runThreadProgram's selection tries, one second apart.
+constexpr int kSelectTries = 5;
+// A success that is not the last is held this long and never shown.
+constexpr double kIntermediateSuccessHoldSeconds = 3.5;
+// On the way to the loader the normal identity is looked for under this
+// product id, which no product uses, so that any present one differs.
+constexpr uint32_t kLoaderSearchProductId = 0xFF00;
+
+const char* const kParmFileName = "fwupdater.parm";
+const char* const kConfigFileName = "fw_loader.ini";
+
+std::mutex gSingletonLock;
+std::unique_ptr<SUpdaterSetup> gSetup;
+OFLUpdater* gUpdater = nullptr;
+
+bool FileExists(const std::string& path_I) {
+  struct stat info {};
+  return !path_I.empty() && stat(path_I.c_str(), &info) == 0;
+}
+
+std::string JoinPath(const std::string& folder_I, const std::string& name_I) {
+  if (folder_I.empty()) return name_I;
+  if (folder_I.back() == '/') return folder_I + name_I;
+  return folder_I + "/" + name_I;
+}
+
+std::string FolderOf(const std::string& path_I) {
+  const size_t slash = path_I.rfind('/');
+  if (slash == std::string::npos) return std::string();
+  if (slash == 0) return "/";
+  return path_I.substr(0, slash);
+}
+
+std::string TrimLineEnds(const std::string& text_I) {
+  const char* const blanks = " \t\r\n\v\f";
+  const size_t first = text_I.find_first_not_of(blanks);
+  if (first == std::string::npos) return std::string();
+  const size_t last = text_I.find_last_not_of(blanks);
+  return text_I.substr(first, last - first + 1);
+}
+
+// Splits at each single blank: two blanks in a row give an empty element.
+std::vector<std::string> SplitAtEachBlank(const std::string& text_I) {
+  std::vector<std::string> parts;
+  size_t start = 0;
+  while (true) {
+    const size_t blank = text_I.find(' ', start);
+    parts.push_back(text_I.substr(start, blank - start));
+    if (blank == std::string::npos) break;
+    start = blank + 1;
+  }
+  return parts;
+}
+
+}  // namespace
+
+void OFLUpdater::Configure(SUpdaterSetup setup_I) {
+  std::lock_guard<std::mutex> guard(gSingletonLock);
+  gSetup = std::make_unique<SUpdaterSetup>(std::move(setup_I));
+}
+
+OFLUpdater* OFLUpdater::updater() {
+  std::lock_guard<std::mutex> guard(gSingletonLock);
+  if (gUpdater == nullptr) {
+    if (!gSetup || !gSetup->makeDiscovery) {
+      TavLog::Error("Could not start Firmware Updater.");
+      std::exit(-1);
+    }
+    gUpdater = new OFLUpdater(*gSetup);
+  }
+  return gUpdater;
+}
+
+void OFLUpdater::DisposeInstance() {
+  OFLUpdater* updater = nullptr;
+  {
+    std::lock_guard<std::mutex> guard(gSingletonLock);
+    updater = gUpdater;
+    gUpdater = nullptr;
+  }
+  delete updater;
+}
+
+OFLUpdater::OFLUpdater(SUpdaterSetup setup_I) : mSetup(std::move(setup_I)) {
+  mUpdater = std::make_unique<CLinuxUpdateController>(mSetup.makeDiscovery());
+  mNotifier = std::make_unique<CLinuxUpdateNotifier>(*this);
+  SystemState::SetOSType();
+  mHIDMgrSemaphore = CTavSemaphore::New("mHIDMgrSemaphore");
+  mUpdater->RegisterCallback(mNotifier.get());
+  mUpdater->setConfigPath(configPath());
+}
+
+OFLUpdater::~OFLUpdater() {
+  cleanup();
+  if (mThreadDevice.joinable()) mThreadDevice.join();
+  if (mThreadProgram.joinable()) mThreadProgram.join();
+  mUpdater->UnregisterCallback(mNotifier.get());
+  mNotifier.reset();
+  mUpdater.reset();
+  mHIDMgrSemaphore.reset();
+}
+
+std::vector<std::string> OFLUpdater::getArgs() const {
+  const std::vector<std::string>& process = mSetup.processArguments;
+  const std::string parmPath = JoinPath(mSetup.preferencesFolder, kParmFileName);
+  const bool userLaunched = mDelegate == nullptr || mDelegate->userLaunched();
+
+  if (!userLaunched && !mSetup.preferencesFolder.empty() && FileExists(parmPath)) {
+    std::ifstream in(parmPath);
+    std::stringstream content;
+    content << in.rdbuf();
+    std::vector<std::string> result;
+    result.push_back(process.empty() ? std::string() : process.front());
+    for (const std::string& part : SplitAtEachBlank(TrimLineEnds(content.str()))) {
+      result.push_back(part);
+    }
+    return result;
+  }
+
+  std::vector<std::string> result;
+  if (process.size() >= 2) {
+    for (const std::string& argument : process) result.push_back(TrimLineEnds(argument));
+  }
+  return result;
+}
+
+std::string OFLUpdater::configPath() const {
+  const std::vector<std::string> arguments = getArgs();
+  for (size_t i = 0; i < arguments.size(); ++i) {
+    if (arguments[i] == "-f") return i + 1 < arguments.size() ? arguments[i + 1] : std::string();
+  }
+  if (mSetup.executableFolder.empty()) return std::string();
+  const std::string beside = JoinPath(mSetup.executableFolder, kConfigFileName);
+  if (FileExists(beside)) return beside;
+  return JoinPath(mSetup.installedDataFolder, kConfigFileName);
+}
+
+std::vector<OFLUpdater::UpdateEntry> OFLUpdater::parseArguments(
+    const std::vector<std::string>& arguments_I) {
+  std::vector<UpdateEntry> entries;
+  for (size_t i = 0; i < arguments_I.size(); ++i) {
+    const std::string& option = arguments_I[i];
+    const char* kind = option == "-p"   ? "pen"
+                       : option == "-t" ? "touch"
+                       : option == "-b" ? "bluetooth"
+                       : option == "-s" ? "scalar"
+                                        : nullptr;
+    if (kind == nullptr) continue;
+    // The next element is taken whatever it is; none at all is a range error.
+    entries.emplace_back(kind, arguments_I.at(i + 1));
+  }
+  return entries;
+}
+
+uint32_t OFLUpdater::toHex(const std::string& word_I) {
+  size_t start = word_I.find_first_not_of(" \t\r\n");
+  if (start == std::string::npos) return 0;
+  if (word_I.compare(start, 2, "0x") == 0 || word_I.compare(start, 2, "0X") == 0) start += 2;
+  uint64_t value = 0;
+  for (size_t i = start; i < word_I.size(); ++i) {
+    const char c = word_I[i];
+    int digit = -1;
+    if (c >= '0' && c <= '9') digit = c - '0';
+    if (c >= 'a' && c <= 'f') digit = c - 'a' + 10;
+    if (c >= 'A' && c <= 'F') digit = c - 'A' + 10;
+    if (digit < 0) break;
+    value = value * 16 + static_cast<uint64_t>(digit);
+    // A number too large for 32 bits reads as the largest one.
+    if (value > 0xFFFFFFFFull) return 0xFFFFFFFFu;
+  }
+  return static_cast<uint32_t>(value);
+}
+
+bool OFLUpdater::setupUpdate() {
+  mThreadDevice = std::thread([this] { runThreadDevice(); });
+  TavSleep(1.0);
+
+  bool listed = mUpdater->UpdateDeviceList();
+  for (int attempt = 1; !listed && attempt < kDeviceListTries; ++attempt) {
+    TavSleep(1.0);
+    listed = mUpdater->UpdateDeviceList();
+  }
+  if (!listed) return false;
+
+  // No bound: only the end of the process (cleanup) stops this wait.
+  while (!mHIDManager && !mStopping) TavSleep(1.0);
+  if (!mHIDManager) return false;
+
+  mHIDMgrSemaphore->RequestSemaphore();
+  try {
+    mDeviceUpdates = parseArguments(getArgs());
+  } catch (const std::out_of_range&) {
+    mHIDMgrSemaphore->ReleaseSemaphore();
+    TavLog::Error("An option at the end of the arguments has no value.\n");
+    if (mDelegate != nullptr) {
+      OSUtils::DispatchOnMainThread([this] {
+        mDelegate->notifyDialog("Error: An option at the end of the arguments has no value.");
+      });
+    }
+    Terminate(ERUN_FAILED);
+    return false;
+  }
+  mFlagCommandLine = true;
+  mHIDMgrSemaphore->ReleaseSemaphore();
+  return true;
+}
+
+void OFLUpdater::setUpdateType(const std::string& word_I) {
+  EUPDATE_TYPE type = EUPDATE_UNKNOWN;
+  if (StringUtilities::IEquals(word_I, "pen")) {
+    type = EUPDATE_PEN;
+  } else if (StringUtilities::IEquals(word_I, "Touch")) {
+    type = EUPDATE_TOUCH;
+  } else if (StringUtilities::IEquals(word_I, "Bluetooth")) {
+    type = EUPDATE_BLUETOOTH;
+  } else if (StringUtilities::IEquals(word_I, "Scalar")) {
+    const std::shared_ptr<CDevice> device = mUpdater->GetSelectedDevice();
+    type = device && device->GetScalarInterfaceType() == EHID_INTERFACE ? EUPDATE_SCALAR_HID
+                                                                         : EUPDATE_SCALAR_FTDI;
+  }
+  mUpdater->SetUpdateType(type);
+}
+
+void OFLUpdater::boardProgram() {
+  mUpdater->ProcessStateChange(ESTATE_PROGRAM);
+  mThreadProgram = std::thread([this] { runThreadProgram(); });
+}
+
+void OFLUpdater::cleanup() {
+  mStopping = true;
+  if (mSetup.registry) mSetup.registry->StopWatching();
+}
+
+void OFLUpdater::joinProgramThread() {
+  if (mThreadProgram.joinable()) mThreadProgram.join();
+}
+
+void OFLUpdater::runThreadDevice() {
+  mHIDMgrSemaphore->RequestSemaphore();
+  if (!mSetup.registry || !mSetup.registry->OpenWatch()) {
+    TavLog::Error("Could not secure USB for Firmware Updater.");
+    Terminate(ERUN_FAILED);
+    mHIDMgrSemaphore->ReleaseSemaphore();
+    return;
+  }
+  mHIDManager = true;
+  mHIDMgrSemaphore->ReleaseSemaphore();
+  mSetup.registry->RunWatch(*this);
+}
+
+bool OFLUpdater::MatchesWatchedUsage(const DeviceInfo& info_I) {
+  if (info_I.vendorId != kFamilyVendorId) return false;
+  for (const SUsagePair& pair : kWatchedUsages) {
+    if (pair.usage == info_I.usage && pair.usagePage == info_I.usagePage) return true;
+  }
+  return false;
+}
+
+void OFLUpdater::DeviceAdded(const DeviceInfo& info_I) {
+  if (MatchesWatchedUsage(info_I)) deviceAdded(info_I);
+}
+
+void OFLUpdater::DeviceRemoved(const DeviceInfo& info_I) {
+  if (MatchesWatchedUsage(info_I)) deviceRemoved(info_I);
+}
+
+void OFLUpdater::deviceAdded(const DeviceInfo& info_I) {
+  mUpdater->DeviceAttach(IOUtils::DevicePathFromInfo(info_I));
+}
+
+void OFLUpdater::deviceRemoved(const DeviceInfo& info_I) {
+  mUpdater->DeviceDetach(IOUtils::DevicePathFromInfo(info_I));
+}
+
+void OFLUpdater::runThreadProgram() {
+  if (!mFlagCommandLine) {
+    ++mUpdateIndex;
+    runUpdateStep(std::string());
+    mProgramFinished = true;
+    return;
+  }
+  for (const UpdateEntry& entry : mDeviceUpdates) {
+    const std::string& kind = entry.first;
+    const std::string& value = entry.second;
+    setUpdateType(kind);
+    ++mUpdateIndex;
+
+    if (!value.empty()) {
+      for (int attempt = 0; attempt < kSelectTries; ++attempt) {
+        if (mUpdater->SetSelectedDevice(value)) break;
+        TavSleep(1.0);
+      }
+    }
+
+    if (mUpdater->PenAutoUpdateExists() || mUpdater->TouchAutoUpdateExists() ||
+        mUpdater->BluetoothAutoUpdateExists() || mUpdater->ScalarAutoUpdateExists()) {
+      const std::string folder = JoinPath(FolderOf(mUpdater->getConfigPath()), "Firmware");
+      if (!mUpdater->SetAutoUpdateFile(kind, folder)) {
+        if (mDelegate != nullptr) {
+          OSUtils::DispatchOnMainThread([this] {
+            mDelegate->notifyDialog(
+                "Error: The specified file does not appear to be a valid firmware file.");
+          });
+        }
+        Terminate(ERUN_REFUSED_FILE);
+        mProgramFinished = true;
+        return;
+      }
+    }
+    runUpdateStep(value);
+  }
+  mProgramFinished = true;
+  if (mDelegate != nullptr && !mDeviceUpdates.empty()) {
+    OSUtils::DispatchOnMainThread([this] { mDelegate->updatesFinished(); });
+  }
+}
+
+void OFLUpdater::runUpdateStep(const std::string& value_I) {
+  if (!mSetup.power) return;
+  // Held for the length of this update; released on every way out.
+  std::unique_ptr<CPowerAssertion> assertion =
+      mSetup.power->Create("Updating Tavik tablet firmware");
+  if (!assertion) return;
+
+  if (mUpdater->GetUpdateType() != EUPDATE_SCALAR_FTDI) {
+    mUpdater->UpdateDevice();
+    return;
+  }
+  const std::vector<std::string> parts = StringUtilities::Tokenize(value_I, ":", false);
+  const std::string serial = parts.size() > 2 ? parts[2] : std::string();
+  const unsigned char index =
+      parts.size() > 3 ? static_cast<unsigned char>(std::atoi(parts[3].c_str())) : 0;
+  if (mSetup.updateScalar) mSetup.updateScalar(*mUpdater, serial, index);
+}
+
+void OFLUpdater::callBackStatus(ECONTROLLER_STATE state_I) {
+  if (state_I == ESTATE_SUCCESS && mUpdateIndex < static_cast<int>(mDeviceUpdates.size())) {
+    TavSleep(kIntermediateSuccessHoldSeconds);
+    return;
+  }
+  if (mDelegate == nullptr) return;
+  OSUtils::DispatchOnMainThread([this, state_I] { mDelegate->doStateMachine(state_I); });
+}
+
+void OFLUpdater::callBackProgress(unsigned int percent_I) {
+  const double entries =
+      mDeviceUpdates.empty() ? 1.0 : static_cast<double>(mDeviceUpdates.size());
+  const double overall =
+      (static_cast<double>(percent_I) + 100.0 * mUpdateIndex - 100.0) / entries;
+  if (mDelegate == nullptr) return;
+  OSUtils::DispatchOnMainThread([this, overall] { mDelegate->updateProgressBar(overall); });
+}
+
+void OFLUpdater::updateDeviceList(bool toLoader_I) {
+  const std::shared_ptr<CDevice> device = mUpdater->GetSelectedDevice();
+  if (!device || !mSetup.registry) return;
+  DeviceInfo info;
+  info.vendorId = device->GetPenVendorId();
+  info.productId = device->GetPenProductId();
+  // A first search by vendor and product whose answer is not used.
+  IOUtils::FindMatchedDevices(*mSetup.registry, info, IOUtils::kVendorId | IOUtils::kProductId);
+  if (toLoader_I) info.productId = kLoaderSearchProductId;
+  const std::vector<DeviceInfo> found =
+      IOUtils::FindMatchedDevices(*mSetup.registry, info, IOUtils::kVendorId);
+  if (found.size() == 1 && found.front().productId != info.productId) {
+    mUpdater->DeviceDetach(IOUtils::DevicePathFromInfo(info));
+    mUpdater->DeviceAttach(IOUtils::DevicePathFromInfo(found.front()));
+  }
+}
+
+void OFLUpdater::Terminate(ERunOutcome outcome_I) {
+  if (mDelegate == nullptr) return;
+  OSUtils::DispatchOnMainThread([this, outcome_I] { mDelegate->terminate(outcome_I); });
+}

@@ -1,0 +1,114 @@
+#pragma once
+// The driver of a running application: parses the arguments into a list of
+// updates, keeps the device watch alive on its own thread, runs the updates
+// on a second thread, and carries status and progress from the controller
+// to the application object on the main thread.
+
+#include <atomic>
+#include <functional>
+#include <memory>
+#include <string>
+#include <thread>
+#include <utility>
+#include <vector>
+
+#include "common/CTavSemaphore.h"
+#include "devices/CDiscovery.h"
+#include "seams/CDeviceRegistry.h"
+#include "seams/CPowerInhibitor.h"
+#include "update/CApplicationDelegate.h"
+#include "update/CLinuxUpdateController.h"
+#include "update/CLinuxUpdateNotifier.h"
+
+// What a run gives the driver: the seams it works through and the facts of
+// the process that the original read from the platform.
+struct SUpdaterSetup {
+  std::function<std::unique_ptr<CDiscovery>()> makeDiscovery;
+  std::shared_ptr<CDeviceRegistry> registry;
+  std::shared_ptr<CPowerInhibitor> power;
+  std::vector<std::string> processArguments;  // program name first
+  std::string preferencesFolder;              // holds fwupdater.parm
+  std::string executableFolder;               // fw_loader.ini beside the program
+  std::string installedDataFolder;            // fw_loader.ini of the installation
+  // The scalar flow over the FTDI bridge; until it exists a scalar update of
+  // that kind is refused through this hook.
+  std::function<void(CUpdateController&, const std::string& serial, unsigned char index)>
+      updateScalar;
+};
+
+class OFLUpdater : public CRegistryWatcher {
+ public:
+  // An update entry: its kind ("pen", "touch", "bluetooth", "scalar") and
+  // the value that followed the option.
+  using UpdateEntry = std::pair<std::string, std::string>;
+
+  // Must come before the first updater(): the run's seams.
+  static void Configure(SUpdaterSetup setup_I);
+  // The singleton, created at first use. Without a configuration it cannot
+  // start, and the process ends with -1.
+  static OFLUpdater* updater();
+  // Stops the threads and deletes the singleton (end of process, tests).
+  static void DisposeInstance();
+
+  ~OFLUpdater() override;
+
+  void setAppDelegate(CApplicationDelegate* delegate_I) { mDelegate = delegate_I; }
+  EUPDATE_TYPE getUpdateType() const { return mUpdater->GetUpdateType(); }
+  std::shared_ptr<CDevice> getSelectedDevice() const { return mUpdater->GetSelectedDevice(); }
+  CLinuxUpdateController& GetController() { return *mUpdater; }
+
+  std::vector<std::string> getArgs() const;
+  std::string configPath() const;
+  // Throws std::out_of_range for an option in last place.
+  static std::vector<UpdateEntry> parseArguments(const std::vector<std::string>& arguments_I);
+  static uint32_t toHex(const std::string& word_I);
+
+  bool setupUpdate();
+  void setUpdateType(const std::string& word_I);
+  bool setFileURL(const std::string& path_I) { return mUpdater->SetUpdateFile(path_I); }
+  void boardProgram();
+  void cleanup();
+  void updateDeviceList(bool toLoader_I);
+
+  void callBackStatus(ECONTROLLER_STATE state_I);
+  void callBackProgress(unsigned int percent_I);
+
+  // Attach and detach from the device watch, for matching interfaces only.
+  void DeviceAdded(const DeviceInfo& info_I) override;
+  void DeviceRemoved(const DeviceInfo& info_I) override;
+  void deviceAdded(const DeviceInfo& info_I);
+  void deviceRemoved(const DeviceInfo& info_I);
+
+  bool isCommandLine() const { return mFlagCommandLine; }
+  int updateIndex() const { return mUpdateIndex; }
+  void setUpdateIndex(int index_I) { mUpdateIndex = index_I; }
+  std::vector<UpdateEntry> deviceUpdates() const { return mDeviceUpdates; }
+  // True once the update thread has gone through its list.
+  bool programThreadFinished() const { return mProgramFinished; }
+  // Waits for the update thread to end (tests and the end of a headless run).
+  void joinProgramThread();
+
+ private:
+  explicit OFLUpdater(SUpdaterSetup setup_I);
+
+  void runThreadDevice();
+  void runThreadProgram();
+  void runUpdateStep(const std::string& value_I);
+  static bool MatchesWatchedUsage(const DeviceInfo& info_I);
+  void Terminate(ERunOutcome outcome_I);
+
+  SUpdaterSetup mSetup;
+  CApplicationDelegate* mDelegate = nullptr;  // the application object
+  std::unique_ptr<CLinuxUpdateController> mUpdater;
+  std::unique_ptr<CLinuxUpdateNotifier> mNotifier;
+  std::shared_ptr<CTavSemaphore> mHIDMgrSemaphore;
+  // The watch of attach and detach is set up; stands in for the HID manager.
+  std::atomic<bool> mHIDManager{false};
+  std::atomic<bool> mFlagCommandLine{false};
+  std::atomic<int> mUpdateIndex{0};
+  std::vector<UpdateEntry> mDeviceUpdates;
+  std::atomic<bool> mProgramFinished{false};
+  std::atomic<bool> mStopping{false};
+  std::thread mThreadProgram;
+  std::thread mThreadDevice;
+};

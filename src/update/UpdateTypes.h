@@ -1,0 +1,37 @@
+#pragma once
+// States, errors and update types of one firmware update.
+
+#include <cstdint>
+
+enum ECONTROLLER_STATE : int32_t {
+  ESTATE_NONE = 0,
+  ESTATE_READY = 1,
+  ESTATE_WAIT_LOADER = 2,
+  ESTATE_PROGRAM = 3,
+  ESTATE_WAIT_DEVICE = 4,
+  ESTATE_SUCCESS = 5,
+  ESTATE_FAILURE = 6,
+  ESTATE_TERMINATE = 7,
+  ESTATE_INVALID = 99,
+};
+
+enum ECONTROLLER_ERROR : int32_t {
+  EERROR_NONE = 0,  // never raised
+  EERROR_NO_DEVICE = 1,
+  EERROR_RESERVED_2 = 2,  // never raised
+  EERROR_FILE_LOAD = 3,
+  EERROR_FILE_MISMATCH = 4,
+  EERROR_LEAVE_LOADER = 5,
+  EERROR_PROGRAM = 6,
+  EERROR_RESERVED_7 = 7,  // never raised
+  EERROR_INTERFACE = 8,
+};
+
+enum EUPDATE_TYPE : uint8_t {
+  EUPDATE_PEN = 0,
+  EUPDATE_TOUCH = 1,
+  EUPDATE_BLUETOOTH = 2,
+  EUPDATE_SCALAR_FTDI = 3,
+  EUPDATE_SCALAR_HID = 4,
+  EUPDATE_UNKNOWN = 5,
+};

@@ -1,0 +1,146 @@
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <stdexcept>
+
+#include "devices/CDeviceList.h"
+#include "devices/CFakeInterface.h"
+
+namespace {
+
+std::shared_ptr<CDevice> MakeDevice(const std::string& name_I, uint32_t penProduct_I) {
+  auto device = std::make_shared<CDevice>();
+  device->SetDeviceName(name_I);
+  device->SetPenVendorId(0x7A5D);
+  device->SetPenProductId(penProduct_I);
+  return device;
+}
+
+// GetDevice(path) prints its comparisons to standard output.
+std::string FindPrinting(const CDeviceList& list_I, const std::string& path_I,
+                         std::shared_ptr<CDevice>& found_O) {
+  testing::internal::CaptureStdout();
+  found_O = list_I.GetDevice(path_I);
+  std::fflush(stdout);
+  return testing::internal::GetCapturedStdout();
+}
+
+}  // namespace
+
+TEST(CDeviceListTest, EmptyListFindsNothing) {
+  CDeviceList list;
+  EXPECT_EQ(list.GetDeviceCount(), 0u);
+  EXPECT_EQ(list.GetBestDevice(), nullptr);
+  EXPECT_EQ(list.GetDevice(0u), nullptr);
+  EXPECT_EQ(list.GetDevice("31325:768:1:2:13"), nullptr);
+  EXPECT_EQ(list.GetDevice(static_cast<unsigned short>(0), static_cast<unsigned short>(0)),
+            nullptr);
+  EXPECT_EQ(list.ToString(), "");
+}
+
+TEST(CDeviceListTest, BestDeviceIsTheFirstLoaderElseTheFirst) {
+  CDeviceList list;
+  auto first = MakeDevice("a", 1);
+  auto second = MakeDevice("b", 2);
+  auto third = MakeDevice("c", 3);
+  list.AddDevice(first);
+  list.AddDevice(second);
+  list.AddDevice(third);
+  EXPECT_EQ(list.GetBestDevice(), first);
+  third->SetIsFlashLoader(true);
+  EXPECT_EQ(list.GetBestDevice(), third);
+  second->SetIsFlashLoader(true);
+  EXPECT_EQ(list.GetBestDevice(), second);
+
+  EXPECT_EQ(list.GetDevice(2u), third);
+  EXPECT_EQ(list.GetDevice(3u), nullptr);
+  // Copies share the devices.
+  CDeviceList copy = list;
+  list.ClearDeviceList();
+  EXPECT_EQ(list.GetDeviceCount(), 0u);
+  EXPECT_EQ(copy.GetDevice(1u), second);
+}
+
+TEST(CDeviceListTest, FindsByTheWholePairOfOneBoard) {
+  auto device = MakeDevice("a", 0x300);
+  device->SetTouchVendorId(0x7A5D);
+  device->SetTouchProductId(0x301);
+  device->SetBluetoothVendorId(0x1111);
+  device->SetBluetoothProductId(0x302);
+  device->SetScalarVendorId(0x5B27);
+  device->SetScalarProductId(4192);
+  CDeviceList list;
+  list.AddDevice(MakeDevice("other", 0x200));
+  list.AddDevice(device);
+
+  EXPECT_EQ(list.GetDevice(0x7A5D, 0x301), device);
+  EXPECT_EQ(list.GetDevice(0x1111, 0x302), device);
+  EXPECT_EQ(list.GetDevice(0x5B27, 4192), device);
+  // A vendor of one board with the product of another is no match.
+  EXPECT_EQ(list.GetDevice(0x7A5D, 0x302), nullptr);
+  EXPECT_EQ(list.GetDevice(0x1111, 0x300), nullptr);
+  // Boards left out hold 0 and 0, and so match that pair.
+  EXPECT_EQ(list.GetDevice(0, 0), list.GetDevice(0u));
+}
+
+TEST(CDeviceListTest, FindsByInterfacePathPrintingEveryComparison) {
+  auto device = MakeDevice("a", 0x300);
+  device->SetPenInterface(CFakeInterface::Make("31325:768:19922944:2:13"));
+  device->SetTouchInterface(CFakeInterface::Make("31325:769:19922944:1:65280"));
+  device->SetBluetoothInterface(CFakeInterface::Make("31325:770:19922944:1:65281"));
+  CDeviceList list;
+  list.AddDevice(device);
+
+  std::shared_ptr<CDevice> found;
+  EXPECT_EQ(FindPrinting(list, "31325:769:19922944:1:65280", found),
+            "Pen GetDevice 31325:769:19922944:1:65280 to 31325:768:19922944:2:13\n"
+            "Touch GetDevice 31325:769:19922944:1:65280 to 31325:769:19922944:1:65280\n"
+            "Bluetooth GetDevice 31325:769:19922944:1:65280 to 31325:770:19922944:1:65281\n");
+  EXPECT_EQ(found, device);
+  FindPrinting(list, "31325:768:19922944:2:14", found);
+  EXPECT_EQ(found, nullptr);
+}
+
+TEST(CDeviceListTest, FindsAScalarByVendorAndProductWith4192And4195Interchangeable) {
+  auto display = MakeDevice("display", 0x300);
+  display->SetScalarSupported(true);
+  display->SetScalarVendorId(0x5B27);
+  display->SetScalarProductId(4192);
+  CDeviceList list;
+  list.AddDevice(display);
+
+  std::shared_ptr<CDevice> found;
+  const std::string vendor = std::to_string(0x5B27);
+  FindPrinting(list, vendor + ":4192:0:10:65280", found);
+  EXPECT_EQ(found, display);
+  FindPrinting(list, vendor + ":4195", found);
+  EXPECT_EQ(found, display);
+  FindPrinting(list, vendor + ":4196", found);
+  EXPECT_EQ(found, nullptr);
+  FindPrinting(list, "1:4192", found);
+  EXPECT_EQ(found, nullptr);
+  display->SetScalarProductId(4195);
+  FindPrinting(list, vendor + ":4192", found);
+  EXPECT_EQ(found, display);
+  // Fewer than two numbers cannot name a scalar.
+  FindPrinting(list, vendor, found);
+  EXPECT_EQ(found, nullptr);
+
+  // A path that is not numbers reaches the caller as the conversion's error.
+  testing::internal::CaptureStdout();
+  EXPECT_THROW(list.GetDevice("pen:x"), std::invalid_argument);
+  testing::internal::GetCapturedStdout();
+  // A device without a scalar never converts.
+  display->SetScalarSupported(false);
+  FindPrinting(list, "pen:x", found);
+  EXPECT_EQ(found, nullptr);
+}
+
+TEST(CDeviceListTest, ToStringJoinsTheDevicesTexts) {
+  auto withPen = MakeDevice("a", 1);
+  withPen->SetPenInterface(CFakeInterface::Make("p"));
+  CDeviceList list;
+  list.AddDevice(MakeDevice("no interface", 2));
+  list.AddDevice(withPen);
+  EXPECT_EQ(list.ToString(), "\n" + withPen->ToString() + "\n");
+}

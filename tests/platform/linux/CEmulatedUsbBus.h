@@ -1,0 +1,138 @@
+#pragma once
+// A USB tree in umockdev's emulated sysfs: root hubs, hubs, devices, and HID
+// interfaces with their hidraw nodes and report descriptors. It must be made
+// before any udev monitor, as the testbed replaces the netlink socket.
+
+#include <umockdev.h>
+
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+#include <string>
+#include <vector>
+
+class CEmulatedUsbBus {
+ public:
+  struct SHidNode {
+    std::string usbSysPath;
+    std::string interfaceSysPath;
+    std::string hidSysPath;
+    std::string hidrawSysPath;
+    std::string nodePath;
+  };
+
+  CEmulatedUsbBus() : mTestbed(umockdev_testbed_new()) {}
+  ~CEmulatedUsbBus() { g_object_unref(mTestbed); }
+  CEmulatedUsbBus(const CEmulatedUsbBus&) = delete;
+  CEmulatedUsbBus& operator=(const CEmulatedUsbBus&) = delete;
+
+  // True when the preload library is in place; without it the code under
+  // test would see the machine's real /sys.
+  static bool IsEmulated() {
+    const char* preload = std::getenv("LD_PRELOAD");
+    return preload != nullptr && std::strstr(preload, "umockdev-preload") != nullptr;
+  }
+
+  UMockdevTestbed* GetTestbed() const { return mTestbed; }
+
+  std::string AddRootHub(unsigned bus_I) {
+    const std::string path = "/devices/pci0000:00/0000:00:14.0/usb" + std::to_string(bus_I);
+    Add("P: " + path + "\nE: SUBSYSTEM=usb\nE: DEVTYPE=usb_device\n" +
+        UsbAttributes(0x1D6B, 0x0002, 0x0606, bus_I, "0"));
+    return path;
+  }
+
+  // A device or hub at `devpath_I` ("2", "2.3") below `parentPath_I`.
+  std::string AddUsbDevice(const std::string& parentPath_I, unsigned bus_I,
+                           const std::string& devpath_I, uint32_t vendorId_I, uint32_t productId_I,
+                           uint16_t version_I) {
+    const std::string path = parentPath_I + "/" + std::to_string(bus_I) + "-" + devpath_I;
+    Add("P: " + path + "\nE: SUBSYSTEM=usb\nE: DEVTYPE=usb_device\n" +
+        UsbAttributes(vendorId_I, productId_I, version_I, bus_I, devpath_I));
+    return path;
+  }
+
+  SHidNode AddHidInterface(const std::string& usbPath_I, unsigned interface_I,
+                           unsigned hidrawIndex_I, const std::vector<uint8_t>& descriptor_I) {
+    SHidNode node;
+    node.usbSysPath = usbPath_I;
+    const std::string usbName = usbPath_I.substr(usbPath_I.rfind('/') + 1);
+    node.interfaceSysPath = usbPath_I + "/" + usbName + ":1." + std::to_string(interface_I);
+    char hidName[32];
+    std::snprintf(hidName, sizeof(hidName), "0003:0000:0000.%04X", ++mHidCount);
+    node.hidSysPath = node.interfaceSysPath + "/" + hidName;
+    const std::string hidraw = "hidraw" + std::to_string(hidrawIndex_I);
+    node.hidrawSysPath = node.hidSysPath + "/hidraw/" + hidraw;
+    node.nodePath = "/dev/" + hidraw;
+    Add("P: " + node.interfaceSysPath + "\nE: SUBSYSTEM=usb\nE: DEVTYPE=usb_interface\n");
+    AddHidAndNode(node, hidrawIndex_I, descriptor_I);
+    return node;
+  }
+
+  // A HID interface on a bus other than USB, as an I2C touch panel has.
+  SHidNode AddNonUsbHidInterface(unsigned hidrawIndex_I, const std::vector<uint8_t>& descriptor_I) {
+    SHidNode node;
+    node.hidSysPath = "/devices/platform/i2c-0/0018:7A5D:0001.00" + std::to_string(++mHidCount);
+    node.hidrawSysPath = node.hidSysPath + "/hidraw/hidraw" + std::to_string(hidrawIndex_I);
+    node.nodePath = "/dev/hidraw" + std::to_string(hidrawIndex_I);
+    AddHidAndNode(node, hidrawIndex_I, descriptor_I);
+    return node;
+  }
+
+  // Unplugs the interface and the USB device above it, leaf first, with
+  // the removal events a kernel sends.
+  void Unplug(const SHidNode& node_I) {
+    for (const std::string* path : {&node_I.hidrawSysPath, &node_I.hidSysPath,
+                                    &node_I.interfaceSysPath, &node_I.usbSysPath}) {
+      if (path->empty()) continue;
+      const std::string sysPath = "/sys" + *path;
+      umockdev_testbed_uevent(mTestbed, sysPath.c_str(), "remove");
+      umockdev_testbed_remove_device(mTestbed, sysPath.c_str());
+    }
+  }
+
+ private:
+  // An empty descriptor leaves the attribute out, as if it could not be read.
+  void AddHidAndNode(const SHidNode& node_I, unsigned hidrawIndex_I,
+                     const std::vector<uint8_t>& descriptor_I) {
+    const std::string hidraw = "hidraw" + std::to_string(hidrawIndex_I);
+    Add("P: " + node_I.hidSysPath + "\nE: SUBSYSTEM=hid\n" +
+        (descriptor_I.empty() ? std::string()
+                              : "H: report_descriptor=" + Hex(descriptor_I) + "\n"));
+    Add("P: " + node_I.hidrawSysPath + "\nE: SUBSYSTEM=hidraw\nE: DEVNAME=" + node_I.nodePath +
+        "\nA: dev=247:" + std::to_string(hidrawIndex_I) + "\nN: " + hidraw + "=00\n");
+  }
+
+  static std::string UsbAttributes(uint32_t vendorId_I, uint32_t productId_I, uint16_t version_I,
+                                   unsigned bus_I, const std::string& devpath_I) {
+    char text[160];
+    std::snprintf(text, sizeof(text),
+                  "A: idVendor=%04x\nA: idProduct=%04x\nA: bcdDevice=%04x\nA: busnum=%u\n"
+                  "A: devpath=%s\n",
+                  vendorId_I, productId_I, version_I, bus_I, devpath_I.c_str());
+    return text;
+  }
+
+  static std::string Hex(const std::vector<uint8_t>& bytes_I) {
+    std::string text;
+    char pair[3];
+    for (uint8_t byte : bytes_I) {
+      std::snprintf(pair, sizeof(pair), "%02X", byte);
+      text += pair;
+    }
+    return text;
+  }
+
+  void Add(const std::string& text_I) {
+    GError* error = nullptr;
+    if (!umockdev_testbed_add_from_string(mTestbed, text_I.c_str(), &error)) {
+      std::fprintf(stderr, "umockdev: %s\n", error != nullptr ? error->message : "?");
+      if (error != nullptr) g_error_free(error);
+      std::abort();
+    }
+  }
+
+  UMockdevTestbed* mTestbed;
+  unsigned mHidCount = 0;
+};

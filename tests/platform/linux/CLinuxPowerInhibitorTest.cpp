@@ -1,0 +1,119 @@
+// The logind inhibitor against a private bus with a stand-in logind.
+#include "platform/linux/CLinuxPowerInhibitor.h"
+
+#include <poll.h>
+#include <systemd/sd-bus.h>
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <thread>
+#include <vector>
+
+#include "platform/linux/PrivateBus.h"
+
+namespace {
+
+// Answers Inhibit with one end of a pipe and keeps the other, so the test
+// sees when the caller lets go: the read end reports end of file.
+class CFakeLogind {
+ public:
+  enum class EMode { kGrant, kRefuse };
+
+  explicit CFakeLogind(EMode mode_I) : mMode(mode_I) {
+    if (sd_bus_open_system(&mBus) < 0) return;
+    static const sd_bus_vtable kVtable[] = {
+        SD_BUS_VTABLE_START(0),
+        SD_BUS_METHOD("Inhibit", "ssss", "h", &CFakeLogind::OnInhibit, SD_BUS_VTABLE_UNPRIVILEGED),
+        SD_BUS_VTABLE_END};
+    sd_bus_add_object_vtable(mBus, nullptr, "/org/freedesktop/login1",
+                             "org.freedesktop.login1.Manager", kVtable, this);
+    mReady = sd_bus_request_name(mBus, "org.freedesktop.login1", 0) >= 0;
+    mThread = std::thread([this] {
+      while (!mStop) {
+        if (sd_bus_process(mBus, nullptr) > 0) continue;
+        sd_bus_wait(mBus, 50 * 1000);
+      }
+    });
+  }
+  ~CFakeLogind() {
+    mStop = true;
+    if (mThread.joinable()) mThread.join();
+    for (int fd : mReadEnds) close(fd);
+    sd_bus_flush_close_unref(mBus);
+  }
+
+  bool IsReady() const { return mReady; }
+  std::vector<std::string> LastArguments() const { return mArguments; }
+  int LastReadEnd() const { return mReadEnds.empty() ? -1 : mReadEnds.back(); }
+
+ private:
+  static int OnInhibit(sd_bus_message* message_I, void* self_I, sd_bus_error* error_O) {
+    auto* self = static_cast<CFakeLogind*>(self_I);
+    const char *what = nullptr, *who = nullptr, *why = nullptr, *mode = nullptr;
+    sd_bus_message_read(message_I, "ssss", &what, &who, &why, &mode);
+    self->mArguments = {what, who, why, mode};
+    if (self->mMode == EMode::kRefuse) {
+      return sd_bus_error_set(error_O, SD_BUS_ERROR_ACCESS_DENIED, "not for you");
+    }
+    int ends[2];
+    if (pipe(ends) != 0) return -errno;
+    self->mReadEnds.push_back(ends[0]);
+    const int status = sd_bus_reply_method_return(message_I, "h", ends[1]);
+    close(ends[1]);  // the reply carries its own copy
+    return status;
+  }
+
+  EMode mMode;
+  sd_bus* mBus = nullptr;
+  bool mReady = false;
+  std::atomic<bool> mStop{false};
+  std::thread mThread;
+  std::vector<std::string> mArguments;
+  std::vector<int> mReadEnds;
+};
+
+bool WriterGone(int readEnd_I) {
+  pollfd entry{readEnd_I, POLLIN, 0};
+  return poll(&entry, 1, 2000) == 1 && (entry.revents & (POLLHUP | POLLIN)) != 0;
+}
+
+TEST(LinuxPowerInhibitor, HoldsLogindsLockUntilTheAssertionGoes) {
+  CPrivateBus bus;
+  if (!bus.IsUp()) GTEST_SKIP() << "dbus-daemon is not installed";
+  CFakeLogind logind(CFakeLogind::EMode::kGrant);
+  ASSERT_TRUE(logind.IsReady());
+
+  CLinuxPowerInhibitor inhibitor;
+  auto assertion = inhibitor.Create("Updating Tavik tablet firmware");
+  ASSERT_NE(assertion, nullptr);
+  EXPECT_EQ(logind.LastArguments(),
+            (std::vector<std::string>{"idle:sleep", "tavik-fwupdater",
+                                      "Updating Tavik tablet firmware", "block"}));
+  pollfd entry{logind.LastReadEnd(), POLLIN, 0};
+  EXPECT_EQ(poll(&entry, 1, 0), 0);  // still held
+  assertion.reset();
+  EXPECT_TRUE(WriterGone(logind.LastReadEnd()));
+}
+
+TEST(LinuxPowerInhibitor, RefusalIsNoAssertionButAMissingLogindIsGranted) {
+  CPrivateBus bus;
+  if (!bus.IsUp()) GTEST_SKIP() << "dbus-daemon is not installed";
+  CLinuxPowerInhibitor inhibitor;
+  {
+    CFakeLogind logind(CFakeLogind::EMode::kRefuse);
+    ASSERT_TRUE(logind.IsReady());
+    EXPECT_EQ(inhibitor.Create("x"), nullptr);
+  }
+  // Nobody owns the logind name on this bus.
+  EXPECT_NE(inhibitor.Create("x"), nullptr);
+}
+
+TEST(LinuxPowerInhibitor, NoSystemBusAtAllIsGranted) {
+  setenv("DBUS_SYSTEM_BUS_ADDRESS", "unix:path=/nonexistent/tavik-test-bus", 1);
+  CLinuxPowerInhibitor inhibitor;
+  EXPECT_NE(inhibitor.Create("x"), nullptr);
+  unsetenv("DBUS_SYSTEM_BUS_ADDRESS");
+}
+
+}  // namespace

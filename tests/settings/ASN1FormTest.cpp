@@ -1,0 +1,287 @@
+// The binary forms: the BER-like encoding, the magic document and the
+// compressed wrapper around it.
+
+#include <gtest/gtest.h>
+
+#include <stdexcept>
+
+#include "settings/ASN1Coding.h"
+#include "settings/CSettingsMap.h"
+#include "settings/CSettingsNULL.h"
+#include "settings/CompressionUtils.h"
+#include "settings/SettingsTestTrees.h"
+#include "support/LogCapture.h"
+
+namespace {
+
+using Bytes = std::vector<unsigned char>;
+
+Bytes NodeBytes(const CSettingsObject& object_I) {
+  Bytes out;
+  object_I.AppendASN1Node(out);
+  return out;
+}
+
+Bytes WithMagic(const Bytes& node_I) {
+  Bytes out{0x02, 0x04, 'T', 'a', 'v', 'm'};
+  out.insert(out.end(), node_I.begin(), node_I.end());
+  return out;
+}
+
+TEST(ASN1EncodingTest, NodesEncodeToTheirFixedTagsAndMinimalLengths) {
+  EXPECT_EQ(NodeBytes(*CSettingsInteger::New(0)), (Bytes{0x02, 0x01, 0x00}));
+  EXPECT_EQ(NodeBytes(*CSettingsInteger::New(0x1234)), (Bytes{0x02, 0x02, 0x12, 0x34}));
+  EXPECT_EQ(NodeBytes(*CSettingsInteger::New(-1)),
+            (Bytes{0x02, 0x08, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF}));
+  EXPECT_EQ(NodeBytes(*CSettingsBool::New(true)), (Bytes{0x01, 0x01, 0xFF}));
+  EXPECT_EQ(NodeBytes(*CSettingsBool::New(false)), (Bytes{0x01, 0x01, 0x00}));
+  EXPECT_EQ(NodeBytes(*CSettingsDouble::New(1.0)),
+            (Bytes{0x41, 0x08, 0x3F, 0xF0, 0, 0, 0, 0, 0, 0}));
+  EXPECT_EQ(NodeBytes(*CSettingsBytes::New({7, 8})), (Bytes{0x04, 0x02, 7, 8}));
+  EXPECT_EQ(NodeBytes(*CSettingsNULL::New()), (Bytes{0x05, 0x00}));
+  EXPECT_EQ(NodeBytes(*CSettingsKEString::New("k")), (Bytes{0x63, 0x01, 'k'}));
+  EXPECT_EQ(NodeBytes(*CSettingsMap::New()), (Bytes{0x60, 0x80, 0x00, 0x00}));
+
+  const Bytes longText = NodeBytes(*CSettingsString::New(std::string(200, 'x')));
+  ASSERT_EQ(longText.size(), 203u);
+  EXPECT_EQ((Bytes{longText[0], longText[1], longText[2]}), (Bytes{0x0C, 0x81, 0xC8}));
+
+  auto array = CSettingsArray::New();
+  array->AddString("a");
+  auto map = CSettingsMap::New();
+  map->SetKeyAndObject("L", array);
+  EXPECT_EQ(NodeBytes(*map), (Bytes{0x60, 0x80, 0x0C, 0x01, 'L', 0x62, 0x80, 0x0C, 0x01, 'a', 0x00,
+                                    0x00, 0x00, 0x00}));
+  EXPECT_EQ(CSettingsInteger::New(5)->GetASN1Binary(), WithMagic({0x02, 0x01, 0x05}));
+}
+
+TEST(ASN1EncodingTest, BuildingBlocksFollowTheLengthAndIdentifierRules) {
+  LogCapture capture;
+  EXPECT_EQ(ASN1Coding::MakeLength(127), (Bytes{0x7F}));
+  EXPECT_EQ(ASN1Coding::MakeLength(128), (Bytes{0x81, 0x80}));
+  EXPECT_EQ(ASN1Coding::MakeLength(0x10000), (Bytes{0x83, 0x01, 0x00, 0x00}));
+  EXPECT_EQ(ASN1Coding::MakeLength(ASN1Coding::IndefiniteLength), (Bytes{0x80}));
+  EXPECT_EQ(ASN1Coding::MinByteLengthOfInt(0), 1u);
+  EXPECT_EQ(ASN1Coding::MinByteLengthOfInt(0xFF), 1u);
+  EXPECT_EQ(ASN1Coding::MinByteLengthOfInt(0x100), 2u);
+  EXPECT_EQ(ASN1Coding::MinByteLengthOfInt(~0ULL), 8u);
+
+  using ASN1Coding::Identifier;
+  EXPECT_EQ(ASN1Coding::MakeIdentifier(
+                Identifier{ASN1Coding::ECLASS_UNIVERSAL, static_cast<ASN1Coding::EDataType>(16)}),
+            0x30);  // a sequence is constructed
+  EXPECT_EQ(ASN1Coding::MakeIdentifier(
+                Identifier{ASN1Coding::ECLASS_UNIVERSAL, static_cast<ASN1Coding::EDataType>(24)}),
+            0x18);
+  EXPECT_EQ(ASN1Coding::MakeIdentifier(
+                Identifier{ASN1Coding::ECLASS_UNIVERSAL, static_cast<ASN1Coding::EDataType>(31)}),
+            0);
+  EXPECT_TRUE(capture.AssertionContains("Multi-byte identifiers are not supported"));
+
+  // Lengths of the long form read back; the decoders stop at the end of data.
+  size_t pos = 0;
+  EXPECT_EQ(ASN1Coding::DecodeLengthFromArchive(Bytes{0x82, 0x01, 0x00}, pos), 256u);
+  EXPECT_EQ(pos, 3u);
+  pos = 0;
+  EXPECT_THROW(ASN1Coding::DecodeLengthFromArchive(Bytes{0x82, 0x01}, pos), std::out_of_range);
+  pos = 0;
+  EXPECT_THROW(ASN1Coding::DecodeStringFromArchive(Bytes{0x05, 'a'}, pos), std::out_of_range);
+  pos = 0;
+  const Bytes lone{0x00};
+  EXPECT_THROW(ASN1Coding::DecodeEndOfContentsIdentifierFromArchive(lone, pos), std::out_of_range);
+  pos = 0;
+  EXPECT_FALSE(ASN1Coding::DecodeEndOfContentsIdentifierFromArchive(Bytes{0x00, 0x01}, pos));
+  EXPECT_EQ(pos, 0u);
+  pos = 0;
+  EXPECT_EQ(ASN1Coding::DecodeIdentifierFromArchive(Bytes{0x63}, pos, false),
+            (Identifier{ASN1Coding::ECLASS_APPLICATION, ASN1Coding::ETYPE_SETTINGS_KESTRING}));
+  EXPECT_EQ(pos, 0u);
+}
+
+TEST(ASN1DocumentTest, EveryClassRoundTripsAndKEStringsStayKEStrings) {
+  auto tree = SettingsTestTrees::EveryClass();
+  tree->SetKeyAndObject("Long", CSettingsString::New(std::string(70000, 'z')));
+  tree->SetKeyAndDouble("Tiny", 5e-324);
+  tree->SetKeyAndInteger("Max", INT64_MAX);
+  auto back = CSettingsObject::ReadFromASN1Binary(tree->GetASN1Binary());
+  ASSERT_TRUE(back);
+  EXPECT_TRUE(back->IsEqualTo(tree));
+  EXPECT_EQ(CSettingsMap::CastToMap(back, true)->TypeNameForKeyOrEmpty("Secret"), "kestring");
+
+  auto array = CSettingsArray::New();
+  array->AddInteger(1);
+  array->AddObject(CSettingsArray::New());
+  EXPECT_TRUE(CSettingsObject::ReadFromASN1Binary(array->GetASN1Binary())->IsEqualTo(array));
+}
+
+TEST(ASN1DocumentTest, TreeWithANullWritesButDoesNotReadBack) {
+  LogCapture capture;
+  auto map = CSettingsMap::New();
+  map->SetKeyAndInteger("a", 1);
+  map->SetKeyAndObject("n", nullptr);
+  const Bytes binary = map->GetASN1Binary();
+  EXPECT_EQ(binary, WithMagic({0x60, 0x80, 0x0C, 0x01, 'a', 0x02, 0x01, 0x01, 0x0C, 0x01, 'n', 0x05,
+                               0x00, 0x00, 0x00}));
+  EXPECT_EQ(CSettingsObject::ReadFromASN1Binary(binary), nullptr);
+  EXPECT_TRUE(capture.LogContains("[I] ReadFromASN1Binary: unknown data type in archive"));
+
+  // The null's own reader works; nothing calls it from a document.
+  size_t pos = 0;
+  EXPECT_TRUE(CSettingsNULL::ReadFromASN1Node(Bytes{0x05, 0x00}, pos));
+  EXPECT_EQ(pos, 2u);
+}
+
+TEST(ASN1DocumentTest, UnusableDocumentsGiveEmptyResultsWithoutThrowing) {
+  LogCapture capture;
+  EXPECT_EQ(CSettingsObject::ReadFromASN1Binary({}), nullptr);
+  Bytes wrongMagic = CSettingsInteger::New(5)->GetASN1Binary();
+  wrongMagic[5] = 'x';
+  EXPECT_EQ(CSettingsObject::ReadFromASN1Binary(wrongMagic), nullptr);
+  EXPECT_EQ(CSettingsObject::ReadFromASN1Binary(Bytes{0x04, 0x00}), nullptr);
+  EXPECT_TRUE(capture.Log().empty());
+  EXPECT_EQ(CSettingsObject::ReadFromASN1Binary(WithMagic({})), nullptr);
+
+  // Cut anywhere, a document gives nothing, and says why.
+  const Bytes whole = SettingsTestTrees::EveryClass()->GetASN1Binary();
+  for (size_t size = 1; size < whole.size(); ++size) {
+    const Bytes cut(whole.begin(), whole.begin() + static_cast<ptrdiff_t>(size));
+    EXPECT_EQ(CSettingsObject::ReadFromASN1Binary(cut), nullptr) << size;
+  }
+  EXPECT_TRUE(capture.LogContains("[I] ReadFromASN1Binary: "));
+
+  // Tags outside the vocabulary stop the read; an unknown tag inside a map
+  // where a key belongs is stepped over a byte at a time.
+  EXPECT_EQ(CSettingsObject::ReadFromASN1Binary(WithMagic({0x80, 0x00})), nullptr);
+  auto skipped = CSettingsMap::CastToMap(
+      CSettingsObject::ReadFromASN1Binary(
+          WithMagic({0x60, 0x80, 0x31, 0x0C, 0x01, 'k', 0x01, 0x01, 0xFF, 0x00, 0x00})),
+      true);
+  ASSERT_TRUE(skipped);
+  EXPECT_TRUE(skipped->BoolForKeyWithDefault("k", false));
+}
+
+TEST(ASN1DocumentTest, WrongLengthsAssertAndReadOn) {
+  LogCapture capture;
+  // A map of definite length stays empty and consumes nothing more.
+  size_t pos = 0;
+  auto map = CSettingsMap::ReadFromASN1Node(Bytes{0x60, 0x02, 0x00, 0x00}, pos);
+  ASSERT_TRUE(map);
+  EXPECT_EQ(map->ObjectCount(), 0u);
+  EXPECT_EQ(pos, 2u);
+  EXPECT_TRUE(
+      capture.AssertionContains("(length == ASN1Coding::IndefiniteLength) || (length == 0)"));
+
+  pos = 0;
+  auto flag = CSettingsBool::ReadFromASN1Node(Bytes{0x01, 0x02, 0x00, 0x07}, pos);
+  ASSERT_TRUE(flag);
+  EXPECT_FALSE(flag->GetValue());
+  EXPECT_EQ(pos, 4u);
+  EXPECT_TRUE(capture.AssertionContains("length == 1"));
+
+  pos = 0;
+  auto number = CSettingsDouble::ReadFromASN1Node(Bytes{0x41, 0x01, 0x00}, pos);
+  ASSERT_TRUE(number);
+  EXPECT_TRUE(capture.AssertionContains("length == sizeof(double)"));
+
+  pos = 0;
+  EXPECT_EQ(CSettingsString::ReadFromASN1Node(Bytes{0x04, 0x00}, pos), nullptr);
+}
+
+TEST(ASN1DocumentTest, HostileNestingIsRefused) {
+  LogCapture capture;
+  Bytes deep = WithMagic({});
+  for (int i = 0; i < 100000; ++i) {
+    deep.push_back(0x62);
+    deep.push_back(0x80);
+  }
+  EXPECT_EQ(CSettingsObject::ReadFromASN1Binary(deep), nullptr);
+  EXPECT_TRUE(capture.LogContains("nests deeper than 200 levels"));
+
+  Bytes fine = WithMagic({});
+  for (int i = 0; i < 150; ++i) fine.insert(fine.end(), {0x62, 0x80});
+  for (int i = 0; i < 150; ++i) fine.insert(fine.end(), {0x00, 0x00});
+  EXPECT_TRUE(CSettingsObject::ReadFromASN1Binary(fine));
+}
+
+TEST(CompressedDocumentTest, RoundTripsThroughTheWrapperMap) {
+  auto tree = SettingsTestTrees::Configuration(2000);
+  const Bytes compressed = tree->GetCompressedBinary();
+  const Bytes plain = tree->GetASN1Binary();
+  EXPECT_LT(compressed.size(), plain.size() / 4);
+
+  auto wrapper = CSettingsMap::CastToMap(CSettingsObject::ReadFromASN1Binary(compressed), true);
+  ASSERT_TRUE(wrapper);
+  EXPECT_EQ(wrapper->GetKeys(), (std::vector<std::string>{"bytes", "originalSize"}));
+  EXPECT_EQ(wrapper->IntegerForKeyWithDefault("originalSize", int64_t{0}),
+            static_cast<int64_t>(plain.size()));
+
+  auto back = CSettingsObject::ReadFromCompressedBinary(compressed);
+  ASSERT_TRUE(back);
+  EXPECT_TRUE(back->IsEqualTo(tree));
+}
+
+TEST(CompressedDocumentTest, DamagedWrappersGiveEmptyResults) {
+  LogCapture capture;
+  const Bytes inner = CSettingsInteger::New(1)->GetASN1Binary();
+  const Bytes zipped = CompressionUtils::Compress(inner);
+  auto wrap = [](std::shared_ptr<CSettingsObject> bytes_I,
+                 std::shared_ptr<CSettingsObject> size_I) {
+    auto map = CSettingsMap::New();
+    if (bytes_I) map->SetKeyAndObject("bytes", bytes_I);
+    if (size_I) map->SetKeyAndObject("originalSize", size_I);
+    return map->GetASN1Binary();
+  };
+
+  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(
+                wrap(CSettingsBytes::New(zipped), CSettingsInteger::New(0))),
+            nullptr);
+  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(wrap(nullptr, CSettingsInteger::New(9))),
+            nullptr);
+  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(
+                wrap(CSettingsString::New("x"), CSettingsInteger::New(9))),
+            nullptr);
+  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(CSettingsArray::New()->GetASN1Binary()),
+            nullptr);
+  EXPECT_TRUE(capture.LogContains("CSettingsMap::CastToMap got a array"));
+
+  Bytes damaged = zipped;
+  damaged[damaged.size() / 2] ^= 0x5A;
+  damaged.resize(damaged.size() - 2);
+  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(
+                wrap(CSettingsBytes::New(damaged), CSettingsInteger::New(9))),
+            nullptr);
+  EXPECT_TRUE(capture.AssertionContains("!expandedBuffer.empty()"));
+
+  // A size no zlib data of this length can reach is refused, not allocated.
+  for (int64_t size : {int64_t{1} << 40, int64_t{-1}}) {
+    EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(
+                  wrap(CSettingsBytes::New(zipped), CSettingsInteger::New(size))),
+              nullptr);
+  }
+  // A size too small still expands: the buffer grows.
+  auto small = CSettingsObject::ReadFromCompressedBinary(
+      wrap(CSettingsBytes::New(zipped), CSettingsInteger::New(1)));
+  ASSERT_TRUE(small);
+  EXPECT_TRUE(small->IsEqualTo(CSettingsInteger::New(1)));
+}
+
+TEST(CompressionUtilsTest, ZlibWrappersBehave) {
+  EXPECT_EQ(CompressionUtils::AdjustedBufferSize(100), 113u);
+  EXPECT_EQ(CompressionUtils::AdjustedBufferSize(0), 12u);
+  EXPECT_TRUE(CompressionUtils::Compress({}).empty());
+  EXPECT_TRUE(CompressionUtils::Expand({1, 2}, 0).empty());
+  EXPECT_TRUE(CompressionUtils::Expand({}, 10).empty());
+
+  Bytes noise(5000);
+  unsigned state = 1;
+  for (auto& byte : noise)
+    byte = static_cast<unsigned char>((state = state * 1103515245 + 12345) >> 16);
+  const Bytes packed = CompressionUtils::Compress(noise);
+  EXPECT_FALSE(packed.empty());
+  EXPECT_EQ(CompressionUtils::Expand(packed, noise.size()), noise);
+
+  const std::string check = "123456789";
+  EXPECT_EQ(CompressionUtils::CRC32(0, Bytes(check.begin(), check.end())), 0xCBF43926u);
+}
+
+}  // namespace

@@ -1,0 +1,207 @@
+// The persistent store: the XML-file base form and the Linux form with its
+// configuration folder, its YES/NO booleans and the one-time migration.
+
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <fstream>
+#include <sstream>
+
+#include "settings/CLinuxPersistentSettings.h"
+#include "support/LogCapture.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+
+std::string ReadWholeFile(const fs::path& path_I) {
+  std::ifstream in(path_I, std::ios::binary);
+  std::stringstream text;
+  text << in.rdbuf();
+  return text.str();
+}
+
+void WriteFile(const fs::path& path_I, const std::string& text_I) {
+  fs::create_directories(path_I.parent_path());
+  std::ofstream(path_I, std::ios::binary) << text_I;
+}
+
+// Points HOME and XDG_CONFIG_HOME at a fresh folder for the test's length.
+class PersistentSettingsTest : public ::testing::Test {
+ protected:
+  void SetUp() override {
+    mRoot = fs::temp_directory_path() /
+            ("settings-store-" +
+             std::string(::testing::UnitTest::GetInstance()->current_test_info()->name()));
+    fs::remove_all(mRoot);
+    fs::create_directories(mRoot / "home");
+    Keep("HOME");
+    Keep("XDG_CONFIG_HOME");
+    setenv("HOME", (mRoot / "home").c_str(), 1);
+    setenv("XDG_CONFIG_HOME", (mRoot / "config").c_str(), 1);
+  }
+  void TearDown() override {
+    for (const auto& [name, value] : mSaved) {
+      if (value.second) {
+        setenv(name.c_str(), value.first.c_str(), 1);
+      } else {
+        unsetenv(name.c_str());
+      }
+    }
+    fs::remove_all(mRoot);
+  }
+  fs::path StoreFile() const { return mRoot / "config" / "tavik" / "tdc.xml"; }
+  fs::path LegacyFile() const { return mRoot / "home" / ".tavik" / "tdc.xml"; }
+
+  fs::path mRoot;
+
+ private:
+  void Keep(const std::string& name_I) {
+    const char* value = std::getenv(name_I.c_str());
+    mSaved[name_I] = {value != nullptr ? value : "", value != nullptr};
+  }
+  std::map<std::string, std::pair<std::string, bool>> mSaved;
+};
+
+TEST_F(PersistentSettingsTest, BaseStoreKeepsValuesInItsFileAcrossStarts) {
+  const fs::path file = mRoot / "base.xml";
+  {
+    CPersistentSettings store(file.string());
+    LogCapture capture;
+    store.Init();
+    EXPECT_TRUE(capture.LogContains("[W] CPersistentSettings::Init() - XML file was no help"));
+    EXPECT_EQ(store.GetLastStatus(), CPersistentSettings::ESTATUS_READ_FAILED);
+
+    EXPECT_TRUE(store.SetKeyAndBool("My Key", true));
+    EXPECT_TRUE(store.GetBoolForKey("MyKey"));
+    EXPECT_TRUE(store.IsKeyPresent(" M y K e y "));
+    EXPECT_TRUE(store.SetKeyAndString("Last Path", "/media/fw", "Update History"));
+    EXPECT_EQ(store.GetStringForKey("LastPath", "UpdateHistory"), "/media/fw");
+    EXPECT_EQ(store.GetStringForKey("LastPath"), "");
+    EXPECT_FALSE(store.GetBoolForKey("Absent"));
+    EXPECT_EQ(store.CountKeys(), 2u);  // the key and the category
+    EXPECT_EQ(store.GetLastStatus(), CPersistentSettings::ESTATUS_OK);
+  }
+  CPersistentSettings again(file.string());
+  again.Init();
+  EXPECT_TRUE(again.GetBoolForKey("My Key"));
+  EXPECT_EQ(again.GetStringForKey("Last Path", "Update History"), "/media/fw");
+
+  const auto written = fs::last_write_time(file);
+  EXPECT_FALSE(again.DeleteKey("Absent"));
+  EXPECT_EQ(fs::last_write_time(file), written);  // nothing was saved
+  EXPECT_TRUE(again.DeleteCategory("Update History"));
+  EXPECT_FALSE(again.IsKeyPresent("LastPath", "UpdateHistory"));
+  EXPECT_TRUE(again.DeleteKey("MyKey"));
+
+  CPersistentSettings third(file.string());
+  third.Init();
+  // Looking into a category makes it, so the lookup after the delete left an
+  // empty one behind, and the last save wrote it.
+  EXPECT_EQ(third.CountKeys(), 1u);
+  EXPECT_EQ(third.CountKeys("UpdateHistory"), 0u);
+  EXPECT_FALSE(third.IsKeyPresent("MyKey"));
+}
+
+TEST_F(PersistentSettingsTest, LinuxStoreWritesYesAndNoIntoTheConfigFolder) {
+  CLinuxPersistentSettings store;
+  store.Init();
+  EXPECT_EQ(store.GetFilePath(), StoreFile().string());
+  EXPECT_FALSE(fs::exists(StoreFile()));
+
+  EXPECT_TRUE(store.SetKeyAndBool("Beta Updates", true));
+  EXPECT_TRUE(store.SetKeyAndBool("Silent", false, "Options"));
+  EXPECT_TRUE(store.SetKeyAndString("Device", "pen"));
+  const std::string text = ReadWholeFile(StoreFile());
+  EXPECT_NE(text.find("<BetaUpdates type=\"string\">YES</BetaUpdates>"), std::string::npos) << text;
+  EXPECT_NE(text.find("<Silent type=\"string\">NO</Silent>"), std::string::npos) << text;
+  EXPECT_FALSE(fs::exists(StoreFile().string() + ".new"));
+
+  EXPECT_TRUE(store.GetBoolForKey("BetaUpdates"));
+  EXPECT_FALSE(store.GetBoolForKey("Silent", "Options"));
+  EXPECT_FALSE(store.GetBoolForKey("Device"));
+  store.SetKeyAndString("Typed", "yes");
+  EXPECT_TRUE(store.GetBoolForKey("Typed"));
+
+  CLinuxPersistentSettings again;
+  again.Init();
+  EXPECT_TRUE(again.GetBoolForKey("Beta Updates"));
+  EXPECT_EQ(again.GetStringForKey("Device"), "pen");
+}
+
+TEST_F(PersistentSettingsTest, LegacyFileMovesInOnceAndIsRemoved) {
+  WriteFile(LegacyFile(),
+            "<root type=\"map\"><Agreed type=\"bool\">true</Agreed><Off type=\"bool\">false</Off>"
+            "<Name type=\"string\">old</Name><Count type=\"integer\">4</Count></root>");
+  {
+    CLinuxPersistentSettings store;
+    store.Init();
+    EXPECT_TRUE(store.GetBoolForKey("Agreed"));
+    EXPECT_FALSE(store.GetBoolForKey("Off"));
+    EXPECT_TRUE(store.IsKeyPresent("Off"));
+    EXPECT_EQ(store.GetStringForKey("Name"), "old");
+    EXPECT_FALSE(store.IsKeyPresent("Count"));  // only booleans and strings move
+    EXPECT_FALSE(fs::exists(LegacyFile()));
+    EXPECT_TRUE(fs::exists(LegacyFile().parent_path()));
+  }
+  CLinuxPersistentSettings second;
+  second.Init();
+  EXPECT_TRUE(second.GetBoolForKey("Agreed"));
+  EXPECT_EQ(second.CountKeys(), 3u);
+}
+
+TEST_F(PersistentSettingsTest, LegacyFileStaysWhenItIsBadOrCannotBeMovedIn) {
+  LogCapture capture;
+  WriteFile(LegacyFile(), "<root><unclosed></root>");
+  {
+    CLinuxPersistentSettings store;
+    store.Init();
+    EXPECT_EQ(store.CountKeys(), 0u);
+    EXPECT_TRUE(fs::exists(LegacyFile()));
+  }
+
+  // A file where the configuration folder should be: nothing can be saved.
+  WriteFile(LegacyFile(), "<root><Name>old</Name></root>");
+  WriteFile(mRoot / "config", "in the way");
+  CLinuxPersistentSettings blocked;
+  blocked.Init();
+  EXPECT_EQ(blocked.GetLastStatus(), CPersistentSettings::ESTATUS_SAVE_FAILED);
+  EXPECT_TRUE(fs::exists(LegacyFile()));
+  // Reads still give what is in memory; writes report the failure.
+  EXPECT_EQ(blocked.GetStringForKey("Name"), "old");
+  EXPECT_FALSE(blocked.SetKeyAndString("x", "y"));
+}
+
+TEST_F(PersistentSettingsTest, FolderFollowsXdgRules) {
+  EXPECT_EQ(CLinuxPersistentSettings::ConfigFolder(), (mRoot / "config" / "tavik").string());
+  setenv("XDG_CONFIG_HOME", "relative/path", 1);
+  EXPECT_EQ(CLinuxPersistentSettings::ConfigFolder(),
+            (mRoot / "home" / ".config" / "tavik").string());
+  unsetenv("XDG_CONFIG_HOME");
+  EXPECT_EQ(CLinuxPersistentSettings::ConfigFolder(),
+            (mRoot / "home" / ".config" / "tavik").string());
+  EXPECT_EQ(CLinuxPersistentSettings::LegacyFolder(), (mRoot / "home" / ".tavik").string());
+}
+
+TEST_F(PersistentSettingsTest, LoggingSwitchInTheRootIsAnnounced) {
+  CLinuxPersistentSettings store;
+  store.Init();
+  std::vector<bool> announced;
+  store.SetLoggingNotifier([&](bool enable_I) { announced.push_back(enable_I); });
+  store.SetKeyAndBool("LOGGING_ENABLED", true);
+  store.SetKeyAndBool("LOGGING_ENABLED", false, "Other");
+  store.SetKeyAndBool("LOGGING _ENABLED", false);
+  EXPECT_EQ(announced, (std::vector<bool>{true, false}));
+}
+
+TEST_F(PersistentSettingsTest, SharedInstanceIsTheLinuxStoreMadeOnce) {
+  CPersistentSettings* first = CPersistentSettings::SharedInstance();
+  ASSERT_NE(first, nullptr);
+  EXPECT_EQ(CPersistentSettings::SharedInstance(), first);
+  EXPECT_NE(dynamic_cast<CLinuxPersistentSettings*>(first), nullptr);
+  EXPECT_EQ(fs::path(first->GetFilePath()).filename(), "tdc.xml");
+}
+
+}  // namespace
