@@ -58,7 +58,10 @@ TEST(PeerTools, SRecordFilesOfSrecCatAndObjcopyLoadByteForByte) {
 
   for (int width : {2, 3, 4}) {
     for (int line : {16, 32, 64}) {
-      const std::string out = folder.Path("w" + std::to_string(width) + ".pen");
+      std::string name = "width";
+      name += std::to_string(width);
+      name += ".pen";
+      const std::string out = folder.Path(name);
       RunTool("srec_cat " + bin + " -binary -offset 0x1000 -o " + out +
               " -Motorola -address-length=" + std::to_string(width) +
               " -obs=" + std::to_string(line));
@@ -111,7 +114,10 @@ TEST(PeerTools, IntelHexFilesOfSrecCatAndObjcopyLoadByteForByte) {
   };
   for (size_t i = 0; i < commands.size(); ++i) {
     std::string command = commands[i];
-    const std::string out = folder.Path("out" + std::to_string(i) + ".hex");
+    std::string name = "out";
+    name += std::to_string(i);
+    name += ".hex";
+    const std::string out = folder.Path(name);
     command.replace(command.find("OUT"), 3, out);
     RunTool(command);
     CIntelHex hex;
