@@ -1,0 +1,40 @@
+#pragma once
+// One update run as the program makes it: the terminal window on the main
+// thread's loop, the updater driver with the run's seams, and the
+// application object that ends the process through its terminate handler.
+
+#include <functional>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "devices/CDiscovery.h"
+#include "seams/CDesktop.h"
+#include "seams/CDeviceRegistry.h"
+#include "seams/CPowerInhibitor.h"
+
+struct SRunSeams {
+  std::shared_ptr<CDeviceRegistry> registry;
+  std::shared_ptr<CPowerInhibitor> power;
+  std::shared_ptr<CDesktop> desktop;
+  std::function<std::unique_ptr<CDiscovery>()> makeDiscovery;
+  // Where fw_loader.ini is looked for when -f does not name it.
+  std::string executableFolder;
+  std::string installedDataFolder;
+};
+
+struct SRunOptions {
+  std::vector<std::string> processArguments;  // program name first
+  bool headless = false;
+  bool assumeYes = false;
+  // Runs just before the process ends (a lab run saves its boards here).
+  std::function<void()> beforeExit;
+};
+
+class CUpdaterRun {
+ public:
+  // Runs until the application object ends the process; does not return
+  // in the program. The result is the exit status for a run whose end was
+  // not the process's (tests stop the process-ending step).
+  static int Run(SRunSeams seams_I, SRunOptions options_I);
+};
