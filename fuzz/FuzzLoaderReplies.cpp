@@ -1,0 +1,75 @@
+// A loader whose every answer comes from the fuzzer: parameters, flash
+// descriptor, checksums, and whether each report went through. Init and
+// the S-record procedure must survive any device (ASan and UBSan watch),
+// finish in bounded time, and never write outside the image they were given.
+#include <fuzzer/FuzzedDataProvider.h>
+
+#include <cstdint>
+#include <cstdlib>
+#include <memory>
+#include <vector>
+
+#include "common/CClock.h"
+#include "common/CVirtualClock.h"
+#include "flash/CFLDeviceInterface.h"
+#include "flash/CFLProtocol.h"
+
+namespace {
+
+class FuzzedLoader : public CFLDeviceInterface {
+ public:
+  explicit FuzzedLoader(FuzzedDataProvider& data_I) : mData(data_I) {
+    mIsOpen = true;
+    mIsFlashLoader = true;
+  }
+  bool Open() override { return true; }
+  void Close() override {}
+  bool GetAttributes() override { return true; }
+  std::string GetBasePath(uint8_t) override { return {}; }
+  bool SwitchToBLMode() override { return false; }
+  bool SwitchFromBLMode(bool) override { return false; }
+  bool IsAlive() override { return true; }
+  bool InitEEPROM() override { return false; }
+
+  bool Write(std::vector<uint8_t>& report_IO) override {
+    if (++mReports > kReportBudget) std::abort();  // a loop that never ends
+    return mData.remaining_bytes() == 0 || mData.ConsumeBool();
+  }
+  bool Read(std::vector<uint8_t>& report_IO) override {
+    if (++mReports > kReportBudget) std::abort();
+    if (mData.remaining_bytes() == 0) return true;
+    if (!mData.ConsumeBool()) return false;
+    const std::vector<uint8_t> reply = mData.ConsumeBytes<uint8_t>(report_IO.size());
+    std::copy(reply.begin(), reply.end(), report_IO.begin());
+    return true;
+  }
+
+ private:
+  // Every retry of every command of a 1024-block loader stays far below.
+  static constexpr uint64_t kReportBudget = 50'000'000;
+  FuzzedDataProvider& mData;
+  uint64_t mReports = 0;
+};
+
+}  // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data_I, size_t size_I) {
+  static const bool clockSet = [] {
+    CClock::Set(std::make_shared<CVirtualClock>());
+    __DUMP_WRITE_COMMAND__ = false;
+    return true;
+  }();
+  (void)clockSet;
+  FuzzedDataProvider data(data_I, size_I);
+  CFLProtocol::GetInstance()->SetProtocolType(data.ConsumeBool() ? EFL_PROTOCOL_NON_BL
+                                                                 : EFL_PROTOCOL_LOADER);
+  FuzzedLoader loader(data);
+  loader.SetDataSourceFormat(static_cast<EDataSourceFormat>(data.ConsumeIntegralInRange(0, 2)));
+  std::vector<SContinuousDataBlock> image(2);
+  image[0].startAddress = data.ConsumeIntegral<uint32_t>();
+  image[0].data.assign(data.ConsumeIntegralInRange<size_t>(0, 3000), 0x5A);
+  image[1].startAddress = data.ConsumeIntegral<uint32_t>();
+  image[1].data.assign(data.ConsumeIntegralInRange<size_t>(0, 600), 0xA5);
+  if (loader.Init(image)) loader.ProgramBoard();
+  return 0;
+}

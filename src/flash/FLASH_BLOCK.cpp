@@ -1,0 +1,33 @@
+#include "flash/FLASH_BLOCK.h"
+
+#include <algorithm>
+#include <cstring>
+
+FLASH_BLOCK::FLASH_BLOCK(uint32_t startAddr_I, uint32_t size_I, uint32_t readSize_I,
+                         uint32_t writeWordSize_I, uint32_t writeBlockSize_I,
+                         uint32_t writeStartOffset_I, uint32_t writeSize_I, bool protected_I)
+    : mStartAddr(startAddr_I),
+      mSize(size_I),
+      mReadSize(readSize_I),
+      mWriteWordSize(writeWordSize_I),
+      mWriteBlockSize(writeBlockSize_I),
+      mWriteStartOffset(writeStartOffset_I),
+      mWriteSize(writeSize_I),
+      mProtected(protected_I) {}
+
+void FLASH_BLOCK::MakeBlankImage() {
+  if (mBlockData.empty()) mBlockData.assign(mSize, 0xFF);
+}
+
+void FLASH_BLOCK::CopyIn(uint32_t offset_I, const uint8_t* data_I, uint32_t count_I) {
+  if (count_I == 0) return;
+  std::memcpy(mBlockData.data() + offset_I, data_I, count_I);
+}
+
+bool FLASH_BLOCK::IsWordWritten(uint32_t offset_I) const {
+  const size_t end = std::min<size_t>(mBlockData.size(), size_t{offset_I} + mWriteWordSize);
+  for (size_t i = offset_I; i < end; ++i) {
+    if (mBlockData[i] < 0xFF) return true;
+  }
+  return false;
+}

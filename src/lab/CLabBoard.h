@@ -1,0 +1,119 @@
+#pragma once
+// The base of every emulated board: what the bus and the seam forms need
+// of it. A board shows interfaces on the bus, answers reports through the
+// fault wrapper, keeps a trace of every report it saw, re-enumerates when
+// its mode changes, and saves its state to the lab's state folder.
+//
+// Threads: a board is only ever called with its bus's lock held; it never
+// locks anything itself.
+
+#include <cstdint>
+#include <functional>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "lab/CLabFaults.h"
+#include "lab/CLabStateFile.h"
+#include "lab/LabTypes.h"
+#include "seams/CHidNode.h"
+#include "seams/CUsbControl.h"
+
+class CLabBus;
+
+// The identity a board shows in one of its modes.
+struct SLabIdentity {
+  uint16_t vendorId = 0;
+  uint16_t productId = 0;
+  ELabLink link = ELabLink::eHid;
+  // One interface per pair: (usage page, usage). Vendor-class USB
+  // interfaces have no usage: one pair of zeroes.
+  std::vector<std::pair<uint16_t, uint16_t>> usages;
+  uint16_t release = 0;
+
+  std::vector<SLabInterface> Interfaces() const;
+};
+
+class CLabBoard {
+ public:
+  explicit CLabBoard(std::string name_I);
+  virtual ~CLabBoard() = default;
+  CLabBoard(const CLabBoard&) = delete;
+  CLabBoard& operator=(const CLabBoard&) = delete;
+
+  const std::string& GetName() const { return mName; }
+
+  // The interfaces of the current mode, location not filled in; none while
+  // the board is between modes.
+  virtual std::vector<SLabInterface> GetInterfaces() const = 0;
+  // As after plugging in: the mode follows from the image.
+  virtual void PowerOn() = 0;
+
+  // The seam entry points: each report goes through the fault wrapper, is
+  // traced as it arrived, then answered by the board.
+  EHidStatus SetFeature(const DeviceInfo& interface_I, const std::vector<uint8_t>& report_I);
+  EHidStatus GetFeature(const DeviceInfo& interface_I, std::vector<uint8_t>& report_IO);
+  EUsbStatus Control(uint8_t requestType_I, uint8_t request_I, uint16_t value_I, uint16_t index_I,
+                     std::vector<uint8_t>& data_IO, size_t& transferred_O);
+
+  CLabFaults& Faults() { return mFaults; }
+  const std::vector<SLabTraceEntry>& GetTrace() const { return mTrace; }
+  void ClearTrace() { mTrace.clear(); }
+  void SetTraceEnabled(bool enabled_I) { mTraceEnabled = enabled_I; }
+  uint64_t GetReportCount() const { return mReportCount; }
+  // Rules of the protocol or of the flash that the host broke.
+  virtual std::vector<std::string> GetViolations() const { return mViolations; }
+
+  // The board's file in a state folder.
+  std::string StatePath(const std::string& folder_I) const;
+  bool SaveState(const std::string& folder_I) const;
+  // False, leaving the board as it is, when the folder has no state of it.
+  bool LoadState(const std::string& folder_I);
+
+  // Set by the bus.
+  bool IsAttached() const { return mAttached; }
+  bool IsUnplugged() const { return mUnplugged; }
+  uint32_t GetLocationId() const { return mLocationId; }
+  uint64_t GetGeneration() const { return mGeneration; }
+
+ protected:
+  // The board's answers: false stalls the report.
+  virtual bool OnSetFeature(const DeviceInfo& interface_I, const std::vector<uint8_t>& report_I);
+  virtual bool OnGetFeature(const DeviceInfo& interface_I, std::vector<uint8_t>& report_IO);
+  virtual bool OnControl(uint8_t requestType_I, uint8_t request_I, uint16_t value_I,
+                         uint16_t index_I, std::vector<uint8_t>& data_IO, size_t& transferred_O);
+  // Where a report carries flash data, as [begin, end); empty otherwise.
+  virtual std::pair<size_t, size_t> DataRange(const std::vector<uint8_t>& report_I) const;
+  // Boards with a busy notion of their own take busy faults themselves.
+  virtual bool AnswersBusyItself() const { return false; }
+
+  virtual void Save(CLabStateFile& state_IO) const = 0;
+  virtual void Load(const CLabStateFile& state_I, bool powerCycled_I) = 0;
+
+  // Drops off the bus, runs `boot_I`, and comes back with the interfaces
+  // of the mode it then has. The delays are the bus's.
+  void Reenumerate(std::function<void()> boot_I);
+  bool IsReenumerating() const { return mReenumerating; }
+  void Violation(const std::string& text_I) { mViolations.push_back(text_I); }
+  double Now() const;
+
+ private:
+  friend class CLabBus;
+  void Trace(SLabTraceEntry::EKind kind_I, std::vector<uint8_t> bytes_I, size_t length_I,
+             bool ok_I);
+  void AfterReport();
+
+  std::string mName;
+  CLabFaults mFaults;
+  std::vector<SLabTraceEntry> mTrace;
+  bool mTraceEnabled = true;
+  uint64_t mReportCount = 0;
+  std::vector<std::string> mViolations;
+
+  CLabBus* mBus = nullptr;
+  bool mAttached = false;
+  bool mUnplugged = false;
+  bool mReenumerating = false;
+  uint32_t mLocationId = 0;
+  uint64_t mGeneration = 0;
+};

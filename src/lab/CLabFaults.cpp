@@ -1,0 +1,149 @@
+#include "lab/CLabFaults.h"
+
+#include <algorithm>
+
+namespace {
+
+struct SKindName {
+  ELabFaultKind kind;
+  const char* name;
+};
+
+constexpr SKindName kKindNames[] = {
+    {ELabFaultKind::eVanish, "vanish"},
+    {ELabFaultKind::eFailRead, "fail-read"},
+    {ELabFaultKind::eFailWrite, "fail-write"},
+    {ELabFaultKind::eStall, "stall"},
+    {ELabFaultKind::eBusy, "busy"},
+    {ELabFaultKind::eRefuseSwitch, "refuse-switch"},
+    {ELabFaultKind::eBadCrc, "bad-crc"},
+    {ELabFaultKind::eFlaky, "flaky"},
+};
+
+}  // namespace
+
+bool ParseLabFault(const std::string& text_I, SLabFault& fault_O, std::string& error_O) {
+  std::string rest = text_I;
+  SLabFault fault;
+  const size_t colon = rest.find(':');
+  if (colon != std::string::npos) {
+    fault.board = rest.substr(colon + 1);
+    rest.erase(colon);
+    if (fault.board.empty()) {
+      error_O = "empty board name in \"" + text_I + "\"";
+      return false;
+    }
+  }
+  const size_t at = rest.find('@');
+  const std::string name = rest.substr(0, at);
+  const SKindName* kind = std::find_if(std::begin(kKindNames), std::end(kKindNames),
+                                       [&](const SKindName& entry) { return name == entry.name; });
+  if (kind == std::end(kKindNames)) {
+    error_O = "unknown fault kind \"" + name + "\"";
+    return false;
+  }
+  fault.kind = kind->kind;
+  if (fault.kind == ELabFaultKind::eRefuseSwitch) {
+    if (at != std::string::npos) {
+      error_O = "refuse-switch takes no count";
+      return false;
+    }
+  } else {
+    const std::string number = at == std::string::npos ? std::string() : rest.substr(at + 1);
+    if (number.empty() || number.size() > 9 ||
+        !std::all_of(number.begin(), number.end(), [](char c) { return c >= '0' && c <= '9'; })) {
+      error_O = "fault \"" + text_I + "\" needs a count: KIND@N";
+      return false;
+    }
+    fault.count = static_cast<uint32_t>(std::stoul(number));
+    if (fault.count == 0) {
+      error_O = "fault \"" + text_I + "\" needs a count above 0";
+      return false;
+    }
+  }
+  fault_O = fault;
+  return true;
+}
+
+std::string LabFaultText(const SLabFault& fault_I) {
+  std::string text;
+  for (const SKindName& entry : kKindNames) {
+    if (entry.kind == fault_I.kind) text = entry.name;
+  }
+  if (fault_I.kind != ELabFaultKind::eRefuseSwitch) {
+    text.push_back('@');
+    text.append(std::to_string(fault_I.count));
+  }
+  if (!fault_I.board.empty()) {
+    text.push_back(':');
+    text.append(fault_I.board);
+  }
+  return text;
+}
+
+void CLabFaults::Add(const SLabFault& fault_I) {
+  switch (fault_I.kind) {
+    case ELabFaultKind::eVanish: mVanishAfter = fault_I.count; break;
+    case ELabFaultKind::eFailRead: mFailReads += fault_I.count; break;
+    case ELabFaultKind::eFailWrite: mFailWrites += fault_I.count; break;
+    case ELabFaultKind::eStall: mStalls += fault_I.count; break;
+    case ELabFaultKind::eBusy: mBusy += fault_I.count; break;
+    case ELabFaultKind::eRefuseSwitch: mRefuseSwitch = true; break;
+    case ELabFaultKind::eBadCrc: mBadDataReports.push_back(fault_I.count); break;
+    case ELabFaultKind::eFlaky: mFlakyOneIn = fault_I.count; break;
+  }
+}
+
+void CLabFaults::Clear() {
+  mVanishAfter = 0;
+  mVanishDue = false;
+  mFailReads = mFailWrites = mStalls = mBusy = 0;
+  mRefuseSwitch = false;
+  mBadDataReports.clear();
+  mFlakyOneIn = 0;
+}
+
+bool CLabFaults::Empty() const {
+  return mVanishAfter == 0 && !mVanishDue && mFailReads == 0 && mFailWrites == 0 && mStalls == 0 &&
+         mBusy == 0 && !mRefuseSwitch && mBadDataReports.empty() && mFlakyOneIn == 0;
+}
+
+ELabFaultAction CLabFaults::OnReport(bool isRead_I, bool isData_I, bool ownBusy_I) {
+  if (mVanishAfter != 0 && --mVanishAfter == 0) mVanishDue = true;
+
+  bool corrupt = false;
+  if (isData_I) {
+    for (uint32_t& countdown : mBadDataReports) {
+      if (countdown != 0 && --countdown == 0) corrupt = true;
+    }
+    std::erase(mBadDataReports, 0u);
+  }
+  if (isRead_I && mFailReads != 0) {
+    --mFailReads;
+    return ELabFaultAction::eFail;
+  }
+  if (!isRead_I && mFailWrites != 0) {
+    --mFailWrites;
+    return ELabFaultAction::eFail;
+  }
+  if (mStalls != 0) {
+    --mStalls;
+    return ELabFaultAction::eStall;
+  }
+  if (mBusy != 0 && !ownBusy_I) {
+    --mBusy;
+    return ELabFaultAction::eBusy;
+  }
+  if (mFlakyOneIn != 0 && mRandom() % mFlakyOneIn == 0) return ELabFaultAction::eFail;
+  return corrupt ? ELabFaultAction::eCorrupt : ELabFaultAction::ePass;
+}
+
+bool CLabFaults::TakeBusy() {
+  if (mBusy == 0) return false;
+  --mBusy;
+  return true;
+}
+
+size_t CLabFaults::CorruptOffset(size_t size_I) {
+  return size_I == 0 ? 0 : static_cast<size_t>(mRandom() % size_I);
+}

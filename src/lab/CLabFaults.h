@@ -1,0 +1,94 @@
+#pragma once
+// The lab's fault wrapper: one per board, it sits between the seam and the
+// board and decides, report by report, whether the report reaches the board
+// as sent. Faults come from tests or from the command line of a lab run as
+// KIND@N (N counted from the moment the fault is added):
+//
+//   vanish@N      after N more reports the board is unplugged for the rest
+//                 of the run; the next run finds it as after a power cycle
+//   fail-read@N   the next N reads fail
+//   fail-write@N  the next N writes fail
+//   stall@N       the next N reports stall; a written report is still
+//                 taken by the board first, as real controllers do when
+//                 they stall the status stage
+//   busy@N        the next N reports meet a busy device: answered busy at
+//                 the node, or, on boards with a busy notion of their own
+//                 (programming reports, the I2C tunnel), by that notion
+//   refuse-switch the board acknowledges mode switches and ignores them
+//   bad-crc@N     the Nth data report (a flash block, word or page) arrives
+//                 with one payload byte changed
+//   flaky@N       each report fails with a chance of 1 in N, drawn from
+//                 the wrapper's seeded generator
+//
+// A fault may name its board: KIND@N:board. The generator is seeded, so a
+// run with the same faults and seed fails the same reports.
+
+#include <cstdint>
+#include <random>
+#include <string>
+#include <vector>
+
+enum class ELabFaultKind {
+  eVanish,
+  eFailRead,
+  eFailWrite,
+  eStall,
+  eBusy,
+  eRefuseSwitch,
+  eBadCrc,
+  eFlaky,
+};
+
+struct SLabFault {
+  ELabFaultKind kind = ELabFaultKind::eFailRead;
+  uint32_t count = 0;
+  std::string board;  // empty: every board
+
+  bool operator==(const SLabFault&) const = default;
+};
+
+// Parses "KIND@N" or "KIND@N:board" ("refuse-switch" takes no number).
+// False, with a reason, on anything else.
+bool ParseLabFault(const std::string& text_I, SLabFault& fault_O, std::string& error_O);
+std::string LabFaultText(const SLabFault& fault_I);
+
+// What the wrapper does with one report.
+enum class ELabFaultAction {
+  ePass,     // the board takes the report as sent
+  eFail,     // the report fails; the board never sees it
+  eStall,    // stalled; a written report still reaches the board
+  eBusy,     // busy; the board never sees it
+  eCorrupt,  // a payload byte is changed before the board sees it
+};
+
+class CLabFaults {
+ public:
+  void Add(const SLabFault& fault_I);
+  void Clear();
+  void SetSeed(uint64_t seed_I) { mRandom.seed(seed_I); }
+  bool Empty() const;
+
+  // Decides the fate of one report. `isData_I`: the report carries flash
+  // data. `ownBusy_I`: the board answers busy faults itself (TakeBusy).
+  ELabFaultAction OnReport(bool isRead_I, bool isData_I, bool ownBusy_I);
+  // True once the vanish count has run out; stays true.
+  bool VanishDue() const { return mVanishDue; }
+  bool RefuseSwitch() const { return mRefuseSwitch; }
+  // For boards with their own busy notion: true while busy faults remain,
+  // taking one each time.
+  bool TakeBusy();
+  // Which payload byte to change, below `size_I`.
+  size_t CorruptOffset(size_t size_I);
+
+ private:
+  uint32_t mVanishAfter = 0;  // 0: no vanish fault
+  bool mVanishDue = false;
+  uint32_t mFailReads = 0;
+  uint32_t mFailWrites = 0;
+  uint32_t mStalls = 0;
+  uint32_t mBusy = 0;
+  bool mRefuseSwitch = false;
+  std::vector<uint32_t> mBadDataReports;  // countdowns, one per bad-crc fault
+  uint32_t mFlakyOneIn = 0;
+  std::mt19937_64 mRandom{0x7A5Cu};
+};

@@ -1,0 +1,29 @@
+#include "lab/CLabSession.h"
+
+#include "common/CClock.h"
+#include "common/CVirtualClock.h"
+#include "common/TavLog.h"
+
+CLabSession::CLabSession(std::shared_ptr<CLabBus> bus_I, CLabOptions options_I)
+    : mBus(std::move(bus_I)), mOptions(std::move(options_I)) {}
+
+CLabSession::~CLabSession() { Finish(); }
+
+int CLabSession::Start() {
+  if (mOptions.GetFast()) CClock::Set(std::make_shared<CVirtualClock>());
+  const int loaded = mBus->LoadState(mOptions.GetStateFolder());
+  mBus->AddFaults(mOptions.GetFaults(), mOptions.GetSeed());
+  for (const SLabFault& fault : mOptions.GetFaults()) {
+    TavLog::Info("Lab fault: %s\n", LabFaultText(fault).c_str());
+  }
+  mStarted = true;
+  return loaded;
+}
+
+bool CLabSession::Finish() {
+  if (!mStarted) return true;
+  mStarted = false;
+  const bool saved = mBus->SaveState(mOptions.GetStateFolder());
+  if (!saved) TavLog::Error("Lab state not saved to %s\n", mOptions.GetStateFolder().c_str());
+  return saved;
+}

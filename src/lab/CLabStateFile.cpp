@@ -1,0 +1,83 @@
+#include "lab/CLabStateFile.h"
+
+#include <cstdio>
+#include <fstream>
+
+namespace {
+const char kHeader[] = "tavik-lab-state 1\n";
+}
+
+void CLabStateFile::PutBytes(const std::string& key_I, const std::vector<uint8_t>& bytes_I) {
+  mEntries[key_I] = bytes_I;
+}
+
+void CLabStateFile::PutNumber(const std::string& key_I, uint64_t value_I) {
+  const std::string text = std::to_string(value_I);
+  mEntries[key_I] = std::vector<uint8_t>(text.begin(), text.end());
+}
+
+bool CLabStateFile::GetBytes(const std::string& key_I, std::vector<uint8_t>& bytes_O) const {
+  auto found = mEntries.find(key_I);
+  if (found == mEntries.end()) return false;
+  bytes_O = found->second;
+  return true;
+}
+
+uint64_t CLabStateFile::GetNumber(const std::string& key_I, uint64_t default_I) const {
+  auto found = mEntries.find(key_I);
+  if (found == mEntries.end()) return default_I;
+  try {
+    return std::stoull(std::string(found->second.begin(), found->second.end()));
+  } catch (...) {
+    return default_I;
+  }
+}
+
+// Each entry: a line "key length", the bytes, a line feed.
+bool CLabStateFile::Save(const std::string& path_I) const {
+  const std::string temporary = path_I + ".new";
+  {
+    std::ofstream out(temporary, std::ios::binary | std::ios::trunc);
+    if (!out) return false;
+    out << kHeader;
+    for (const auto& [key, bytes] : mEntries) {
+      out << key << ' ' << bytes.size() << '\n';
+      out.write(reinterpret_cast<const char*>(bytes.data()),
+                static_cast<std::streamsize>(bytes.size()));
+      out << '\n';
+    }
+    if (!out.flush()) return false;
+  }
+  return std::rename(temporary.c_str(), path_I.c_str()) == 0;
+}
+
+bool CLabStateFile::Load(const std::string& path_I) {
+  mEntries.clear();
+  std::ifstream in(path_I, std::ios::binary | std::ios::ate);
+  if (!in) return false;
+  const std::streamoff fileSize = in.tellg();
+  in.seekg(0);
+  std::string line;
+  if (!std::getline(in, line) || line + "\n" != kHeader) return false;
+  while (std::getline(in, line)) {
+    // "key length": a length of digits only, and no more than the file holds.
+    const size_t blank = line.rfind(' ');
+    const std::string key = blank == std::string::npos ? std::string() : line.substr(0, blank);
+    const std::string digits = blank == std::string::npos ? std::string() : line.substr(blank + 1);
+    if (key.empty() || digits.empty() || digits.size() > 12 ||
+        digits.find_first_not_of("0123456789") != std::string::npos ||
+        std::stoll(digits) > fileSize) {
+      mEntries.clear();
+      return false;
+    }
+    const size_t length = static_cast<size_t>(std::stoll(digits));
+    std::vector<uint8_t> bytes(length);
+    in.read(reinterpret_cast<char*>(bytes.data()), static_cast<std::streamsize>(length));
+    if (static_cast<size_t>(in.gcount()) != length || in.get() != '\n') {
+      mEntries.clear();
+      return false;
+    }
+    mEntries[key] = std::move(bytes);
+  }
+  return true;
+}

@@ -1,0 +1,66 @@
+#include "platform/linux/CLinuxI2CFLDeviceInterface.h"
+
+#include "common/CClock.h"
+#include "common/TavAssert.h"
+#include "common/TavLog.h"
+#include "platform/linux/LinuxPlatformConstants.h"
+
+CLinuxI2CFLDeviceInterface::CLinuxI2CFLDeviceInterface(const DeviceInfo& info_I,
+                                                       std::unique_ptr<CHidNode> node_I)
+    : CI2CFLDeviceInterface(), mNode(std::move(node_I)) {
+  mVendorId = info_I.vendorId;
+  mProductId = info_I.productId;
+  mLocationId = info_I.locationId;
+  mUsageId = info_I.usage;
+  mUsagePage = info_I.usagePage;
+  mPath = PathFromInfo(info_I);
+}
+
+CLinuxI2CFLDeviceInterface::~CLinuxI2CFLDeviceInterface() { Close(); }
+
+DeviceInfo CLinuxI2CFLDeviceInterface::RebuildInfo() const {
+  return DeviceInfo{mVendorId, mProductId, mLocationId, mUsageId, mUsagePage};
+}
+
+std::string CLinuxI2CFLDeviceInterface::GetBasePath(uint8_t /*topology_I*/) {
+  return PathFromInfo(RebuildInfo());
+}
+
+bool CLinuxI2CFLDeviceInterface::Open() {
+  const DeviceInfo info = RebuildInfo();
+  mPath = PathFromInfo(info);
+  if (IsAlive()) return true;
+  Close();
+  if (!mNode) return false;
+  EHidStatus status = mNode->Open(info);
+  if (status == EHidStatus::eBusy) {
+    TavSleep(LinuxPlatform::kExclusiveOpenRetryWait);
+    status = mNode->Open(info);
+  }
+  if (status != EHidStatus::eSuccess) {
+    TavLog::Info("I2C master open of %s failed: %s\n", mPath.c_str(), HidStatusName(status));
+    mIsOpen = false;
+    return false;
+  }
+  mVersion = mNode->GetReleaseNumber();
+  mIsOpen = true;
+  return true;
+}
+
+void CLinuxI2CFLDeviceInterface::Close() {
+  if (!IsOpen() || !mNode) return;
+  mNode->Close();
+  mIsOpen = false;
+}
+
+bool CLinuxI2CFLDeviceInterface::WriteMaster(std::vector<uint8_t>& data_IO) {
+  if (data_IO.empty()) TAVASSERT_TEXT("data_I.size()");
+  if (!mNode) return true;
+  return mNode->SetFeatureReport(data_IO) == EHidStatus::eSuccess;
+}
+
+bool CLinuxI2CFLDeviceInterface::ReadMaster(std::vector<uint8_t>& data_IO) {
+  if (data_IO.empty()) TAVASSERT_TEXT("data_I.size()");
+  if (!mNode) return true;
+  return mNode->GetFeatureReport(data_IO) == EHidStatus::eSuccess;
+}

@@ -1,0 +1,159 @@
+// The interruption campaign: an S-record update is cut at every report of
+// its sequence in turn (the board vanishes), power returns (the lab's state
+// folder carries the board into a second run, as a power cycle), and a
+// second full update must then succeed.
+
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <filesystem>
+
+#include "lab/CLabPenController.h"
+#include "support/LabFixture.h"
+#include "support/LabImages.h"
+#include "support/LabSRecUpdate.h"
+
+namespace {
+
+using LabImages::Record;
+
+SLabPenDescription SmallPen(ELabProtocol protocol_I) {
+  SLabPenDescription description;
+  description.protocol = protocol_I;
+  description.cpus = {SLabFlashLayout::Uniform(0x08000000, 4096, 12, 1, 1024)};
+  return description;
+}
+
+class InterruptionCampaign : public LabFixture, public ::testing::WithParamInterface<ELabProtocol> {
+ protected:
+  void SetUp() override {
+    LabFixture::SetUp();
+    mFolder = std::filesystem::temp_directory_path() /
+              ("tavik-campaign-" + std::to_string(::getpid()) + "-" +
+               std::to_string(GetParam() == ELabProtocol::eLoader ? 0 : 1));
+  }
+  void TearDown() override {
+    std::filesystem::remove_all(mFolder);
+    LabFixture::TearDown();
+  }
+
+  EFLProtocolType Protocol() const {
+    return GetParam() == ELabProtocol::eNonBL ? EFL_PROTOCOL_NON_BL : EFL_PROTOCOL_LOADER;
+  }
+
+  // A fresh run: a new bus with a factory-fresh pen, or the pen of the
+  // state folder.
+  std::shared_ptr<CLabPenController> NewRun(bool fromFolder_I) {
+    mBus = CLabBus::Create();
+    auto pen = std::make_shared<CLabPenController>(SmallPen(GetParam()));
+    mBus->Plug(pen);
+    if (fromFolder_I) {
+      EXPECT_EQ(mBus->LoadState(mFolder.string()), 1);
+    }
+    return pen;
+  }
+
+  LabSRecUpdate::SResult RunUpdate(const CLabPenController& pen_I,
+                                   const std::vector<SContinuousDataBlock>& image_I) {
+    const uint32_t location = pen_I.GetLocationId();
+    LabSRecUpdate update(mBus, {0x7A71, 0x0301, location, 0x0002, 0x000D},
+                         {0x7A71, 0x0302, location, 0x0001, 0xFF00});
+    update.SetProtocol(Protocol());
+    update.SetFormat(EDS_SREC_GENERIC);
+    return update.Run(image_I);
+  }
+
+  std::filesystem::path mFolder;
+};
+
+TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
+  const std::vector<SContinuousDataBlock> image{Record(0x08002100, 3 * 4096 + 200, 11),
+                                                Record(0x08009000, 300, 12)};
+  const uint8_t commitId = GetParam() == ELabProtocol::eNonBL ? 0xDE : 0x1D;
+
+  // The uninterrupted sequence: how many reports, and where the commits lie.
+  std::shared_ptr<CLabPenController> pen = NewRun(false);
+  const std::vector<std::vector<uint8_t>> oldImage = [&] {
+    std::vector<std::vector<uint8_t>> blocks;
+    for (uint32_t i = 0; i < 12; ++i)
+      blocks.push_back(pen->GetLoader().GetCpu(0).GetBlockContent(i));
+    return blocks;
+  }();
+  const auto newImage = LabImages::Expected(pen->GetLoader().GetCpu(0), image);
+  ASSERT_TRUE(RunUpdate(*pen, image).backToNormal);
+  const uint64_t sequence = pen->GetReportCount();
+  uint64_t firstCommit = 0;
+  uint64_t lastCommit = 0;
+  for (size_t i = 0; i < pen->GetTrace().size(); ++i) {
+    const SLabTraceEntry& entry = pen->GetTrace()[i];
+    if (entry.kind != SLabTraceEntry::eSetFeature || entry.bytes[0] != commitId) continue;
+    if (firstCommit == 0) firstCommit = i + 1;
+    lastCommit = i + 1;
+  }
+  ASSERT_EQ(pen->GetTrace().size(), sequence);
+  ASSERT_LT(firstCommit, lastCommit);
+
+  uint64_t keptOld = 0;
+  uint64_t leftInLoader = 0;
+  uint64_t keptNew = 0;
+  for (uint64_t cut = 1; cut <= sequence; ++cut) {
+    SCOPED_TRACE("cut after report " + std::to_string(cut));
+    std::filesystem::remove_all(mFolder);
+    pen = NewRun(false);
+    pen->Faults().Add({ELabFaultKind::eVanish, static_cast<uint32_t>(cut), ""});
+    EXPECT_FALSE(RunUpdate(*pen, image).backToNormal);
+    ASSERT_TRUE(pen->IsUnplugged());
+    ASSERT_TRUE(mBus->SaveState(mFolder.string()));
+
+    // Power returns.
+    pen = NewRun(true);
+    const CLabFlash& flash = pen->GetLoader().GetCpu(0);
+    std::vector<std::vector<uint8_t>> content;
+    for (uint32_t i = 0; i < 12; ++i) content.push_back(flash.GetBlockContent(i));
+    if (cut < firstCommit) {
+      // Nothing was invalidated or erased yet: the old firmware runs.
+      EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eNormal);
+      EXPECT_TRUE(pen->GetLoader().IsImageValid());
+      EXPECT_EQ(content, oldImage);
+      ++keptOld;
+    } else if (cut < lastCommit) {
+      EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eLoader);
+      EXPECT_FALSE(pen->GetLoader().IsImageValid());
+      EXPECT_EQ(flash.GetRomMagicWord(), 0u);
+      ++leftInLoader;
+    } else {
+      // The final commit went through: the new firmware runs.
+      EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eNormal);
+      EXPECT_TRUE(pen->GetLoader().IsImageValid());
+      EXPECT_EQ(content, newImage);
+      ++keptNew;
+    }
+
+    // A second full update brings the new image in every case.
+    const LabSRecUpdate::SResult second = RunUpdate(*pen, image);
+    EXPECT_TRUE(second.programmed && second.backToNormal);
+    EXPECT_TRUE(pen->GetLoader().IsImageValid());
+    for (uint32_t i = 0; i < 12; ++i) {
+      EXPECT_EQ(pen->GetLoader().GetCpu(0).GetBlockContent(i), newImage[i]) << "block " << i;
+    }
+    for (const std::string& violation : pen->GetViolations()) ADD_FAILURE() << violation;
+    if (HasFailure()) break;
+  }
+
+  std::printf(
+      "interruption points tried: %llu (old image kept %llu, left in loader %llu, "
+      "new image committed %llu)\n",
+      static_cast<unsigned long long>(sequence), static_cast<unsigned long long>(keptOld),
+      static_cast<unsigned long long>(leftInLoader), static_cast<unsigned long long>(keptNew));
+  RecordProperty("interruption_points", static_cast<int>(sequence));
+  EXPECT_EQ(keptOld + leftInLoader + keptNew, sequence);
+  EXPECT_GT(leftInLoader, sequence / 2);
+}
+
+INSTANTIATE_TEST_SUITE_P(BothProtocols, InterruptionCampaign,
+                         ::testing::Values(ELabProtocol::eLoader, ELabProtocol::eNonBL),
+                         [](const auto& info) {
+                           return info.param == ELabProtocol::eLoader ? "Loader" : "NonBL";
+                         });
+
+}  // namespace

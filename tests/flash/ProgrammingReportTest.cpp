@@ -1,0 +1,252 @@
+// The programming-report procedures end to end: Intel-hex images into the
+// lab's touch controller, scalar binaries into its scalar, and both
+// Bluetooth chips, each checking pages the way the chip does.
+
+#include <gtest/gtest.h>
+
+#include <cstdio>
+#include <filesystem>
+#include <fstream>
+
+#include "firmware/CBinaryAiroFlash.h"
+#include "firmware/CIntelHex.h"
+#include "firmware/CScalarBinary.h"
+#include "lab/CLabBluetooth.h"
+#include "lab/CLabHidNode.h"
+#include "lab/CLabScalarHid.h"
+#include "lab/CLabTouchHex.h"
+#include "platform/linux/CLinuxHIDFLDeviceInterface.h"
+#include "support/LabFixture.h"
+#include "support/RecordingNotifier.h"
+
+namespace {
+
+using Bytes = std::vector<uint8_t>;
+
+Bytes Pattern(size_t size_I, uint32_t seed_I) {
+  Bytes bytes(size_I);
+  uint32_t state = seed_I;
+  for (uint8_t& byte : bytes) {
+    state = state * 1664525u + 1013904223u;
+    byte = static_cast<uint8_t>(state >> 24);
+  }
+  return bytes;
+}
+
+class ProgrammingReports : public LabFixture {
+ protected:
+  void SetUp() override {
+    LabFixture::SetUp();
+    CFLProtocol::GetInstance()->SetProtocolType(EFL_PROTOCOL_NON_BL);
+    mFolder =
+        std::filesystem::temp_directory_path() / ("tavik-programs-" + std::to_string(::getpid()));
+    std::filesystem::create_directories(mFolder);
+  }
+  void TearDown() override {
+    std::filesystem::remove_all(mFolder);
+    LabFixture::TearDown();
+  }
+
+  std::unique_ptr<CLinuxHIDFLDeviceInterface> Connect(const CLabBoard& board_I,
+                                                      EDataSourceFormat format_I) {
+    auto interface = std::make_unique<CLinuxHIDFLDeviceInterface>(
+        Listed(board_I), std::make_unique<CLabHidNode>(mBus));
+    interface->RegisterCallback(&mNotifier);
+    interface->SetIsFlashLoader(true);
+    interface->SetDataSourceFormat(format_I);
+    EXPECT_TRUE(interface->Open());
+    return interface;
+  }
+
+  std::string WriteFile(const std::string& name_I, const std::string& content_I) {
+    const std::string path = (mFolder / name_I).string();
+    std::ofstream(path, std::ios::binary) << content_I;
+    return path;
+  }
+
+  // Intel-hex text of `data_I` from 0x8000, 16 bytes a record.
+  static std::string IntelHexText(const Bytes& data_I) {
+    std::string text;
+    char line[64];
+    for (size_t at = 0; at < data_I.size(); at += 16) {
+      const size_t count = std::min<size_t>(16, data_I.size() - at);
+      const uint32_t address = 0x8000 + static_cast<uint32_t>(at);
+      uint8_t sum = static_cast<uint8_t>(count + (address >> 8) + address);
+      std::snprintf(line, sizeof(line), ":%02X%04X00", static_cast<unsigned>(count), address);
+      text += line;
+      for (size_t k = 0; k < count; ++k) {
+        std::snprintf(line, sizeof(line), "%02X", data_I[at + k]);
+        text += line;
+        sum = static_cast<uint8_t>(sum + data_I[at + k]);
+      }
+      std::snprintf(line, sizeof(line), "%02X\r\n", static_cast<uint8_t>(0x100 - sum));
+      text += line;
+    }
+    return text + ":00000001FF\r\n";
+  }
+
+  std::shared_ptr<CBinaryAiroFlash> AiroFlash(const Bytes& data_I) {
+    auto image = std::make_shared<CBinaryAiroFlash>();
+    EXPECT_TRUE(image->Load(WriteFile("bt.airoflash", std::string(data_I.begin(), data_I.end()))));
+    return image;
+  }
+
+  std::filesystem::path mFolder;
+  RecordingNotifier mNotifier;
+};
+
+TEST_F(ProgrammingReports, IntelHexChunksLandInOrder) {
+  auto touch = std::make_shared<CLabTouchHex>();
+  mBus->Plug(touch);
+  const Bytes data = Pattern(3000, 1);
+  auto hex = std::make_shared<CIntelHex>();
+  ASSERT_TRUE(hex->Load(WriteFile("touch.hex", IntelHexText(data))));
+  ASSERT_EQ(hex->Size(), 3072u);
+
+  auto interface = Connect(*touch, EDS_INTEL_HEX);
+  interface->SetIntelHexData(hex);
+  ASSERT_TRUE(interface->ProgramBoard()) << mNotifier.errors.back();
+
+  EXPECT_TRUE(touch->IsImageValid());
+  EXPECT_EQ(touch->GetDataTaken(), 3072u / 128);
+  const Bytes& image = touch->GetImage();
+  EXPECT_TRUE(std::equal(data.begin(), data.end(), image.begin()));
+  EXPECT_TRUE(std::all_of(image.begin() + 3000, image.begin() + 3072, [](uint8_t b) {
+    return b == 0xFF;
+  })) << "gaps read as blank";
+  EXPECT_EQ(mNotifier.progress.back(), 100u);
+  EXPECT_TRUE(mNotifier.Logged("ProgramBoardIntelHex:  #bytes programmed: 3072"));
+  EXPECT_TRUE(mNotifier.Logged("ProgramBoardIntelHex: - 3072 bytes were programmed Successfully"));
+  EXPECT_TRUE(touch->GetViolations().empty());
+}
+
+TEST_F(ProgrammingReports, ADataPollWhoseReadsAllFailEndsBusy) {
+  auto touch = std::make_shared<CLabTouchHex>();
+  mBus->Plug(touch);
+  auto hex = std::make_shared<CIntelHex>();
+  ASSERT_TRUE(hex->Load(WriteFile("touch.hex", IntelHexText(Pattern(100, 2)))));
+  auto interface = Connect(*touch, EDS_INTEL_HEX);
+  interface->SetIntelHexData(hex);
+  // Past the start's poll (whose byte 3 is 0 as written), every read fails.
+  touch->Faults().Add({ELabFaultKind::eFailRead, 1000000, ""});
+  EXPECT_FALSE(interface->ProgramBoard());
+  EXPECT_EQ(mNotifier.errors.back(),
+            "ProgramBoardIntelHex: Programming error happens - device is busy");
+  EXPECT_FALSE(touch->IsImageValid());
+}
+
+TEST_F(ProgrammingReports, ScalarBlocksAreCheckedByTheScalar) {
+  auto scalar = std::make_shared<CLabScalarHid>();
+  mBus->Plug(scalar);
+  const Bytes data = Pattern(1000, 3);
+  auto binary = std::make_shared<CScalarBinary>();
+  ASSERT_TRUE(binary->Prepare(data));
+  auto interface = Connect(*scalar, EDS_SCALAR_BINARY);
+  interface->SetScalarBinaryData(binary);
+  ASSERT_TRUE(interface->ProgramBoard()) << mNotifier.errors.back();
+  EXPECT_TRUE(scalar->IsImageValid());
+  EXPECT_TRUE(std::equal(data.begin(), data.end(), scalar->GetImage().begin()));
+  EXPECT_EQ(scalar->GetImage()[1000], 0xFF);
+  EXPECT_EQ(scalar->GetDataTaken(), 4u);
+  EXPECT_TRUE(mNotifier.Logged("ProgramBoardScalarBinary: sending program data at offset: 780"));
+
+  // A block corrupted on the way is refused, and the image stays invalid.
+  scalar->Faults().Add({ELabFaultKind::eBadCrc, 2, ""});
+  mNotifier.errors.clear();
+  EXPECT_FALSE(interface->ProgramBoard());
+  EXPECT_EQ(mNotifier.errors.back(),
+            "ProgramBoardScalarBinary: Programming error happens - device is busy");
+  EXPECT_EQ(scalar->GetRefusals(), 1u);
+  EXPECT_FALSE(scalar->IsImageValid());
+  scalar->PowerOn();
+  EXPECT_EQ(scalar->GetMode(), CLabProgrammingBoard::EMode::eLoader);
+}
+
+TEST_F(ProgrammingReports, AB1122SkipsItsOwnRangeAndChecksEveryPage) {
+  auto module = std::make_shared<CLabBluetooth>(CLabBluetooth::EChip::eAB1122);
+  mBus->Plug(module);
+  const Bytes data = Pattern(0x9000 + 1, 4);  // ends with a page of one byte
+  auto interface = Connect(*module, EDS_AIROFLASH);
+  interface->SetBinaryAiroFlashData(AiroFlash(data));
+  ASSERT_TRUE(interface->ProgramBoard()) << mNotifier.errors.back();
+
+  EXPECT_TRUE(module->IsImageValid());
+  const Bytes& image = module->GetImage();
+  EXPECT_TRUE(std::equal(data.begin(), data.begin() + 0x3000, image.begin()));
+  EXPECT_TRUE(std::all_of(image.begin() + 0x3000, image.begin() + 0x8000,
+                          [](uint8_t b) { return b == 0xFF; }));
+  EXPECT_TRUE(std::equal(data.begin() + 0x8000, data.end(), image.begin() + 0x8000));
+  EXPECT_EQ(image[0x9001], 0xFF);
+  // 0x30 pages of 0x91 lie in the skipped range: progress tops out below 100.
+  EXPECT_EQ(module->GetDataTaken(), 0x91u - 0x50u);
+  EXPECT_LT(mNotifier.progress.back(), 100u);
+  EXPECT_TRUE(mNotifier.Logged("calculating crc at address: 0x9000 bytes programmed: 1"));
+  EXPECT_TRUE(mNotifier.Logged(": - 36865 bytes were programmed Successfully"));
+  EXPECT_TRUE(module->GetViolations().empty());
+
+  module->Faults().Add({ELabFaultKind::eBadCrc, 5, ""});
+  EXPECT_FALSE(interface->ProgramBoard());
+  EXPECT_EQ(mNotifier.errors.back(), "ProgramBoardAiroHaBinary_AB1122: Programming error");
+  EXPECT_FALSE(module->IsImageValid());
+}
+
+TEST_F(ProgrammingReports, AB1555SendsEveryPageInOrder) {
+  auto module = std::make_shared<CLabBluetooth>(CLabBluetooth::EChip::eAB1555);
+  mBus->Plug(module);
+  const Bytes data = Pattern(5000, 5);
+  auto interface = Connect(*module, EDS_AIROFLASH2);
+  interface->SetBinaryAiroFlashData(AiroFlash(data));
+  module->Faults().Add({ELabFaultKind::eBusy, 30, ""});
+  const double before = mClock->GetTotalSlept();
+  ASSERT_TRUE(interface->ProgramBoard()) << mNotifier.errors.back();
+  // The long erase after the start and the busy answers are waited out.
+  EXPECT_GT(mClock->GetTotalSlept() - before, 1.5 + 3.0);
+
+  EXPECT_TRUE(module->IsImageValid());
+  EXPECT_TRUE(std::equal(data.begin(), data.end(), module->GetImage().begin()));
+  EXPECT_EQ(module->GetDataTaken(), 20u);
+  EXPECT_EQ(mNotifier.progress.back(), 100u);
+  EXPECT_TRUE(module->GetViolations().empty());
+
+  module->Faults().Add({ELabFaultKind::eBadCrc, 7, ""});
+  EXPECT_FALSE(interface->ProgramBoard());
+  EXPECT_EQ(mNotifier.errors.back(), "ProgramBoardAiroHaBinary_AB1555: Programming error");
+}
+
+TEST_F(ProgrammingReports, EachProcedureRefusesAnotherFormatOrMissingData) {
+  auto touch = std::make_shared<CLabTouchHex>();
+  mBus->Plug(touch);
+  auto interface = Connect(*touch, EDS_INTEL_HEX);
+  const struct {
+    EDataSourceFormat format;
+    bool (CFLDeviceInterface::*program)();
+    const char* wrongFormat;
+    const char* noData;
+  } cases[] = {
+      {EDS_INTEL_HEX, &CFLDeviceInterface::ProgramBoardIntelHex,
+       "ProgramBoardIntelHex: Datasource not correct", "ProgramBoardIntelHex: No IntelHexData"},
+      {EDS_SCALAR_BINARY, &CFLDeviceInterface::ProgramBoardScalarBinary,
+       "ProgramBoardScalarBinary: Datasource not correct",
+       "ProgramBoardScalarBinary: No ScalarBinary data loaded"},
+      {EDS_AIROFLASH, &CFLDeviceInterface::ProgramBoardAiroHaBinary_AB1122,
+       "ProgramBoardAiroHaBinary_AB1122: Datasource not correct",
+       "ProgramBoardAiroHaBinary_AB1122: No AiroFlashData"},
+      {EDS_AIROFLASH2, &CFLDeviceInterface::ProgramBoardAiroHaBinary_AB1555,
+       "ProgramBoardAiroHaBinary_AB1555: Datasource not correct",
+       "ProgramBoardAiroHaBinary_AB1555: No AiroFlashData"},
+  };
+  for (const auto& entry : cases) {
+    interface->SetDataSourceFormat(EDS_SREC_PEN);
+    EXPECT_FALSE(((*interface).*entry.program)());
+    EXPECT_EQ(mNotifier.errors.back(), entry.wrongFormat);
+    interface->SetDataSourceFormat(entry.format);
+    EXPECT_FALSE(((*interface).*entry.program)());
+    EXPECT_EQ(mNotifier.errors.back(), entry.noData);
+  }
+  interface->SetBinaryAiroFlashData(std::make_shared<CBinaryAiroFlash>());
+  interface->SetDataSourceFormat(EDS_AIROFLASH);
+  EXPECT_FALSE(interface->ProgramBoard()) << "data that is not loaded";
+  EXPECT_TRUE(touch->GetTrace().empty()) << "nothing reached the device";
+}
+
+}  // namespace

@@ -1,0 +1,444 @@
+// The lab's own parts: the fault wrapper, the flash model's rules, the bus,
+// and the state folder.
+
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <filesystem>
+#include <thread>
+
+#include "common/CClock.h"
+#include "common/CVirtualClock.h"
+#include "lab/CLabDeviceRegistry.h"
+#include "lab/CLabFlash.h"
+#include "lab/CLabHidNode.h"
+#include "lab/CLabI2CMaster.h"
+#include "lab/CLabOptions.h"
+#include "lab/CLabPenController.h"
+#include "lab/CLabScalarHid.h"
+#include "lab/CLabSession.h"
+#include "lab/CLabStateFile.h"
+#include "lab/CLabTouchBulk.h"
+#include "lab/CLabUsbControl.h"
+#include "lab/LabCrc.h"
+#include "support/LabFixture.h"
+
+namespace {
+
+using Bytes = std::vector<uint8_t>;
+
+TEST(LabFaults, ParsingTheCommandLineForm) {
+  SLabFault fault;
+  std::string error;
+  ASSERT_TRUE(ParseLabFault("vanish@12", fault, error));
+  EXPECT_EQ(fault, (SLabFault{ELabFaultKind::eVanish, 12, ""}));
+  ASSERT_TRUE(ParseLabFault("bad-crc@3:bluetooth", fault, error));
+  EXPECT_EQ(fault, (SLabFault{ELabFaultKind::eBadCrc, 3, "bluetooth"}));
+  ASSERT_TRUE(ParseLabFault("refuse-switch", fault, error));
+  EXPECT_EQ(fault.kind, ELabFaultKind::eRefuseSwitch);
+  for (const char* text :
+       {"fail-read@1", "fail-write@2", "stall@3", "busy@4", "flaky@5", "refuse-switch:pen"}) {
+    ASSERT_TRUE(ParseLabFault(text, fault, error)) << text;
+    EXPECT_EQ(LabFaultText(fault), text);
+  }
+  for (const char* text : {"melt@3", "vanish", "vanish@", "vanish@0", "vanish@x1", "stall@-2",
+                           "refuse-switch@2", "busy@3:", "vanish@99999999999"}) {
+    error.clear();
+    EXPECT_FALSE(ParseLabFault(text, fault, error)) << text;
+    EXPECT_FALSE(error.empty()) << text;
+  }
+}
+
+TEST(LabFaults, EachKindMeetsOnlyItsReports) {
+  CLabFaults faults;
+  faults.Add({ELabFaultKind::eFailRead, 2, ""});
+  EXPECT_EQ(faults.OnReport(false, false, false), ELabFaultAction::ePass);
+  EXPECT_EQ(faults.OnReport(true, false, false), ELabFaultAction::eFail);
+  EXPECT_EQ(faults.OnReport(true, false, false), ELabFaultAction::eFail);
+  EXPECT_EQ(faults.OnReport(true, false, false), ELabFaultAction::ePass);
+
+  faults.Add({ELabFaultKind::eBadCrc, 2, ""});
+  EXPECT_EQ(faults.OnReport(false, false, false), ELabFaultAction::ePass) << "not data";
+  EXPECT_EQ(faults.OnReport(false, true, false), ELabFaultAction::ePass);
+  EXPECT_EQ(faults.OnReport(false, true, false), ELabFaultAction::eCorrupt);
+  EXPECT_EQ(faults.OnReport(false, true, false), ELabFaultAction::ePass);
+
+  faults.Add({ELabFaultKind::eBusy, 1, ""});
+  EXPECT_EQ(faults.OnReport(false, false, true), ELabFaultAction::ePass) << "board's own busy";
+  EXPECT_TRUE(faults.TakeBusy());
+  EXPECT_FALSE(faults.TakeBusy());
+
+  faults.Add({ELabFaultKind::eVanish, 2, ""});
+  faults.OnReport(true, false, false);
+  EXPECT_FALSE(faults.VanishDue());
+  faults.OnReport(false, false, false);
+  EXPECT_TRUE(faults.VanishDue());
+  EXPECT_FALSE(faults.Empty());
+  faults.Clear();
+  EXPECT_TRUE(faults.Empty());
+}
+
+TEST(LabFaults, FlakyFailuresFollowTheSeed) {
+  auto pattern = [](uint64_t seed_I) {
+    CLabFaults faults;
+    faults.SetSeed(seed_I);
+    faults.Add({ELabFaultKind::eFlaky, 3, ""});
+    std::string failures;
+    for (int i = 0; i < 64; ++i) {
+      failures += faults.OnReport(i % 2 == 0, false, false) == ELabFaultAction::eFail ? 'x' : '.';
+    }
+    return failures;
+  };
+  EXPECT_EQ(pattern(7), pattern(7));
+  EXPECT_NE(pattern(7), pattern(8));
+  const std::string failures = pattern(7);
+  const auto count = std::count(failures.begin(), failures.end(), 'x');
+  EXPECT_GT(count, 8);
+  EXPECT_LT(count, 40);
+}
+
+TEST(LabFlash, ProgrammingRulesAndTheValidityOfAnImage) {
+  CLabFlash flash(SLabFlashLayout::Uniform(0x1000, 256, 4, 1, 64, 4));
+  flash.FactoryImage(1);
+  EXPECT_TRUE(flash.IsImageValid());
+  EXPECT_EQ(flash.GetRomMagicWord(), CLabFlash::kValidMagicWord);
+
+  // Programming clears bits only; over unerased bytes it is a violation.
+  const Bytes zeroes(4, 0x00);
+  ASSERT_TRUE(flash.Erase(1));
+  EXPECT_TRUE(flash.Program(0x1100, zeroes.data(), 4));
+  EXPECT_TRUE(flash.GetViolations().empty());
+  const Bytes ones(4, 0xFF);
+  EXPECT_TRUE(flash.Program(0x1100, ones.data(), 4));
+  EXPECT_EQ(flash.GetViolations().size(), 1u) << "the bytes cannot become 0xFF again";
+  EXPECT_FALSE(flash.IsImageValid()) << "block 1 no longer matches its stored checksum";
+  const Bytes pattern{0x0F, 0xF0, 0x3C, 0xC3};
+  ASSERT_TRUE(flash.Erase(2));
+  flash.Program(0x1200, pattern.data(), 4);
+  const Bytes other{0xF0, 0x0F, 0xFF, 0xFF};
+  flash.Program(0x1200, other.data(), 4);
+  EXPECT_EQ(Bytes(flash.GetBlockContent(2).begin(), flash.GetBlockContent(2).begin() + 4),
+            (Bytes{0x00, 0x00, 0x3C, 0xC3}));
+  ASSERT_EQ(flash.GetViolations().size(), 2u);
+
+  // The loader's own block and the space outside the blocks are refused.
+  EXPECT_FALSE(flash.Erase(0));
+  EXPECT_FALSE(flash.Program(0x1000, zeroes.data(), 4));
+  EXPECT_FALSE(flash.Program(0x2000, zeroes.data(), 4));
+  EXPECT_FALSE(flash.Program(0x11FE, zeroes.data(), 4)) << "across a block's end";
+  EXPECT_EQ(flash.GetViolations().size(), 6u);
+
+  // A second erase of a block still blank is needless.
+  ASSERT_TRUE(flash.Erase(3));
+  ASSERT_TRUE(flash.Erase(3));
+  EXPECT_EQ(flash.GetNeedlessErases(), 1u);
+
+  // The commit, not the host, decides the magic word.
+  flash.SetMagicWord(0x12345678);
+  flash.CommitChecksums();
+  EXPECT_EQ(flash.GetRomMagicWord(), 0u) << "stored checksums do not match";
+  for (uint32_t i = 0; i < 4; ++i) flash.CalculateChecksum(i);
+  flash.SetMagicWord(0);
+  flash.CommitChecksums();
+  EXPECT_EQ(flash.GetRomMagicWord(), CLabFlash::kValidMagicWord);
+  EXPECT_TRUE(flash.IsImageValid());
+
+  // Working copy versus ROM: a restart forgets what was not committed.
+  flash.SetChecksum(2, 0);
+  flash.Boot();
+  EXPECT_EQ(flash.GetChecksum(2), flash.ContentChecksum(2));
+}
+
+TEST(LabCrc, TheChipsCheckValues) {
+  const uint8_t check[] = {'1', '2', '3', '4', '5', '6', '7', '8', '9'};
+  EXPECT_EQ(LabCrc::BluetoothPage(check, 9), 0x45);
+  EXPECT_EQ(LabCrc::ScalarBlock(check, 9), 0xF4);
+  const std::vector<uint8_t> zeroes(256, 0x00);
+  EXPECT_EQ(LabCrc::BluetoothPage(zeroes.data(), zeroes.size()), 0x00);
+}
+
+class LabBus : public LabFixture {};
+
+// A programming-report board as a host would drive it, report by report.
+TEST_F(LabBus, AProgrammingBoardRefusesABadPageAndStaysInvalid) {
+  auto scalar = std::make_shared<CLabScalarHid>();
+  mBus->Plug(scalar);
+  CLabHidNode node(mBus);
+  ASSERT_EQ(node.Open(Listed(*scalar)), EHidStatus::eSuccess);
+  auto frame = [](uint8_t phase_I) {
+    Bytes report(512, 0xFF);
+    report[0] = 0xE4;
+    report[1] = 4;
+    report[2] = phase_I;
+    return report;
+  };
+  auto status = [&]() {
+    Bytes report(512, 0);
+    report[0] = 0xE4;
+    EXPECT_EQ(node.GetFeatureReport(report), EHidStatus::eSuccess);
+    EXPECT_EQ(Bytes(report.begin(), report.begin() + 2), (Bytes{0xE4, 4}));
+    return report[3];
+  };
+  auto block = [&](uint32_t offset_I, uint8_t fill_I, bool goodCrc_I) {
+    Bytes report = frame(2);
+    report[3] = static_cast<uint8_t>(offset_I >> 16);
+    report[4] = static_cast<uint8_t>(offset_I >> 8);
+    report[5] = static_cast<uint8_t>(offset_I);
+    std::fill(report.begin() + 7, report.begin() + 263, fill_I);
+    report[6] = static_cast<uint8_t>(LabCrc::ScalarBlock(&report[7], 256) ^ (goodCrc_I ? 0 : 1));
+    return report;
+  };
+
+  EXPECT_TRUE(scalar->IsImageValid());
+  ASSERT_EQ(node.SetFeatureReport(frame(1)), EHidStatus::eSuccess);
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusBusy) << "erasing";
+  TavSleep(0.3);
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusReady);
+  EXPECT_FALSE(scalar->IsImageValid()) << "the start invalidates";
+  ASSERT_EQ(node.SetFeatureReport(block(0x100, 0x11, true)), EHidStatus::eSuccess);
+  TavSleep(0.1);
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusReady);
+  EXPECT_EQ(scalar->GetImage()[0x100], 0x11);
+  ASSERT_EQ(node.SetFeatureReport(block(0x200, 0x22, false)), EHidStatus::eSuccess);
+  TavSleep(0.1);
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusRefused);
+  EXPECT_EQ(scalar->GetImage()[0x200], 0xFF) << "a refused block is not written";
+  ASSERT_EQ(node.SetFeatureReport(frame(3)), EHidStatus::eSuccess);
+  EXPECT_FALSE(scalar->IsImageValid()) << "an end after a refusal stores no sum";
+  EXPECT_EQ(scalar->GetRefusals(), 1u);
+
+  // A report while busy is a violation, answered until the next start.
+  ASSERT_EQ(node.SetFeatureReport(frame(1)), EHidStatus::eSuccess);
+  ASSERT_EQ(node.SetFeatureReport(block(0, 0x33, true)), EHidStatus::eSuccess);
+  EXPECT_EQ(scalar->GetViolations().size(), 1u);
+  TavSleep(0.3);
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusBadFrame);
+
+  // A clean pass makes the image valid again.
+  ASSERT_EQ(node.SetFeatureReport(frame(1)), EHidStatus::eSuccess);
+  TavSleep(0.3);
+  ASSERT_EQ(node.SetFeatureReport(block(0, 0x33, true)), EHidStatus::eSuccess);
+  TavSleep(0.1);
+  ASSERT_EQ(node.SetFeatureReport(frame(3)), EHidStatus::eSuccess);
+  EXPECT_TRUE(scalar->IsImageValid());
+
+  // Busy faults show in byte 3, for the poll to wait out.
+  TavSleep(0.3);
+  scalar->Faults().Add({ELabFaultKind::eBusy, 2, ""});
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusBusy);
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusBusy);
+  EXPECT_EQ(status(), CLabProgrammingBoard::kStatusReady);
+
+  // Cut off mid-update, the board comes back under its loader identity.
+  ASSERT_EQ(node.SetFeatureReport(frame(1)), EHidStatus::eSuccess);
+  scalar->PowerOn();
+  EXPECT_EQ(scalar->GetMode(), CLabProgrammingBoard::EMode::eLoader);
+  EXPECT_EQ(scalar->GetInterfaces().at(0).info.productId, 0x0352u);
+}
+
+TEST_F(LabBus, BoardsReenumerateWithEventsAndStaleNodesAreGone) {
+  auto pen = std::make_shared<CLabPenController>();
+  auto master = std::make_shared<CLabI2CMaster>();
+  mBus->Plug(pen);
+  mBus->Plug(master);
+  std::vector<std::pair<DeviceInfo, bool>> events;
+  mBus->AddListener([&](const SLabInterface& interface_I, bool attached_I) {
+    events.emplace_back(interface_I.info, attached_I);
+  });
+
+  std::vector<SLabInterface> listed = mBus->ListInterfaces();
+  ASSERT_EQ(listed.size(), 3u) << "the pen shows two usages, the master one";
+  EXPECT_EQ(listed[0].info.locationId, 0x01100000u);
+  EXPECT_EQ(listed[2].info.locationId, 0x01200000u);
+
+  CLabHidNode node(mBus);
+  ASSERT_EQ(node.Open(listed[0].info), EHidStatus::eSuccess);
+  EXPECT_EQ(node.GetReleaseNumber(), 0x0120);
+  CLabHidNode second(mBus);
+  EXPECT_EQ(second.Open(listed[0].info), EHidStatus::eBusy) << "held exclusively";
+  EXPECT_EQ(second.Open(listed[1].info), EHidStatus::eSuccess) << "another usage";
+  DeviceInfo absent = listed[0].info;
+  absent.locationId = 0x01300000;
+  EXPECT_EQ(second.Open(absent), EHidStatus::eGone);
+
+  EXPECT_EQ(node.SetFeatureReport({0xCC, 0x05, 0x6A}), EHidStatus::eSuccess);
+  EXPECT_TRUE(events.empty()) << "the board drops off a moment later";
+  TavSleep(0.2);
+  ASSERT_EQ(events.size(), 2u);
+  EXPECT_FALSE(events[0].second);
+  EXPECT_EQ(node.SetFeatureReport({0x02, 0x00}), EHidStatus::eGone);
+  TavSleep(0.5);
+  ASSERT_EQ(events.size(), 3u);
+  EXPECT_TRUE(events[2].second);
+  EXPECT_EQ(events[2].first.productId, 0x0302u);
+  EXPECT_EQ(events[2].first.locationId, 0x01100000u) << "same port, same location";
+  Bytes status{0x14, 0, 0, 0, 0};
+  EXPECT_EQ(node.GetFeatureReport(status), EHidStatus::eGone);
+  EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eLoader);
+}
+
+TEST_F(LabBus, TheRegistryListsAndWatchesWhatTheBusShows) {
+  auto pen = std::make_shared<CLabPenController>();
+  auto touch = std::make_shared<CLabTouchBulk>();
+  mBus->Plug(pen);
+  mBus->Plug(touch);
+  CLabDeviceRegistry registry(mBus);
+  const std::vector<SHidEntry> hid = registry.ListHidInterfaces(0x7A71);
+  ASSERT_EQ(hid.size(), 2u) << "the pen's two usages; the touch is vendor-class";
+  EXPECT_EQ(hid[0].nodePath, "lab:01100000:000D:0002");
+  EXPECT_EQ(hid[0].version, 0x0120);
+  EXPECT_TRUE(registry.ListHidInterfaces(0x1234).empty());
+  EXPECT_EQ(registry.ListUsbDevices(0).size(), 2u);
+
+  struct SWatcher : CRegistryWatcher {
+    std::mutex lock;
+    std::vector<std::string> seen;
+    void DeviceAdded(const DeviceInfo& info_I) override {
+      std::lock_guard<std::mutex> guard(lock);
+      seen.push_back("+" + std::to_string(info_I.productId));
+    }
+    void DeviceRemoved(const DeviceInfo& info_I) override {
+      std::lock_guard<std::mutex> guard(lock);
+      seen.push_back("-" + std::to_string(info_I.productId));
+    }
+  } watcher;
+  ASSERT_TRUE(registry.OpenWatch());
+  std::thread watch([&] { registry.RunWatch(watcher); });
+
+  // The touch controller leaves its vendor interface for a HID loader.
+  CLabUsbControl usb(mBus);
+  ASSERT_EQ(usb.Open(Listed(*touch)), EUsbStatus::eSuccess);
+  std::vector<uint8_t> none;
+  size_t transferred = 0;
+  ASSERT_EQ(usb.ControlTransfer(0x41, 0xF0, 0xFFFF, 0, none, transferred), EUsbStatus::eSuccess);
+  TavSleep(1.0);
+  for (int i = 0; i < 1000; ++i) {
+    std::lock_guard<std::mutex> guard(watcher.lock);
+    if (!watcher.seen.empty()) break;
+    std::this_thread::sleep_for(std::chrono::milliseconds(1));
+  }
+  registry.StopWatching();
+  watch.join();
+  EXPECT_EQ(watcher.seen, (std::vector<std::string>{"+786"})) << "only HID comes and goes";
+  EXPECT_EQ(registry.ListHidInterfaces(0).size(), 3u);
+
+  // A stop that came first ends the next watch at once.
+  registry.StopWatching();
+  registry.RunWatch(watcher);
+}
+
+TEST_F(LabBus, ARefusedSwitchIsAcknowledgedAndIgnored) {
+  auto pen = std::make_shared<CLabPenController>();
+  mBus->Plug(pen);
+  pen->Faults().Add({ELabFaultKind::eRefuseSwitch, 0, ""});
+  CLabHidNode node(mBus);
+  ASSERT_EQ(node.Open(Listed(*pen)), EHidStatus::eSuccess);
+  EXPECT_EQ(node.SetFeatureReport({0xCC, 0x6A, 0x05}), EHidStatus::eSuccess);
+  TavSleep(2.0);
+  EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eNormal);
+  EXPECT_EQ(node.SetFeatureReport({0x02, 0x00}), EHidStatus::eSuccess);
+}
+
+TEST_F(LabBus, TheStateFolderCarriesBoardsIntoTheNextRun) {
+  const std::filesystem::path folder =
+      std::filesystem::temp_directory_path() / ("tavik-lab-state-" + std::to_string(::getpid()));
+  std::filesystem::remove_all(folder);
+
+  // A pen left in its loader with a valid image, and one unplugged with an
+  // invalid image.
+  auto waiting = std::make_shared<CLabPenController>(SLabPenDescription{.name = "waiting"});
+  auto broken = std::make_shared<CLabPenController>(SLabPenDescription{.name = "broken"});
+  mBus->Plug(waiting);
+  mBus->Plug(broken);
+  CLabHidNode node(mBus);
+  ASSERT_EQ(node.Open(Listed(*waiting)), EHidStatus::eSuccess);
+  node.SetFeatureReport({0xCC, 0x05, 0x6A});
+  TavSleep(1.0);
+  broken->GetLoader().GetCpu(0).SetChecksum(4, 0);
+  broken->GetLoader().GetCpu(0).CommitChecksums();
+  broken->Faults().Add({ELabFaultKind::eVanish, 1, ""});
+  ASSERT_EQ(node.Open(Listed(*broken)), EHidStatus::eSuccess);
+  node.SetFeatureReport({0x02, 0x00});
+  ASSERT_TRUE(broken->IsUnplugged());
+  const Bytes content = broken->GetLoader().GetCpu(0).GetBlockContent(7);
+
+  CLabOptions options;
+  options.SetStateFolder(folder.string());
+  {
+    CLabSession session(mBus, options);
+    EXPECT_EQ(session.Start(), 0);
+  }  // saved on the way out
+  EXPECT_TRUE(std::filesystem::exists(folder / "waiting.state"));
+
+  auto bus = CLabBus::Create();
+  auto waitingAgain = std::make_shared<CLabPenController>(SLabPenDescription{.name = "waiting"});
+  auto brokenAgain = std::make_shared<CLabPenController>(SLabPenDescription{.name = "broken"});
+  bus->Plug(waitingAgain);
+  bus->Plug(brokenAgain);
+  CLabSession session(bus, options);
+  EXPECT_EQ(session.Start(), 2);
+  EXPECT_EQ(waitingAgain->GetMode(), CLabLoaderBoard::EMode::eLoader) << "still plugged in";
+  EXPECT_TRUE(waitingAgain->GetLoader().IsImageValid());
+  EXPECT_EQ(brokenAgain->GetMode(), CLabLoaderBoard::EMode::eLoader) << "power cycled";
+  EXPECT_FALSE(brokenAgain->GetLoader().IsImageValid());
+  EXPECT_FALSE(brokenAgain->IsUnplugged());
+  EXPECT_EQ(brokenAgain->GetLoader().GetCpu(0).GetBlockContent(7), content);
+  ASSERT_EQ(bus->ListInterfaces().size(), 2u);
+  EXPECT_EQ(bus->ListInterfaces()[1].info.productId, 0x0302u);
+  std::filesystem::remove_all(folder);
+}
+
+TEST(LabStateFile, ACorruptFileIsRefusedWhole) {
+  const std::string path =
+      (std::filesystem::temp_directory_path() / ("tavik-lab-corrupt-" + std::to_string(::getpid())))
+          .string();
+  CLabStateFile state;
+  state.PutNumber("mode", 1);
+  state.PutBytes("loader.cpu0.block3", {0x00, 0x0A, 0xFF});
+  ASSERT_TRUE(state.Save(path));
+  CLabStateFile again;
+  ASSERT_TRUE(again.Load(path));
+  std::vector<uint8_t> bytes;
+  ASSERT_TRUE(again.GetBytes("loader.cpu0.block3", bytes));
+  EXPECT_EQ(bytes, (std::vector<uint8_t>{0x00, 0x0A, 0xFF})) << "a line feed inside the bytes";
+  EXPECT_EQ(again.GetNumber("mode", 0), 1u);
+
+  for (const char* text : {"tavik-lab-state 1\nmode -1\n1\n", "tavik-lab-state 1\nmode 99\n1\n",
+                           "tavik-lab-state 1\nmode 1\n12", "tavik-lab-state 2\n"}) {
+    FILE* file = std::fopen(path.c_str(), "wb");
+    std::fputs(text, file);
+    std::fclose(file);
+    EXPECT_FALSE(again.Load(path)) << text;
+    EXPECT_FALSE(again.Has("mode"));
+  }
+  std::filesystem::remove(path);
+}
+
+TEST(LabOptions, StateFolderAndFastClock) {
+  const char* saved = std::getenv("XDG_STATE_HOME");
+  const std::string savedValue = saved != nullptr ? saved : "";
+  ::setenv("XDG_STATE_HOME", "/var/tmp/state", 1);
+  EXPECT_EQ(CLabOptions::DefaultStateFolder(), "/var/tmp/state/tavik/lab");
+  ::unsetenv("XDG_STATE_HOME");
+  ::setenv("HOME", ::getenv("HOME") != nullptr ? ::getenv("HOME") : "/home/u", 1);
+  EXPECT_EQ(CLabOptions::DefaultStateFolder(),
+            std::string(::getenv("HOME")) + "/.local/state/tavik/lab");
+  if (saved != nullptr) ::setenv("XDG_STATE_HOME", savedValue.c_str(), 1);
+
+  CLabOptions options;
+  std::string error;
+  EXPECT_TRUE(options.AddFault("stall@2", error));
+  EXPECT_FALSE(options.AddFault("stall", error));
+  EXPECT_EQ(options.GetFaults().size(), 1u);
+  options.SetStateFolder((std::filesystem::temp_directory_path() / "tavik-lab-fast").string());
+  options.SetFast(true);
+  {
+    CLabSession session(CLabBus::Create(), options);
+    session.Start();
+    EXPECT_NE(std::dynamic_pointer_cast<CVirtualClock>(CClock::Get()), nullptr);
+  }
+  CClock::Set(nullptr);
+  std::filesystem::remove_all(options.GetStateFolder());
+}
+
+}  // namespace

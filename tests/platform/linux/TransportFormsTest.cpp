@@ -1,0 +1,423 @@
+// The transports bound to their seams: the quirks each keeps, over scripted
+// seams where the exact answer matters, and whole updates over the lab.
+
+#include <gtest/gtest.h>
+
+#include <deque>
+
+#include "flash/CFLProtocol.h"
+#include "lab/CLabHidNode.h"
+#include "lab/CLabI2CMaster.h"
+#include "lab/CLabPenController.h"
+#include "lab/CLabTouchBulk.h"
+#include "lab/CLabUsbControl.h"
+#include "platform/linux/CLinuxBulkFLDeviceInterface.h"
+#include "platform/linux/CLinuxHIDFLDeviceInterface.h"
+#include "platform/linux/CLinuxI2CFLDeviceInterface.h"
+#include "support/LabFixture.h"
+#include "support/LabImages.h"
+#include "support/LogCapture.h"
+#include "support/RecordingNotifier.h"
+#include "support/ScriptedHidNode.h"
+
+namespace {
+
+using Bytes = std::vector<uint8_t>;
+const DeviceInfo kInfo{0x7A71, 0x0301, 0x01100000, 0x0002, 0x000D};
+
+class HidTransport : public LabFixture {
+ protected:
+  void SetUp() override {
+    LabFixture::SetUp();
+    auto node = std::make_unique<ScriptedHidNode>(mLog);
+    mNode = node.get();
+    mInterface = std::make_unique<CLinuxHIDFLDeviceInterface>(kInfo, std::move(node));
+    mInterface->RegisterCallback(&mNotifier);
+  }
+
+  ScriptedHidNode::SLog mLog;
+  ScriptedHidNode* mNode = nullptr;
+  std::unique_ptr<CLinuxHIDFLDeviceInterface> mInterface;
+  RecordingNotifier mNotifier;
+};
+
+TEST_F(HidTransport, AStallPassesOnlyOnAWrite) {
+  ASSERT_TRUE(mInterface->Open());
+  mNode->onSet = [](const Bytes&) { return EHidStatus::eStall; };
+  mNode->onGet = [](Bytes&) { return EHidStatus::eStall; };
+  Bytes report{0x1C, 0, 0, 0, 0};
+  EXPECT_TRUE(mInterface->Write(report));
+  EXPECT_FALSE(mInterface->Read(report));
+  mNode->onSet = [](const Bytes&) { return EHidStatus::eBusy; };
+  EXPECT_FALSE(mInterface->Write(report));
+
+  LogCapture capture;
+  Bytes empty;
+  mInterface->Write(empty);
+  EXPECT_TRUE(capture.AssertionContains("data_I.size()"));
+}
+
+TEST_F(HidTransport, WithoutANodeEveryReportSucceedsAndNothingOpens) {
+  CLinuxHIDFLDeviceInterface bare(kInfo, nullptr);
+  Bytes report{0x14, 0, 0, 0, 0};
+  EXPECT_TRUE(bare.Write(report));
+  EXPECT_TRUE(bare.Read(report));
+  EXPECT_FALSE(bare.Open());
+  EXPECT_EQ(bare.GetPath(), "31345:769:17825792:2:13");
+}
+
+TEST_F(HidTransport, OpenKeepsALiveInterfaceAndRetriesABusyOneOnce) {
+  mNode->openResults = {EHidStatus::eBusy, EHidStatus::eSuccess};
+  ASSERT_TRUE(mInterface->Open());
+  EXPECT_EQ(mLog.opens, 2);
+  EXPECT_DOUBLE_EQ(mClock->GetTotalSlept(), 2.0);
+  EXPECT_EQ(mInterface->GetVersion(), 0x0123u);
+
+  // An interface that answers the probe stays as it is.
+  ASSERT_TRUE(mInterface->Open());
+  EXPECT_EQ(mLog.opens, 2);
+  EXPECT_EQ(mLog.sets.back(), (Bytes{0x02, 0x00}));
+
+  mInterface->Close();
+  mNode->openResults = {EHidStatus::eBusy, EHidStatus::eBusy};
+  EXPECT_FALSE(mInterface->Open());
+  EXPECT_FALSE(mInterface->IsOpen());
+  EXPECT_EQ(mLog.opens, 4);
+}
+
+TEST_F(HidTransport, SwitchToLoaderSendsBothFormsAndAlwaysCloses) {
+  // Only the second form goes through.
+  mNode->onSet = [](const Bytes& report_I) {
+    return report_I == Bytes{0xCC, 0x05, 0x6A} ? EHidStatus::eOther : EHidStatus::eSuccess;
+  };
+  EXPECT_TRUE(mInterface->SwitchToBLMode());
+  EXPECT_FALSE(mInterface->IsOpen());
+  EXPECT_EQ(mLog.sets.front(), (Bytes{0xCC, 0x05, 0x6A}));
+  EXPECT_EQ(mLog.sets.back(), (Bytes{0xCC, 0x6A, 0x05}));
+
+  // Neither goes through.
+  mNode->onSet = [](const Bytes&) { return EHidStatus::eGone; };
+  EXPECT_FALSE(mInterface->SwitchToBLMode());
+
+  // Already in loader mode: nothing is sent, and the interface is closed.
+  mNode->onSet = nullptr;
+  ASSERT_TRUE(mInterface->Open());
+  mInterface->SetIsFlashLoader(true);
+  const size_t sent = mLog.sets.size();
+  const int closes = mLog.closes;
+  EXPECT_FALSE(mInterface->SwitchToBLMode());
+  EXPECT_EQ(mLog.sets.size(), sent);
+  EXPECT_EQ(mLog.closes, closes + 1);
+}
+
+TEST_F(HidTransport, ProbeEEPROMAndLeavingTheLoader) {
+  EXPECT_FALSE(mInterface->IsAlive()) << "closed";
+  ASSERT_TRUE(mInterface->Open());
+  EXPECT_TRUE(mInterface->InitEEPROM());
+  EXPECT_EQ(mLog.sets.back(), (Bytes{0x08, 0x01, 0x00, 0xAA, 0xAA}));
+  EXPECT_FALSE(mInterface->SwitchFromBLMode(true)) << "not in loader mode";
+
+  mInterface->SetIsFlashLoader(true);
+  const size_t sent = mLog.sets.size();
+  EXPECT_FALSE(mInterface->InitEEPROM());
+  EXPECT_EQ(mLog.sets.size(), sent);
+  EXPECT_TRUE(mInterface->IsAlive());
+  EXPECT_EQ(mLog.gets.back(), (Bytes{0x14, 0, 0, 0, 0}));
+  EXPECT_TRUE(mInterface->SwitchFromBLMode(false));
+  EXPECT_EQ(mLog.sets.back(), (Bytes{0x15, 0xA6, 0x50}));
+}
+
+TEST_F(HidTransport, ADeadLabDeviceCostsAHundredTriesAndOneReopen) {
+  auto pen = std::make_shared<CLabPenController>();
+  pen->GetLoader().GetCpu(0).SetChecksum(2, 0);
+  pen->GetLoader().GetCpu(0).CommitChecksums();
+  pen->PowerOn();
+  mBus->Plug(pen);
+  CLinuxHIDFLDeviceInterface loader(Listed(*pen), std::make_unique<CLabHidNode>(mBus));
+  loader.RegisterCallback(&mNotifier);
+  loader.SetIsFlashLoader(true);
+  ASSERT_TRUE(loader.Open());
+  pen->Faults().Add({ELabFaultKind::eVanish, 1, ""});
+  const double before = mClock->GetTotalSlept();
+
+  uint32_t status = 0;
+  EXPECT_TRUE(loader.FLProtGetStatus(status)) << "the last report before the board vanished";
+  EXPECT_FALSE(loader.FLProtGetStatus(status));
+  EXPECT_NEAR(mClock->GetTotalSlept() - before, 6.05 + 1.0, 1e-9);
+  EXPECT_EQ(mNotifier.CountLogged("Attempting to reopen connection."), 1u);
+  EXPECT_EQ(mNotifier.logs.back(), "Read failed.");
+  EXPECT_FALSE(loader.IsOpen()) << "the reopen found nothing";
+}
+
+// A tunnel master whose answers a test scripts.
+class I2CTransport : public LabFixture {
+ protected:
+  void SetUp() override {
+    LabFixture::SetUp();
+    auto node = std::make_unique<ScriptedHidNode>(mLog);
+    mNode = node.get();
+    mInterface = std::make_unique<CLinuxI2CFLDeviceInterface>(kInfo, std::move(node));
+    mNode->onGet = [this](Bytes& report_IO) {
+      if (mReplies.empty()) return EHidStatus::eOther;
+      const Bytes reply = mReplies.front();
+      mReplies.pop_front();
+      std::copy(reply.begin(), reply.end(), report_IO.begin());
+      return EHidStatus::eSuccess;
+    };
+  }
+
+  static Bytes WriteStatus(uint8_t status_I, uint8_t id_I) {
+    return {0xB2, status_I, 0, 0, 0, id_I};
+  }
+  static Bytes ReadReply(uint8_t status_I, size_t length_I, uint8_t id_I) {
+    Bytes reply(std::max<size_t>(6, 5 + length_I), 0x5A);
+    reply[0] = 0xB1;
+    reply[1] = status_I;
+    reply[2] = 0;
+    reply[3] = static_cast<uint8_t>(length_I);
+    reply[4] = static_cast<uint8_t>(length_I >> 8);
+    reply[5] = id_I;
+    return reply;
+  }
+
+  ScriptedHidNode::SLog mLog;
+  ScriptedHidNode* mNode = nullptr;
+  std::unique_ptr<CLinuxI2CFLDeviceInterface> mInterface;
+  std::deque<Bytes> mReplies;
+};
+
+TEST_F(I2CTransport, TunnelWriteFramingAndItsLimit) {
+  Bytes command(261, 0x33);
+  command[0] = 0x11;
+  mReplies = {WriteStatus(0xF2, 0x11)};
+  EXPECT_TRUE(mInterface->Write(command));
+  ASSERT_EQ(mLog.sets.size(), 1u);
+  const Bytes& request = mLog.sets[0];
+  ASSERT_EQ(request.size(), 265u);
+  EXPECT_EQ(Bytes(request.begin(), request.begin() + 5), (Bytes{0xB2, 0x01, 0x05, 0x01, 0x11}));
+  EXPECT_EQ(request.back(), 0x33);
+  EXPECT_EQ(mLog.gets.back(), (Bytes{0xB2, 0, 0, 0, 0, 0}));
+
+  command.push_back(0x33);  // 262 bytes
+  EXPECT_FALSE(mInterface->Write(command));
+  EXPECT_EQ(mLog.sets.size(), 1u) << "nothing sent";
+
+  // An echo of another id, a refusal, a foreign reply: all false.
+  Bytes small{0x1C, 0, 0, 0, 0};
+  mReplies = {WriteStatus(0xF2, 0x1D), WriteStatus(0xF3, 0x1C), {0xB1, 0xF2, 0, 0, 0, 0x1C}};
+  EXPECT_FALSE(mInterface->Write(small));
+  EXPECT_FALSE(mInterface->Write(small));
+  EXPECT_FALSE(mInterface->Write(small));
+  mReplies = {WriteStatus(0xF0, 0)};
+  EXPECT_TRUE(mInterface->Write(small));
+}
+
+TEST_F(I2CTransport, TunnelReadCopiesWhatWasAskedFor) {
+  Bytes wanted(300, 0xEE);
+  wanted[0] = 0x18;
+  mReplies = {ReadReply(0xF2, 261, 0x18)};
+  EXPECT_TRUE(mInterface->Read(wanted));
+  EXPECT_EQ(mLog.sets.back(), (Bytes{0xB1, 0x01, 0x18, 0x05, 0x01}));
+  EXPECT_EQ(mLog.gets.back().size(), 266u);
+  EXPECT_EQ(wanted[1], 0x5A);
+  EXPECT_EQ(wanted[260], 0x5A);
+  EXPECT_EQ(wanted[261], 0xEE) << "only the 261 bytes asked for are copied";
+
+  Bytes small{0x14, 1, 2, 3, 4};
+  mReplies = {ReadReply(0xF0, 0, 0)};
+  EXPECT_TRUE(mInterface->Read(small));
+  EXPECT_EQ(small, (Bytes{0x14, 1, 2, 3, 4})) << "no data: untouched";
+  mReplies = {ReadReply(0xF2, 4, 0x14)};
+  EXPECT_FALSE(mInterface->Read(small)) << "another length";
+  mReplies = {ReadReply(0xF2, 5, 0x15)};
+  EXPECT_FALSE(mInterface->Read(small)) << "another id";
+  EXPECT_EQ(small, (Bytes{0x14, 1, 2, 3, 4}));
+}
+
+TEST_F(I2CTransport, BusyIsWaitedOutWithoutLimitAndAStallIsAFailure) {
+  Bytes command{0x12, 1, 0, 0, 0};
+  for (int i = 0; i < 250; ++i) mReplies.push_back(WriteStatus(0xF1, 0));
+  mReplies.push_back(WriteStatus(0xF2, 0x12));
+  EXPECT_TRUE(mInterface->Write(command));
+  EXPECT_NEAR(mClock->GetTotalSlept(), 0.02 * 251, 1e-9);
+
+  mNode->onSet = [](const Bytes&) { return EHidStatus::eStall; };
+  EXPECT_FALSE(mInterface->Write(command));
+  EXPECT_EQ(mInterface->InitEEPROM(), false);
+}
+
+TEST_F(I2CTransport, ModeSwitches) {
+  // A controller that never leaves its main firmware: 60 tries, 30 s.
+  mNode->onGet = [](Bytes& report_IO) {
+    report_IO[1] = report_IO[2] = 1;
+    return EHidStatus::eSuccess;
+  };
+  EXPECT_FALSE(mInterface->SwitchToBLMode());
+  EXPECT_NEAR(mClock->GetTotalSlept(), 30.0, 1e-9);
+  size_t modeReports = 0;
+  for (const Bytes& report : mLog.sets) modeReports += report == Bytes{0xB0, 0x00, 0x00};
+  EXPECT_EQ(modeReports, 60u);
+  EXPECT_FALSE(mInterface->IsOpen());
+
+  // Already in loader mode: true at once, unlike the HID transport.
+  mNode->onGet = [](Bytes& report_IO) {
+    report_IO[1] = report_IO[2] = 0;
+    return EHidStatus::eSuccess;
+  };
+  mLog.sets.clear();
+  EXPECT_TRUE(mInterface->SwitchToBLMode());
+  EXPECT_TRUE(mLog.sets.empty());
+  EXPECT_TRUE(mInterface->GetIsFlashLoader());
+}
+
+class BulkTransport : public LabFixture {
+ protected:
+  void SetUp() override {
+    LabFixture::SetUp();
+    mTouch = std::make_shared<CLabTouchBulk>();
+    mBus->Plug(mTouch);
+    mInterface = std::make_unique<CLinuxBulkFLDeviceInterface>(
+        Listed(*mTouch), std::make_unique<CLabUsbControl>(mBus));
+  }
+  const Bytes& LastSetup() const { return mTouch->GetTrace().back().bytes; }
+
+  std::shared_ptr<CLabTouchBulk> mTouch;
+  std::unique_ptr<CLinuxBulkFLDeviceInterface> mInterface;
+};
+
+TEST_F(BulkTransport, VendorRequestsAndTheirGuards) {
+  ASSERT_TRUE(mInterface->Open());
+  EXPECT_EQ(mInterface->GetVersion(), 0x0210u);
+  EXPECT_TRUE(mInterface->IsAlive());
+  EXPECT_EQ(LastSetup(), (Bytes{0xC1, 0x01, 0, 0, 0, 0, 2, 0, 0x01, 0x00}));
+  EXPECT_TRUE(mInterface->InitEEPROM());
+  EXPECT_EQ(LastSetup(), (Bytes{0x41, 0xF5, 0xFF, 0xFF, 0, 0, 0, 0}));
+  EXPECT_EQ(mTouch->GetEEPROMInits(), 1u);
+
+  // The vector is a request's fields, not a report.
+  Bytes alive{0xC1, 0x01, 0x00, 0x00, 0x02};
+  EXPECT_TRUE(mInterface->Write(alive));
+  Bytes loaderCommand{0x14, 0, 0, 0, 0};
+  LogCapture capture;
+  EXPECT_FALSE(mInterface->Read(loaderCommand));
+  EXPECT_TRUE(capture.LogContains("Bulk Read/Write: Device Request Failed"));
+
+  EXPECT_FALSE(mInterface->SwitchFromBLMode(true));
+  EXPECT_TRUE(capture.Assertions().empty());
+  EXPECT_FALSE(mInterface->SwitchFromBLMode(false));
+  EXPECT_TRUE(capture.AssertionContains("save_I"));
+
+  mInterface->SetIsFlashLoader(true);
+  const size_t seen = mTouch->GetTrace().size();
+  EXPECT_FALSE(mInterface->IsAlive());
+  EXPECT_FALSE(mInterface->InitEEPROM());
+  EXPECT_FALSE(mInterface->SwitchToBLMode());
+  EXPECT_EQ(mTouch->GetTrace().size(), seen);
+}
+
+// A USB device whose vendor interface another holder keeps for a while.
+class HeldUsbControl : public CUsbControl {
+ public:
+  explicit HeldUsbControl(int busyClaims_I) : mBusyClaims(busyClaims_I) {}
+  EUsbStatus Open(const DeviceInfo&) override {
+    mOpen = true;
+    return EUsbStatus::eSuccess;
+  }
+  EUsbStatus ClaimVendorInterface() override {
+    ++claims;
+    return mBusyClaims-- > 0 ? EUsbStatus::eBusy : EUsbStatus::eSuccess;
+  }
+  uint16_t GetReleaseNumber() const override { return 0x0210; }
+  EUsbStatus ControlTransfer(uint8_t, uint8_t, uint16_t, uint16_t, Bytes&, size_t&) override {
+    return EUsbStatus::eStall;
+  }
+  void Close() override { mOpen = false; }
+  bool IsOpen() const override { return mOpen; }
+  int claims = 0;
+
+ private:
+  int mBusyClaims;
+  bool mOpen = false;
+};
+
+TEST_F(BulkTransport, AHeldInterfaceIsWaitedForUpToFifteenMoreTries) {
+  auto held = std::make_unique<HeldUsbControl>(15);
+  HeldUsbControl* usb = held.get();
+  CLinuxBulkFLDeviceInterface patient(Listed(*mTouch), std::move(held));
+  EXPECT_TRUE(patient.Open());
+  EXPECT_EQ(usb->claims, 16);
+  EXPECT_NEAR(mClock->GetTotalSlept(), 30.0, 1e-9);
+
+  auto forever = std::make_unique<HeldUsbControl>(100);
+  HeldUsbControl* stuck = forever.get();
+  CLinuxBulkFLDeviceInterface refused(Listed(*mTouch), std::move(forever));
+  EXPECT_FALSE(refused.Open());
+  EXPECT_EQ(stuck->claims, 16);
+  EXPECT_FALSE(stuck->IsOpen());
+}
+
+TEST_F(BulkTransport, TouchUpdateSwitchesOverUsbAndProgramsItsHidLoader) {
+  ASSERT_TRUE(mInterface->Open());
+  ASSERT_TRUE(mInterface->SwitchToBLMode());
+  TavSleep(1.0);
+  const std::vector<SLabInterface> listed = mBus->ListInterfaces();
+  ASSERT_EQ(listed.size(), 1u);
+  EXPECT_EQ(listed[0].link, ELabLink::eHid);
+  EXPECT_EQ(listed[0].info.productId, 0x0312u);
+  EXPECT_FALSE(mInterface->IsAlive()) << "the USB device it had is gone";
+
+  const CLabFlash before = mTouch->GetLoader().GetCpu(1);
+  const std::vector<SContinuousDataBlock> image{LabImages::Record(0x00101000, 5000, 21)};
+  CLinuxHIDFLDeviceInterface loader(listed[0].info, std::make_unique<CLabHidNode>(mBus));
+  RecordingNotifier notifier;
+  loader.RegisterCallback(&notifier);
+  loader.SetIsFlashLoader(true);
+  ASSERT_TRUE(loader.Open());
+  loader.SetDataSourceFormat(EDS_SREC_TOUCH);
+  ASSERT_TRUE(loader.Init(image)) << notifier.errors.back();
+  ASSERT_TRUE(loader.ProgramBoard()) << notifier.errors.back();
+  ASSERT_TRUE(loader.SwitchFromBLMode(true));
+  loader.Close();
+  TavSleep(1.0);
+
+  EXPECT_EQ(mTouch->GetMode(), CLabLoaderBoard::EMode::eNormal);
+  EXPECT_EQ(mBus->ListInterfaces().at(0).link, ELabLink::eUsbVendor);
+  const auto expected = LabImages::Expected(before, image);
+  for (uint32_t i = 0; i < before.GetBlockCount(); ++i) {
+    EXPECT_EQ(mTouch->GetLoader().GetCpu(1).GetBlockContent(i), expected[i]) << i;
+  }
+  EXPECT_EQ(loader.GetNewChecksum(), loader.GetFWChecksum());
+  EXPECT_TRUE(mTouch->GetViolations().empty());
+}
+
+TEST_F(BulkTransport, I2CUpdateThroughTheTunnel) {
+  auto master = std::make_shared<CLabI2CMaster>();
+  mBus->Plug(master);
+  const CLabFlash before = master->GetLoader().GetCpu(0);
+  CLinuxI2CFLDeviceInterface i2c(Listed(*master), std::make_unique<CLabHidNode>(mBus));
+  RecordingNotifier notifier;
+  i2c.RegisterCallback(&notifier);
+
+  ASSERT_TRUE(i2c.SwitchToBLMode());
+  EXPECT_TRUE(master->IsSlaveInLoader());
+  ASSERT_TRUE(i2c.Open());
+  const std::vector<SContinuousDataBlock> image{LabImages::Record(0x00002100, 3000, 31)};
+  i2c.SetDataSourceFormat(EDS_SREC_GENERIC);
+  master->Faults().Add({ELabFaultKind::eBusy, 7, ""});
+  ASSERT_TRUE(i2c.Init(image)) << notifier.errors.back();
+  ASSERT_TRUE(i2c.ProgramBoard()) << notifier.errors.back();
+  ASSERT_TRUE(i2c.SwitchFromBLMode(true));
+  EXPECT_TRUE(i2c.IsOpen()) << "the interface stays open";
+  TavSleep(CLabI2CMaster::kSlaveRestart);
+  EXPECT_FALSE(master->IsSlaveInLoader());
+  EXPECT_TRUE(master->GetLoader().IsImageValid());
+
+  const auto expected = LabImages::Expected(before, image);
+  for (uint32_t i = 0; i < before.GetBlockCount(); ++i) {
+    EXPECT_EQ(master->GetLoader().GetCpu(0).GetBlockContent(i), expected[i]) << i;
+  }
+  EXPECT_EQ(i2c.GetNewChecksum(), i2c.GetFWChecksum());
+  EXPECT_TRUE(master->GetViolations().empty());
+}
+
+}  // namespace
