@@ -152,6 +152,7 @@ TEST_F(DiscoveryOverLab, APenInItsLoaderIsFoundWithTheRestOfItsProductAndKeptTwi
   auto discovery = LabDiscovery(mBus);
   std::vector<DevicePtr> devices = Scan(*discovery);
   ASSERT_EQ(devices.size(), 1u);
+  ASSERT_NE(devices[0]->GetPenInterface(), nullptr);
   ASSERT_TRUE(devices[0]->GetPenInterface()->SwitchToBLMode());
   TavSleep(1.0);
   auto pen = std::dynamic_pointer_cast<CLabPenController>(boards[0]);
@@ -182,6 +183,7 @@ TEST_F(DiscoveryOverLab, ATouchControllerInItsLoaderJoinsThePenOfItsProduct) {
   auto discovery = LabDiscovery(mBus);
   std::vector<DevicePtr> devices = Scan(*discovery);
   ASSERT_EQ(devices.size(), 1u);
+  ASSERT_NE(devices[0]->GetTouchInterface(), nullptr);
   ASSERT_TRUE(devices[0]->GetTouchInterface()->Open());
   ASSERT_TRUE(devices[0]->GetTouchInterface()->SwitchToBLMode());
   devices[0]->GetTouchInterface()->Close();
