@@ -17,12 +17,29 @@ bool CCommandLine::Parse(const std::vector<std::string>& arguments_I) {
         return false;
       }
       mLogFile = arguments_I[++i];
+    } else if (argument == "--inspect" || argument == "--interface" ||
+               argument == "--output-binary") {
+      if (i + 1 >= arguments_I.size()) {
+        mError = argument + " needs a value";
+        return false;
+      }
+      std::string& value = argument == "--inspect"     ? mInspectFile
+                           : argument == "--interface" ? mInspectInterface
+                                                       : mInspectOutputBinary;
+      value = arguments_I[++i];
+    } else if (argument == "--json") {
+      mInspectJson = true;
     } else if (argument.rfind("--", 0) == 0) {
       mError = "unknown option " + argument;
       return false;
     } else {
       mUpdaterArguments.push_back(argument);
     }
+  }
+  if (mInspectFile.empty() &&
+      (mInspectJson || !mInspectInterface.empty() || !mInspectOutputBinary.empty())) {
+    mError = "--interface, --json and --output-binary go with --inspect";
+    return false;
   }
   return true;
 }
@@ -44,5 +61,11 @@ std::string CCommandLine::HelpText() {
          "  -h, --help    show this text and exit\n"
          "      --version show the version and exit\n"
          "  -v, --verbose write log lines to standard error\n"
-         "      --log FILE  append log lines to FILE\n";
+         "      --log FILE  append log lines to FILE\n"
+         "\n"
+         "Looking at a firmware file, without touching a device:\n"
+         "      --inspect FILE        load FILE as an update would and show its content\n"
+         "      --interface NAME      hid (default), bulk, i2c or ftdi; decides how .bin is read\n"
+         "      --json                show the content as one JSON object\n"
+         "      --output-binary PATH  write the loaded image to PATH as flat bytes\n";
 }

@@ -15,6 +15,11 @@ class CCommandLine {
   bool GetVerbose() const { return mVerbose; }
   const std::string& GetLogFile() const { return mLogFile; }
   const std::string& GetError() const { return mError; }
+  // --inspect FILE [--interface NAME] [--json] [--output-binary PATH]
+  const std::string& GetInspectFile() const { return mInspectFile; }
+  const std::string& GetInspectInterface() const { return mInspectInterface; }
+  bool GetInspectJson() const { return mInspectJson; }
+  const std::string& GetInspectOutputBinary() const { return mInspectOutputBinary; }
   // What is left for the updater, in order.
   const std::vector<std::string>& GetUpdaterArguments() const { return mUpdaterArguments; }
 
@@ -26,5 +31,9 @@ class CCommandLine {
   bool mVerbose = false;
   std::string mLogFile;
   std::string mError;
+  std::string mInspectFile;
+  std::string mInspectInterface;
+  bool mInspectJson = false;
+  std::string mInspectOutputBinary;
   std::vector<std::string> mUpdaterArguments;
 };

@@ -3,6 +3,7 @@
 #include <vector>
 
 #include "app/CCommandLine.h"
+#include "app/CInspectCommand.h"
 #include "app/CLogOutputs.h"
 #include "app/TavVersion.h"
 #include "common/TavLog.h"
@@ -30,6 +31,7 @@ int main(int argc, char** argv) {
                  commandLine.GetLogFile().c_str());
     return 1;
   }
+  if (!commandLine.GetInspectFile().empty()) return CInspectCommand(commandLine).Run(stdout, stderr);
   TavLog::Info("%s %s starting\n", TAV_PROGRAM_NAME, TAV_PROGRAM_VERSION);
 
   std::fputs("No update can run yet: the updater is not built in this version.\n", stderr);

@@ -2,8 +2,15 @@
 
 #include <algorithm>
 
+namespace {
+
+constexpr uint64_t kHashFactor = 0x9E3779B97F4A7C15ull;
+
+}  // namespace
+
 CBlockMergeIndex::CBlockMergeIndex(unsigned pageBits_I)
-    : mPageBits(std::clamp(pageBits_I, 1u, 30u)), mOffsetMask((uint32_t{1} << mPageBits) - 1) {}
+    : mPageBits(std::clamp(pageBits_I, 1u, kMostPageBits)),
+      mOffsetMask((uint32_t{1} << mPageBits) - 1) {}
 
 void CBlockMergeIndex::Clear() {
   mSlots = {};
@@ -40,38 +47,20 @@ uint32_t CBlockMergeIndex::LowestCoveringBlock(uint64_t address_I) const {
   const SPage* page = FindPage(address_I >> mPageBits);
   if (page == nullptr) return kNoBlock;
   const uint32_t offset = static_cast<uint32_t>(address_I) & mOffsetMask;
-  return page->entries[EntryAtOrBefore(*page, offset)].label;
+  return page->marks[EntryAtOrBefore(*page, offset)].label;
 }
 
 uint32_t CBlockMergeIndex::StartMinAt(uint64_t point_I) const {
   const SPage* page = FindPage(point_I >> mPageBits);
   if (page == nullptr) return kNoBlock;
   const uint32_t offset = static_cast<uint32_t>(point_I) & mOffsetMask;
-  const SEntry& entry = page->entries[EntryAtOrBefore(*page, offset)];
-  return entry.offset == offset ? entry.startMin : kNoBlock;
-}
-
-void CBlockMergeIndex::PrefetchSlot(uint64_t address_I) const {
-  if (mSlots.empty()) return;
-  const uint64_t key = address_I >> mPageBits;
-  __builtin_prefetch(
-      &mSlots[static_cast<size_t>((key * 0x9E3779B97F4A7C15ull) >> (64 - mSlotBits))]);
-}
-
-void CBlockMergeIndex::PrefetchEntries(uint64_t address_I) const {
-  static constexpr size_t kCacheLine = 64;
-  static constexpr size_t kMostLines = 8;
-  if (mSlots.empty()) return;
-  const SSlot& slot = mSlots[SlotOf(address_I >> mPageBits)];
-  if (slot.key == kNoKey) return;
-  const char* bytes = reinterpret_cast<const char*>(slot.page.entries.data());
-  const size_t size = std::min(slot.page.entries.size() * sizeof(SEntry), kMostLines * kCacheLine);
-  for (size_t offset = 0; offset < size; offset += kCacheLine) __builtin_prefetch(bytes + offset);
+  const size_t index = EntryAtOrBefore(*page, offset);
+  return page->offsets[index] == offset ? page->marks[index].startMin : kNoBlock;
 }
 
 size_t CBlockMergeIndex::SlotOf(uint64_t key_I) const {
   const size_t mask = mSlots.size() - 1;
-  size_t slot = static_cast<size_t>((key_I * 0x9E3779B97F4A7C15ull) >> (64 - mSlotBits));
+  size_t slot = static_cast<size_t>((key_I * kHashFactor) >> (64 - mSlotBits));
   while (mSlots[slot].key != key_I && mSlots[slot].key != kNoKey) slot = (slot + 1) & mask;
   return slot;
 }
@@ -89,11 +78,11 @@ const CBlockMergeIndex::SPage* CBlockMergeIndex::FindPage(uint64_t key_I) const 
 CBlockMergeIndex::SPage& CBlockMergeIndex::GetPage(uint64_t key_I) {
   if (key_I == mCachedKey) return *mCachedPage;
   if ((mUsedSlots + 1) * 4 > mSlots.size() * 3) GrowSlots();
-  const size_t slot = SlotOf(key_I);
-  SSlot& place = mSlots[slot];
+  SSlot& place = mSlots[SlotOf(key_I)];
   if (place.key == kNoKey) {
     place.key = key_I;
-    place.page.entries.push_back({0, kNoBlock, kNoBlock});
+    place.page.offsets.push_back(0);
+    place.page.marks.push_back({kNoBlock, kNoBlock});
     ++mUsedSlots;
   }
   mCachedKey = key_I;
@@ -120,29 +109,32 @@ void CBlockMergeIndex::GrowSlots() {
 
 size_t CBlockMergeIndex::EntryAtOrBefore(const SPage& page_I, uint32_t offset_I) const {
   static constexpr int kShortWalk = 4;
-  const std::vector<SEntry>& entries = page_I.entries;
-  const size_t count = entries.size();
+  const uint16_t* offsets = page_I.offsets.data();
+  const size_t count = page_I.offsets.size();
   size_t found = count;
   if (&page_I == mHintPage) {
     size_t i = std::min(mHintIndex, count - 1);
-    if (entries[i].offset <= offset_I) {
-      for (int step = 0; step < kShortWalk && i + 1 < count && entries[i + 1].offset <= offset_I;
-           ++step) {
+    if (offsets[i] <= offset_I) {
+      for (int step = 0; step < kShortWalk && i + 1 < count && offsets[i + 1] <= offset_I; ++step) {
         ++i;
       }
-      if (i + 1 == count || entries[i + 1].offset > offset_I) found = i;
+      if (i + 1 == count || offsets[i + 1] > offset_I) found = i;
     } else {
       // Walking down from an entry past the offset: the first one at or
       // before it is the answer. Entry 0 is at offset 0, so the walk ends.
-      for (int step = 0; step < kShortWalk && entries[i].offset > offset_I; ++step) --i;
-      if (entries[i].offset <= offset_I) found = i;
+      for (int step = 0; step < kShortWalk && offsets[i] > offset_I; ++step) --i;
+      if (offsets[i] <= offset_I) found = i;
     }
   }
   if (found == count) {
-    auto after = std::upper_bound(
-        entries.begin(), entries.end(), offset_I,
-        [](uint32_t offset_I, const SEntry& entry_I) { return offset_I < entry_I.offset; });
-    found = static_cast<size_t>(after - entries.begin()) - 1;
+    // Without branches on the data: a shuffled file leaves nothing to predict.
+    const uint16_t* base = offsets;
+    for (size_t left = count; left > 1;) {
+      const size_t half = left / 2;
+      base = base[half] <= offset_I ? base + half : base;
+      left -= half;
+    }
+    found = static_cast<size_t>(base - offsets);
   }
   mHintPage = &page_I;
   mHintIndex = found;
@@ -171,54 +163,60 @@ void CBlockMergeIndex::Paint(uint64_t first_I, uint64_t last_I, uint32_t block_I
 // repeat the paint before them without starting a block are left out.
 void CBlockMergeIndex::PaintInPage(SPage& page_I, uint64_t pageBase_I, uint32_t low_I,
                                    uint32_t high_I, uint32_t block_I, bool startsAtLow_I) {
-  std::vector<SEntry>& entries = page_I.entries;
+  std::vector<uint16_t>& offsets = page_I.offsets;
+  std::vector<SMark>& marks = page_I.marks;
   const size_t atLow = EntryAtOrBefore(page_I, low_I);
-  const bool haveLow = entries[atLow].offset == low_I;
+  const bool haveLow = offsets[atLow] == low_I;
   size_t interiorEnd = atLow + 1;
-  while (interiorEnd < entries.size() && entries[interiorEnd].offset <= high_I) ++interiorEnd;
+  while (interiorEnd < offsets.size() && offsets[interiorEnd] <= high_I) ++interiorEnd;
   const bool lastInPage = high_I == mOffsetMask;
   const bool haveAfter =
-      !lastInPage && interiorEnd < entries.size() && entries[interiorEnd].offset == high_I + 1;
+      !lastInPage && interiorEnd < offsets.size() && offsets[interiorEnd] == high_I + 1;
 
   mScratch.clear();
-  SEntry first{low_I, std::min(entries[atLow].label, block_I),
-               haveLow ? entries[atLow].startMin : kNoBlock};
-  if (startsAtLow_I) ClaimStart(pageBase_I + low_I, first.startMin, block_I);
+  SEntry first{low_I,
+               {std::min(marks[atLow].label, block_I), haveLow ? marks[atLow].startMin : kNoBlock}};
+  if (startsAtLow_I) ClaimStart(pageBase_I + low_I, first.mark.startMin, block_I);
   mScratch.push_back(first);
   for (size_t i = atLow + 1; i < interiorEnd; ++i) {
-    mScratch.push_back(
-        {entries[i].offset, std::min(entries[i].label, block_I), entries[i].startMin});
+    mScratch.push_back({offsets[i], {std::min(marks[i].label, block_I), marks[i].startMin}});
   }
   if (!lastInPage) {
-    const SEntry& source = haveAfter ? entries[interiorEnd] : entries[interiorEnd - 1];
-    mScratch.push_back({high_I + 1, source.label, haveAfter ? source.startMin : kNoBlock});
+    const SMark& source = haveAfter ? marks[interiorEnd] : marks[interiorEnd - 1];
+    mScratch.push_back({high_I + 1, {source.label, haveAfter ? source.startMin : kNoBlock}});
   }
 
   const size_t replaceBegin = haveLow ? atLow : atLow + 1;
   const size_t replaceEnd = interiorEnd + (haveAfter ? 1 : 0);
   // The entry at offset 0 stays whatever it holds.
   const bool keepFirst = replaceBegin == 0;
-  uint32_t previous = keepFirst ? kNoBlock : entries[replaceBegin - 1].label;
+  uint32_t previous = keepFirst ? kNoBlock : marks[replaceBegin - 1].label;
   size_t kept = 0;
   for (size_t i = 0; i < mScratch.size(); ++i) {
     const SEntry& entry = mScratch[i];
     const bool needed =
-        (i == 0 && keepFirst) || entry.startMin != kNoBlock || entry.label != previous;
+        (i == 0 && keepFirst) || entry.mark.startMin != kNoBlock || entry.mark.label != previous;
     if (!needed) continue;
-    previous = entry.label;
+    previous = entry.mark.label;
     mScratch[kept++] = entry;
   }
 
+  // Same count: overwrite. Otherwise one move of the rest of the page.
   const size_t oldCount = replaceEnd - replaceBegin;
-  const auto place = entries.begin() + static_cast<ptrdiff_t>(replaceBegin);
-  const size_t same = std::min(kept, oldCount);
-  std::copy(mScratch.begin(), mScratch.begin() + static_cast<ptrdiff_t>(same), place);
   if (kept < oldCount) {
-    entries.erase(place + static_cast<ptrdiff_t>(kept), place + static_cast<ptrdiff_t>(oldCount));
+    const auto from = static_cast<ptrdiff_t>(replaceBegin + kept);
+    const auto to = static_cast<ptrdiff_t>(replaceEnd);
+    offsets.erase(offsets.begin() + from, offsets.begin() + to);
+    marks.erase(marks.begin() + from, marks.begin() + to);
   } else if (kept > oldCount) {
-    entries.insert(place + static_cast<ptrdiff_t>(oldCount),
-                   mScratch.begin() + static_cast<ptrdiff_t>(oldCount),
-                   mScratch.begin() + static_cast<ptrdiff_t>(kept));
+    const auto at = static_cast<ptrdiff_t>(replaceEnd);
+    const size_t more = kept - oldCount;
+    offsets.insert(offsets.begin() + at, more, 0);
+    marks.insert(marks.begin() + at, more, SMark{});
+  }
+  for (size_t i = 0; i < kept; ++i) {
+    offsets[replaceBegin + i] = static_cast<uint16_t>(mScratch[i].offset);
+    marks[replaceBegin + i] = mScratch[i].mark;
   }
   mHintPage = &page_I;
   mHintIndex = replaceBegin;
@@ -240,15 +238,15 @@ void CBlockMergeIndex::RemoveStart(uint64_t point_I, uint32_t block_I) {
   SPage& page = GetPage(point_I >> mPageBits);
   const uint32_t offset = static_cast<uint32_t>(point_I) & mOffsetMask;
   const size_t index = EntryAtOrBefore(page, offset);
-  SEntry& entry = page.entries[index];
-  if (entry.offset != offset) return;
+  if (page.offsets[index] != offset) return;
+  SMark& mark = page.marks[index];
 
-  auto others = mOtherStarts.find(point_I);
-  if (entry.startMin == block_I) {
-    entry.startMin = kNoBlock;
+  auto others = mOtherStarts.empty() ? mOtherStarts.end() : mOtherStarts.find(point_I);
+  if (mark.startMin == block_I) {
+    mark.startMin = kNoBlock;
     if (others != mOtherStarts.end()) {
       auto lowest = std::min_element(others->second.begin(), others->second.end());
-      entry.startMin = *lowest;
+      mark.startMin = *lowest;
       others->second.erase(lowest);
     }
   } else if (others != mOtherStarts.end()) {
@@ -257,6 +255,9 @@ void CBlockMergeIndex::RemoveStart(uint64_t point_I, uint32_t block_I) {
   if (others != mOtherStarts.end() && others->second.empty()) mOtherStarts.erase(others);
 
   const bool repeatsPaint =
-      index > 0 && entry.startMin == kNoBlock && entry.label == page.entries[index - 1].label;
-  if (repeatsPaint) page.entries.erase(page.entries.begin() + static_cast<ptrdiff_t>(index));
+      index > 0 && mark.startMin == kNoBlock && mark.label == page.marks[index - 1].label;
+  if (repeatsPaint) {
+    page.offsets.erase(page.offsets.begin() + static_cast<ptrdiff_t>(index));
+    page.marks.erase(page.marks.begin() + static_cast<ptrdiff_t>(index));
+  }
 }

@@ -26,6 +26,7 @@ class CBlockMergeIndex {
   // Pages of 4 KiB keep a page's list short in a shuffled image of 32-byte
   // records (about 40 blocks a page) while the page table stays small.
   static constexpr unsigned kDefaultPageBits = 12;
+  static constexpr unsigned kMostPageBits = 16;  // offsets are 16 bits
 
   explicit CBlockMergeIndex(unsigned pageBits_I = kDefaultPageBits);
 
@@ -43,22 +44,22 @@ class CBlockMergeIndex {
   // size_I bytes were put in front of the block, which now starts at address_I.
   void BlockPrepended(uint32_t block_I, uint64_t address_I, uint64_t size_I);
 
-  // Hints for a record that will be merged a few records later: bring the
-  // page slot, then the page's entries into the cache. They change nothing.
-  void PrefetchSlot(uint64_t address_I) const;
-  void PrefetchEntries(uint64_t address_I) const;
-
   // Tests look at the paint of a single address.
   uint32_t LowestCoveringBlock(uint64_t address_I) const;
 
  private:
-  struct SEntry {
-    uint32_t offset;    // within the page
-    uint32_t label;     // lowest block covering [offset, next entry's offset)
-    uint32_t startMin;  // lowest block starting exactly here, or kNoBlock
+  struct SMark {
+    uint32_t label;     // lowest block covering [offset, next offset)
+    uint32_t startMin;  // lowest block starting exactly at the offset, or kNoBlock
   };
+  // Offsets apart from their marks: a search reads two bytes an entry.
   struct SPage {
-    std::vector<SEntry> entries;  // sorted by offset; entries[0].offset is 0
+    std::vector<uint16_t> offsets;  // sorted; offsets[0] is 0
+    std::vector<SMark> marks;
+  };
+  struct SEntry {
+    uint32_t offset;
+    SMark mark;
   };
 
   const SPage* FindPage(uint64_t key_I) const;

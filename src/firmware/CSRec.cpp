@@ -1,7 +1,8 @@
 #include "firmware/CSRec.h"
 
+#include <sys/stat.h>
+
 #include <algorithm>
-#include <array>
 #include <cerrno>
 #include <cstdio>
 
@@ -85,25 +86,27 @@ void CSRec::SetDataSourceFormat(EINTERFACE_TYPE interfaceType_I) {
     TAVASSERT_TEXT("\"firmware file not specified\"");
     return;
   }
-  const std::string extension = GetUpdateFileExt();
-  for (const SFormatByExtension& entry : kFormats) {
-    if (extension == entry.extension) {
-      mDataSourceFormat = entry.format;
-      return;
-    }
-  }
-  // A plain binary is a scalar image; the link decides which programmer reads it.
-  if (extension == "bin") {
-    if (interfaceType_I == EFTDI_INTERFACE) mDataSourceFormat = EDS_SCALAR_RTDISP;
-    if (interfaceType_I == EHID_INTERFACE) mDataSourceFormat = EDS_SCALAR_BINARY;
-  }
+  mDataSourceFormat = FormatFor(mUpdateFile, interfaceType_I);
 }
 
-std::string CSRec::GetUpdateFileExt() const {
+EDataSourceFormat CSRec::FormatFor(const std::string& path_I, EINTERFACE_TYPE interfaceType_I) {
+  const std::string extension = ExtensionOf(path_I);
+  for (const SFormatByExtension& entry : kFormats) {
+    if (extension == entry.extension) return entry.format;
+  }
+  // A plain binary is a scalar image; the link decides which programmer reads it.
+  if (extension == "bin" && interfaceType_I == EFTDI_INTERFACE) return EDS_SCALAR_RTDISP;
+  if (extension == "bin" && interfaceType_I == EHID_INTERFACE) return EDS_SCALAR_BINARY;
+  return EDS_UNKNOWN;
+}
+
+std::string CSRec::GetUpdateFileExt() const { return ExtensionOf(mUpdateFile); }
+
+std::string CSRec::ExtensionOf(const std::string& path_I) {
   // The last dot of the whole path: a dot in a folder name counts too.
-  const size_t dot = mUpdateFile.rfind('.');
+  const size_t dot = path_I.rfind('.');
   if (dot == std::string::npos) return std::string();
-  return StringUtilities::ToLower_Copy(mUpdateFile.substr(dot + 1));
+  return StringUtilities::ToLower_Copy(path_I.substr(dot + 1));
 }
 
 bool CSRec::IsLoaded() const {
@@ -119,8 +122,7 @@ bool CSRec::IsLoaded() const {
 
 void CSRec::Clear() {
   std::vector<SContinuousDataBlock>().swap(mSRecData);
-  std::vector<size_t>().swap(mFrontRoom);
-  mMergeIndex.Clear();
+  mBlockBuilder.Clear();
 }
 
 int CSRec::ParseByte(std::string_view line_I, size_t index_I) {
@@ -148,60 +150,29 @@ bool CSRec::LoadSRecFile(const std::string& path_I) {
   }
 
   TavLog::Info("LoadSRecFile - lines\n");
+  struct stat status;
+  if (fstat(fileno(file), &status) == 0 && S_ISREG(status.st_mode)) {
+    mBlockBuilder.ReserveFor(static_cast<uint64_t>(status.st_size));
+  }
   CTextLineReader reader(file);
   const bool read = ReadSRecLines(reader);
   std::fclose(file);
   return read && FinishSRecData();
 }
 
-// Each record is merged a few records after it is read, so that the cache
-// lines its merge needs arrive while the lines between are parsed. A merge
-// logs nothing and a failing line clears everything, so the log and the
-// result are those of merging each record the moment it is read.
 bool CSRec::ReadSRecLines(CTextLineReader& reader_IO) {
-  static constexpr size_t kAhead = 16;
-  std::array<SContinuousDataBlock, kAhead> pending;
-  std::array<uint32_t, kAhead> takers{};
-  size_t read = 0;
-  size_t merged = 0;
-  const auto at = [&merged](size_t distance_I) { return (merged + distance_I) % kAhead; };
-
+  SContinuousDataBlock record;
   int lineNumber = 0;
   char* line = nullptr;
   size_t length = 0;
   while (reader_IO.Next(line, length)) {
     ++lineNumber;  // blank lines count too
     TavLog::Info(">>    %s\n", line);
-    SContinuousDataBlock& record = pending[read % kAhead];
     const ELineResult result = ReadSRecLine(std::string_view(line, length), lineNumber, record);
     if (result == ELineResult::eFailed) return false;
-    if (result != ELineResult::eRead) continue;
-
-    mMergeIndex.PrefetchSlot(record.startAddress);
-    if (++read - merged < kAhead) continue;
-    mMergeIndex.PrefetchEntries(pending[at(8)].startAddress);
-    const SContinuousDataBlock& soon = pending[at(4)];
-    takers[at(4)] = mMergeIndex.FirstTaker(soon.startAddress, soon.data.size());
-    PrefetchBlock(takers[at(4)], false);
-    PrefetchBlock(takers[at(2)], true);
-    AddRecordToSRecData(pending[at(0)]);
-    ++merged;
+    if (result == ELineResult::eRead) AddRecordToSRecData(record);
   }
-  while (merged < read) AddRecordToSRecData(pending[merged++ % kAhead]);
   return true;
-}
-
-// Only a hint: the block named may no longer be the one that takes the record.
-void CSRec::PrefetchBlock(uint32_t block_I, bool data_I) const {
-  if (block_I >= mSRecData.size()) return;
-  const SContinuousDataBlock& block = mSRecData[block_I];
-  if (!data_I) {
-    __builtin_prefetch(&block);
-    __builtin_prefetch(&mFrontRoom[block_I]);
-    return;
-  }
-  __builtin_prefetch(block.data.data() + mFrontRoom[block_I]);
-  __builtin_prefetch(block.data.data() + block.data.size());
 }
 
 CSRec::ELineResult CSRec::ReadSRecLine(std::string_view line_I, int lineNumber_I,
@@ -253,7 +224,14 @@ CSRec::ELineResult CSRec::ReadSRecLine(std::string_view line_I, int lineNumber_I
   // the last two characters are always the checksum.
   const size_t dataEnd = line_I.size() - 2;
   record_O.startAddress = address;
-  record_O.data.resize(dataEnd > addressEnd ? (dataEnd - addressEnd + 1) / 2 : 0);
+  const size_t dataSize = dataEnd > addressEnd ? (dataEnd - addressEnd + 1) / 2 : 0;
+  // Record sizes are kept in 32 bits; a line of over 8 GiB is refused.
+  if (dataSize > UINT32_MAX) {
+    Clear();
+    TavLog::Error("LoadSRecFile - FAILED on invalid record length, line %i\n", lineNumber_I);
+    return ELineResult::eFailed;
+  }
+  record_O.data.resize(dataSize);
   uint8_t* data = record_O.data.data();
   for (size_t index = addressEnd; index < dataEnd; index += 2) {
     const uint8_t byte = static_cast<uint8_t>(ParseByte(line_I, index));
@@ -270,21 +248,18 @@ CSRec::ELineResult CSRec::ReadSRecLine(std::string_view line_I, int lineNumber_I
 }
 
 bool CSRec::FinishSRecData() {
-  for (size_t block = 0; block < mSRecData.size(); ++block) {
-    std::vector<uint8_t>& data = mSRecData[block].data;
-    data.erase(data.begin(), data.begin() + static_cast<ptrdiff_t>(mFrontRoom[block]));
-  }
-  std::vector<size_t>().swap(mFrontRoom);
-  mMergeIndex.Clear();
-
+  mSRecData = mBlockBuilder.Build();
   if (mSRecData.empty()) {
     Clear();
     TavLog::Error("LoadSRecFile - FAILED on SRecData empty\n");
     return false;
   }
   // Stable, so that blocks with equal starts keep their order of appearance
-  // and a file reads the same everywhere.
-  std::stable_sort(mSRecData.begin(), mSRecData.end(), BlocksAscSorter);
+  // and a file reads the same everywhere. Files in address order, and files
+  // whose records share no byte, come sorted already.
+  if (!std::is_sorted(mSRecData.begin(), mSRecData.end(), BlocksAscSorter)) {
+    std::stable_sort(mSRecData.begin(), mSRecData.end(), BlocksAscSorter);
+  }
   for (size_t pair = 1; pair < mSRecData.size(); ++pair) {
     const SContinuousDataBlock& block = mSRecData[pair - 1];
     const uint64_t end = uint64_t{block.startAddress} + block.data.size();
@@ -298,62 +273,14 @@ bool CSRec::FinishSRecData() {
   return true;
 }
 
-// The first block, in order of appearance, that holds the record's address,
-// ends at it or starts right after the record takes the record; the index
-// names that block without a walk over all of them.
+// The record joins the first block, in order of appearance, that holds its
+// address, ends at it or starts where it ends, or is dropped when it starts
+// inside that block. Nothing reads the blocks before the file has been read,
+// so the records are resolved together then, with the same result as taking
+// them one at a time here.
 bool CSRec::AddRecordToSRecData(const SContinuousDataBlock& record_I) {
-  const uint64_t address = record_I.startAddress;
-  const uint64_t size = record_I.data.size();
-  const uint32_t taker = mMergeIndex.FirstTaker(address, size);
-  if (taker == CBlockMergeIndex::kNoBlock) {
-    mMergeIndex.BlockAdded(static_cast<uint32_t>(mSRecData.size()), address, size);
-    mSRecData.push_back(record_I);
-    mFrontRoom.push_back(0);
-    return true;
-  }
-
-  const SContinuousDataBlock& block = mSRecData[taker];
-  const uint64_t start = block.startAddress;
-  const uint64_t end = start + block.data.size() - mFrontRoom[taker];
-  // The first data for an address wins: a record that starts inside a block
-  // is dropped whole, even where it differs or runs past the block's end.
-  if (address >= start && address < end) return true;
-  if (end == address) AppendToBlock(taker, record_I);
-  if (address + size == start) PrependToBlock(taker, record_I);
+  mBlockBuilder.Add(record_I.startAddress, record_I.data.data(), record_I.data.size());
   return true;
-}
-
-void CSRec::AppendToBlock(uint32_t block_I, const SContinuousDataBlock& record_I) {
-  std::vector<uint8_t>& data = mSRecData[block_I].data;
-  const uint64_t address =
-      uint64_t{mSRecData[block_I].startAddress} + data.size() - mFrontRoom[block_I];
-  const size_t needed = data.size() + record_I.data.size();
-  // Grow by half rather than double: many small blocks then waste less.
-  if (needed > data.capacity()) data.reserve(std::max(needed, data.size() + data.size() / 2));
-  data.insert(data.end(), record_I.data.begin(), record_I.data.end());
-  mMergeIndex.BlockAppended(block_I, address, record_I.data.size());
-}
-
-void CSRec::PrependToBlock(uint32_t block_I, const SContinuousDataBlock& record_I) {
-  SContinuousDataBlock& block = mSRecData[block_I];
-  size_t& room = mFrontRoom[block_I];
-  const size_t size = record_I.data.size();
-  if (size > room) {
-    // Leave room in front in proportion to the block, so that a file in
-    // descending order moves each byte only a few times.
-    const size_t used = block.data.size() - room;
-    const size_t newRoom = size + used / 2;
-    std::vector<uint8_t> grown(newRoom + used);
-    std::copy(block.data.begin() + static_cast<ptrdiff_t>(room), block.data.end(),
-              grown.begin() + static_cast<ptrdiff_t>(newRoom));
-    block.data.swap(grown);
-    room = newRoom;
-  }
-  room -= size;
-  std::copy(record_I.data.begin(), record_I.data.end(),
-            block.data.begin() + static_cast<ptrdiff_t>(room));
-  block.startAddress = record_I.startAddress;
-  mMergeIndex.BlockPrepended(block_I, record_I.startAddress, size);
 }
 
 bool CSRec::LoadIntelHexFile(const std::string& path_I) { return mIntelHex->Load(path_I); }

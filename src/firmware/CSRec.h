@@ -9,7 +9,7 @@
 #include <vector>
 
 #include "common/TavTypes.h"
-#include "firmware/CBlockMergeIndex.h"
+#include "firmware/CSRecBlockBuilder.h"
 #include "firmware/SContinuousDataBlock.h"
 
 class CIntelHex;
@@ -43,6 +43,13 @@ class CSRec {
   std::shared_ptr<CScalarRTDISP> GetScalarRtdIspData() const { return mScalarRtdIsp; }
   std::shared_ptr<CScalarBinary> GetScalarBinaryData() const { return mScalarBinary; }
 
+  // The format a file of this path gets on this interface: the lower-cased
+  // text after the path's last dot decides, and for "bin" the interface.
+  static EDataSourceFormat FormatFor(const std::string& path_I, EINTERFACE_TYPE interfaceType_I);
+  // The lower-cased text after the last dot anywhere in the path; empty
+  // without a dot.
+  static std::string ExtensionOf(const std::string& path_I);
+
   // Two hexadecimal characters at index_I and index_I + 1 to a number. Only
   // the first character is folded to upper case, so "3a" gives 90 and not
   // 58; the result is not reduced to 8 bits and no character is refused.
@@ -59,13 +66,10 @@ class CSRec {
   bool LoadScalarBinaryFile(const std::string& path_I);
 
   bool ReadSRecLines(CTextLineReader& reader_IO);
-  void PrefetchBlock(uint32_t block_I, bool data_I) const;
   ELineResult ReadSRecLine(std::string_view line_I, int lineNumber_I,
                            SContinuousDataBlock& record_O);
   bool FinishSRecData();
   bool AddRecordToSRecData(const SContinuousDataBlock& record_I);
-  void AppendToBlock(uint32_t block_I, const SContinuousDataBlock& record_I);
-  void PrependToBlock(uint32_t block_I, const SContinuousDataBlock& record_I);
 
   std::vector<SContinuousDataBlock> mSRecData;
   std::string mUpdateFile;
@@ -75,9 +79,7 @@ class CSRec {
   std::shared_ptr<CScalarRTDISP> mScalarRtdIsp;
   std::shared_ptr<CScalarBinary> mScalarBinary;
 
-  // Only while an S-record file is read: where each block of mSRecData may
-  // take a record, and how many unused bytes lie in front of each block's
-  // data, so that records in descending order cost no move of the block.
-  CBlockMergeIndex mMergeIndex;
-  std::vector<size_t> mFrontRoom;
+  // Only while an S-record file is read: its records, merged into
+  // mSRecData when the file has been read.
+  CSRecBlockBuilder mBlockBuilder;
 };

@@ -1,9 +1,27 @@
 #include "firmware/CTextLineReader.h"
 
+#include <sys/stat.h>
+
+#include <cstdint>
 #include <cstring>
 
+namespace {
+
+// A small file needs no large buffer: a reader per load is cheap then.
+size_t BufferSizeFor(std::FILE* file_I, size_t chunkSize_I) {
+  size_t size = chunkSize_I < 1 ? 1 : chunkSize_I;
+  struct stat status;
+  if (fstat(fileno(file_I), &status) == 0 && S_ISREG(status.st_mode) &&
+      static_cast<uint64_t>(status.st_size) < size) {
+    size = static_cast<size_t>(status.st_size) + 1;
+  }
+  return size + 1;
+}
+
+}  // namespace
+
 CTextLineReader::CTextLineReader(std::FILE* file_I, size_t chunkSize_I)
-    : mFile(file_I), mBuffer(chunkSize_I < 2 ? 2 : chunkSize_I + 1) {}
+    : mFile(file_I), mBuffer(BufferSizeFor(file_I, chunkSize_I)) {}
 
 bool CTextLineReader::Next(char*& line_O, size_t& length_O) {
   for (;;) {
@@ -20,7 +38,9 @@ bool CTextLineReader::Next(char*& line_O, size_t& length_O) {
     mScanned = mEnd;
     if (!mAtEnd && Fill()) continue;
     if (mBegin == mEnd) return false;
-    // The last line has no line feed; the spare byte takes its NUL.
+    // The last line has no line feed; the spare byte takes its NUL. Fill may
+    // have moved the buffer.
+    start = mBuffer.data();
     start[mEnd] = '\0';
     line_O = start + mBegin;
     length_O = mEnd - mBegin;

@@ -23,8 +23,10 @@ Bytes NodeBytes(const CSettingsObject& object_I) {
 }
 
 Bytes WithMagic(const Bytes& node_I) {
-  Bytes out{0x02, 0x04, 'T', 'a', 'v', 'm'};
-  out.insert(out.end(), node_I.begin(), node_I.end());
+  const unsigned char magic[] = {0x02, 0x04, 'T', 'a', 'v', 'm'};
+  Bytes out(std::begin(magic), std::end(magic));
+  out.resize(sizeof magic + node_I.size());
+  std::copy(node_I.begin(), node_I.end(), out.begin() + sizeof magic);
   return out;
 }
 

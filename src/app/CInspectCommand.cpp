@@ -1,0 +1,351 @@
+#include "app/CInspectCommand.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <charconv>
+#include <cstring>
+#include <vector>
+
+#include "app/CCommandLine.h"
+#include "common/StringUtilities.h"
+#include "common/TavAssert.h"
+#include "common/TavLog.h"
+#include "firmware/CBinaryAiroFlash.h"
+#include "firmware/CIntelHex.h"
+#include "firmware/CSRec.h"
+#include "firmware/CScalarBinary.h"
+#include "firmware/CScalarRTDISP.h"
+
+namespace {
+
+struct SFormatText {
+  EDataSourceFormat format;
+  const char* name;
+  const char* description;
+};
+constexpr SFormatText kFormatTexts[] = {
+    {EDS_SREC_PEN, "EDS_SREC_PEN", "S-record, pen controller"},
+    {EDS_SREC_TOUCH, "EDS_SREC_TOUCH", "S-record, touch controller"},
+    {EDS_SREC_GENERIC, "EDS_SREC_GENERIC", "S-record"},
+    {EDS_INTEL_HEX, "EDS_INTEL_HEX", "Intel hex"},
+    {EDS_AIROFLASH, "EDS_AIROFLASH", "Bluetooth module binary"},
+    {EDS_AIROFLASH2, "EDS_AIROFLASH2", "Bluetooth module binary, second kind"},
+    {EDS_SCALAR_RTDISP, "EDS_SCALAR_RTDISP", "display scalar binary for the bridge link"},
+    {EDS_SCALAR_BINARY, "EDS_SCALAR_BINARY", "display scalar binary for HID"},
+};
+
+const SFormatText& TextOf(EDataSourceFormat format_I) {
+  static constexpr SFormatText kUnknown{EDS_UNKNOWN, "EDS_UNKNOWN", "unknown"};
+  for (const SFormatText& text : kFormatTexts) {
+    if (text.format == format_I) return text;
+  }
+  return kUnknown;
+}
+
+bool IsSRecord(EDataSourceFormat format_I) {
+  return format_I == EDS_SREC_PEN || format_I == EDS_SREC_TOUCH || format_I == EDS_SREC_GENERIC;
+}
+
+// A listing can hold a line for each of a few hundred thousand blocks: the
+// lines are built by hand into one text rather than printed one by one.
+void AppendNumber(std::string& text_IO, uint64_t value_I) {
+  char digits[24];
+  const auto end = std::to_chars(digits, digits + sizeof digits, value_I).ptr;
+  text_IO.append(digits, end);
+}
+
+void AppendHex8(std::string& text_IO, uint32_t value_I) {
+  static constexpr char kDigits[] = "0123456789ABCDEF";
+  for (int shift = 28; shift >= 0; shift -= 4) text_IO += kDigits[(value_I >> shift) & 0x0F];
+}
+
+// How many blocks ahead a walk over blocks asks for their data.
+constexpr size_t kAhead = 48;
+
+uint64_t ByteSum(const std::vector<uint8_t>& data_I) {
+  uint64_t sum = 0;
+  for (uint8_t byte : data_I) sum += byte;
+  return sum;
+}
+
+std::string JsonString(const std::string& text_I) {
+  std::string out = "\"";
+  for (unsigned char c : text_I) {
+    if (c == '"' || c == '\\') {
+      out += '\\';
+      out += static_cast<char>(c);
+    } else if (c < 0x20) {
+      char escaped[8];
+      std::snprintf(escaped, sizeof escaped, "\\u%04x", c);
+      out += escaped;
+    } else {
+      out += static_cast<char>(c);
+    }
+  }
+  return out + "\"";
+}
+
+// The reader's own words: its first error line, or, where it only raised an
+// assertion, the assertion's text.
+class CReasonListener {
+ public:
+  CReasonListener() {
+    mLogHandle = TavLog::AddOutput([this](const std::string& text_I) {
+      static const std::string kErrorTag = "[E] ";
+      if (mError.empty() && text_I.compare(0, kErrorTag.size(), kErrorTag) == 0) {
+        mError = StringUtilities::Trim_Copy(text_I.substr(kErrorTag.size()));
+      }
+    });
+    mAssertHandle = TavAssert::AddObserver([this](const std::string& line_I) {
+      static const std::string kMarker = "failed assertion: ";
+      const size_t at = line_I.find(kMarker);
+      if (mAssertion.empty() && at != std::string::npos) {
+        mAssertion = line_I.substr(at + kMarker.size());
+        if (mAssertion.size() >= 2 && mAssertion.front() == '"' && mAssertion.back() == '"') {
+          mAssertion = mAssertion.substr(1, mAssertion.size() - 2);
+        }
+      }
+    });
+  }
+  ~CReasonListener() {
+    TavLog::RemoveOutput(mLogHandle);
+    TavAssert::RemoveObserver(mAssertHandle);
+  }
+  CReasonListener(const CReasonListener&) = delete;
+  CReasonListener& operator=(const CReasonListener&) = delete;
+
+  std::string Reason() const {
+    if (!mError.empty()) return mError;
+    if (!mAssertion.empty()) return mAssertion;
+    return "the file did not load";
+  }
+
+ private:
+  int mLogHandle = 0;
+  int mAssertHandle = 0;
+  std::string mError;
+  std::string mAssertion;
+};
+
+class CImageWriter {
+ public:
+  explicit CImageWriter(const std::string& path_I)
+      : mPath(path_I), mFile(std::fopen(path_I.c_str(), "wb")) {
+    if (mFile == nullptr) Fail();
+  }
+  ~CImageWriter() {
+    if (mFile != nullptr) std::fclose(mFile);
+  }
+  CImageWriter(const CImageWriter&) = delete;
+  CImageWriter& operator=(const CImageWriter&) = delete;
+
+  void Write(const uint8_t* data_I, size_t size_I) {
+    if (mFile != nullptr && size_I > 0 && std::fwrite(data_I, 1, size_I, mFile) != size_I) Fail();
+  }
+  void Fill(uint64_t size_I) {
+    static const std::vector<uint8_t> kErased(size_t{1} << 16, 0xFF);
+    while (size_I > 0 && mFile != nullptr) {
+      const size_t now = static_cast<size_t>(std::min<uint64_t>(size_I, kErased.size()));
+      Write(kErased.data(), now);
+      size_I -= now;
+    }
+  }
+  bool Close(std::string& reason_O) {
+    if (mFile != nullptr && std::fclose(mFile) != 0) Fail();
+    mFile = nullptr;
+    if (!mFailed) return true;
+    reason_O = "cannot write " + mPath + ": " + std::strerror(mError);
+    return false;
+  }
+
+ private:
+  void Fail() {
+    if (!mFailed) mError = errno;
+    mFailed = true;
+  }
+
+  std::string mPath;
+  std::FILE* mFile;
+  bool mFailed = false;
+  int mError = 0;
+};
+
+}  // namespace
+
+CInspectCommand::CInspectCommand(const CCommandLine& commandLine_I)
+    : mFile(commandLine_I.GetInspectFile()),
+      mInterfaceName(commandLine_I.GetInspectInterface()),
+      mJson(commandLine_I.GetInspectJson()),
+      mOutputBinary(commandLine_I.GetInspectOutputBinary()) {}
+
+bool CInspectCommand::ParseInterface(const std::string& name_I, EINTERFACE_TYPE& interface_O) {
+  const std::string name = StringUtilities::ToLower_Copy(name_I);
+  if (name == "hid")
+    interface_O = EHID_INTERFACE;
+  else if (name == "bulk")
+    interface_O = EBULK_INTERFACE;
+  else if (name == "i2c")
+    interface_O = EI2C_INTERFACE;
+  else if (name == "ftdi")
+    interface_O = EFTDI_INTERFACE;
+  else
+    return false;
+  return true;
+}
+
+int CInspectCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
+  if (!mInterfaceName.empty() && !ParseInterface(mInterfaceName, mInterface)) {
+    std::fprintf(err_IO, "unknown interface %s: use hid, bulk, i2c or ftdi\n",
+                 mInterfaceName.c_str());
+    return 1;
+  }
+  CSRec source;
+  std::string reason;
+  if (!Load(source, reason)) {
+    std::fprintf(err_IO, "%s\n", reason.c_str());
+    return 1;
+  }
+  if (mJson) {
+    PrintJson(source, out_IO);
+  } else {
+    PrintText(source, out_IO);
+  }
+  if (!mOutputBinary.empty() && !WriteImage(source, reason)) {
+    std::fprintf(err_IO, "%s\n", reason.c_str());
+    return 1;
+  }
+  return 0;
+}
+
+// A listener makes the log format every line, and an S-record file logs each
+// of its lines: a file is loaded unobserved, and only a failed load is read
+// once more with a listener to learn why. A file of no known format is not
+// read at all, so it is observed at once, and its assertion is raised once.
+bool CInspectCommand::Load(CSRec& source_IO, std::string& reason_O) const {
+  if (CSRec::FormatFor(mFile, mInterface) != EDS_UNKNOWN && source_IO.Load(mFile, mInterface)) {
+    return true;
+  }
+  CReasonListener listener;
+  if (source_IO.Load(mFile, mInterface)) return true;  // the file changed in between
+  reason_O = listener.Reason();
+  return false;
+}
+
+void CInspectCommand::PrintText(const CSRec& source_I, std::FILE* out_IO) const {
+  const EDataSourceFormat format = source_I.GetDataSourceFormat();
+  std::fprintf(out_IO, "File: %s\n", mFile.c_str());
+  std::fprintf(out_IO, "Format: %s (%s)\n", TextOf(format).name, TextOf(format).description);
+  if (IsSRecord(format)) {
+    const std::vector<SContinuousDataBlock>& blocks = source_I.GetSRecDataRef();
+    uint64_t total = 0;
+    std::string text = "Blocks: ";
+    text.reserve(blocks.size() * 48 + 64);
+    AppendNumber(text, blocks.size());
+    text += '\n';
+    for (size_t i = 0; i < blocks.size(); ++i) {
+      const SContinuousDataBlock& block = blocks[i];
+      // Small blocks lie all over the heap; ask for one well ahead.
+      if (i + kAhead < blocks.size()) __builtin_prefetch(blocks[i + kAhead].data.data());
+      text += "  start 0x";
+      AppendHex8(text, block.startAddress);
+      text += "  size ";
+      AppendNumber(text, block.data.size());
+      text += "  sum ";
+      AppendNumber(text, ByteSum(block.data));
+      text += '\n';
+      total += block.data.size();
+    }
+    text += "Bytes: ";
+    AppendNumber(text, total);
+    text += '\n';
+    std::fwrite(text.data(), 1, text.size(), out_IO);
+  } else if (format == EDS_INTEL_HEX) {
+    const CIntelHex& hex = *source_I.GetIntelHexData();
+    std::fprintf(out_IO, "Start address: 0x%08X\nSize: %u\nChecksum: 0x%04X\n", hex.StartAddress(),
+                 hex.Size(), hex.Checksum());
+  } else if (format == EDS_AIROFLASH || format == EDS_AIROFLASH2) {
+    std::fprintf(out_IO, "Size: %u\n", source_I.GetBinaryAiroFlashData()->Size());
+  } else if (format == EDS_SCALAR_RTDISP) {
+    std::fprintf(out_IO, "Size: %u\n", source_I.GetScalarRtdIspData()->Size());
+  } else if (format == EDS_SCALAR_BINARY) {
+    const CScalarBinary& binary = *source_I.GetScalarBinaryData();
+    std::fprintf(out_IO, "Size: %u\nBlocks: %lu\n", binary.Size(), binary.NumBlocks());
+  }
+}
+
+void CInspectCommand::PrintJson(const CSRec& source_I, std::FILE* out_IO) const {
+  const EDataSourceFormat format = source_I.GetDataSourceFormat();
+  std::string json = "{\"file\":" + JsonString(mFile) + ",\"format\":\"" + TextOf(format).name +
+                     "\",\"formatValue\":" + std::to_string(format) +
+                     ",\"description\":" + JsonString(TextOf(format).description);
+  if (IsSRecord(format)) {
+    uint64_t total = 0;
+    json += ",\"blocks\":[";
+    bool first = true;
+    for (const SContinuousDataBlock& block : source_I.GetSRecDataRef()) {
+      json += first ? "{\"start\":" : ",{\"start\":";
+      AppendNumber(json, block.startAddress);
+      json += ",\"size\":";
+      AppendNumber(json, block.data.size());
+      json += ",\"sum\":";
+      AppendNumber(json, ByteSum(block.data));
+      json += '}';
+      total += block.data.size();
+      first = false;
+    }
+    json += "],\"size\":" + std::to_string(total);
+  } else if (format == EDS_INTEL_HEX) {
+    const CIntelHex& hex = *source_I.GetIntelHexData();
+    json += ",\"startAddress\":" + std::to_string(hex.StartAddress()) +
+            ",\"size\":" + std::to_string(hex.Size()) +
+            ",\"checksum\":" + std::to_string(hex.Checksum());
+  } else if (format == EDS_AIROFLASH || format == EDS_AIROFLASH2) {
+    json += ",\"size\":" + std::to_string(source_I.GetBinaryAiroFlashData()->Size());
+  } else if (format == EDS_SCALAR_RTDISP) {
+    json += ",\"size\":" + std::to_string(source_I.GetScalarRtdIspData()->Size());
+  } else if (format == EDS_SCALAR_BINARY) {
+    const CScalarBinary& binary = *source_I.GetScalarBinaryData();
+    json += ",\"size\":" + std::to_string(binary.Size()) +
+            ",\"blockCount\":" + std::to_string(binary.NumBlocks());
+  }
+  json += "}\n";
+  std::fputs(json.c_str(), out_IO);
+}
+
+// S-record blocks are laid out from the lowest start with gaps erased to
+// 0xFF; the other formats are written as their reader holds them.
+bool CInspectCommand::WriteImage(const CSRec& source_I, std::string& reason_O) const {
+  CImageWriter writer(mOutputBinary);
+  const EDataSourceFormat format = source_I.GetDataSourceFormat();
+  if (IsSRecord(format)) {
+    const std::vector<SContinuousDataBlock>& blocks = source_I.GetSRecDataRef();
+    uint64_t next = blocks.empty() ? 0 : blocks.front().startAddress;
+    for (size_t i = 0; i < blocks.size(); ++i) {
+      const SContinuousDataBlock& block = blocks[i];
+      if (i + kAhead < blocks.size()) __builtin_prefetch(blocks[i + kAhead].data.data());
+      if (block.startAddress > next) writer.Fill(block.startAddress - next);
+      writer.Write(block.data.data(), block.data.size());
+      next = uint64_t{block.startAddress} + block.data.size();
+    }
+  } else if (format == EDS_INTEL_HEX) {
+    const CIntelHex& hex = *source_I.GetIntelHexData();
+    writer.Write(hex.GetData(), hex.Size());
+  } else if (format == EDS_AIROFLASH || format == EDS_AIROFLASH2) {
+    const CBinaryAiroFlash& binary = *source_I.GetBinaryAiroFlashData();
+    writer.Write(binary.GetData(), binary.Size());
+  } else if (format == EDS_SCALAR_RTDISP) {
+    const std::vector<uint8_t> image = source_I.GetScalarRtdIspData()->GetData();
+    writer.Write(image.data(), image.size());
+  } else if (format == EDS_SCALAR_BINARY) {
+    // The blocks hold the image; the last one is padded past the size.
+    const CScalarBinary& binary = *source_I.GetScalarBinaryData();
+    uint64_t left = binary.Size();
+    for (unsigned long i = 0; i < binary.NumBlocks() && left > 0; ++i) {
+      const size_t now =
+          static_cast<size_t>(std::min<uint64_t>(left, CScalarBinary::kBlockDataSize));
+      writer.Write(binary.BlockPtr(i)->data, now);
+      left -= now;
+    }
+  }
+  return writer.Close(reason_O);
+}

@@ -1,0 +1,134 @@
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "firmware/CBinaryAiroFlash.h"
+#include "firmware/CScalarBinary.h"
+#include "firmware/CScalarRTDISP.h"
+#include "firmware/FirmwareFiles.h"
+#include "support/LogCapture.h"
+
+TEST(BinaryAiroFlash, HoldsTheWholeFileFromStartAddressZero) {
+  CTempFolder folder;
+  CBinaryAiroFlash image;
+  EXPECT_FALSE(image.IsLoaded());
+  EXPECT_EQ(image.StartAddress(), CBinaryAiroFlash::kNotLoaded);
+
+  LogCapture capture;
+  ASSERT_TRUE(image.Load(folder.Write("bt.airoflash", Bytes(40))));
+  EXPECT_TRUE(image.IsLoaded());
+  EXPECT_EQ(image.StartAddress(), 0u);
+  EXPECT_EQ(image.Size(), 40u);
+  EXPECT_EQ(std::vector<uint8_t>(image.GetData(), image.GetData() + 40), Bytes(40));
+  // The dump: a header, 32 bytes a line, a last short line, an empty line.
+  const std::vector<std::string> log = capture.Log();
+  const std::vector<std::string> dump(log.end() - 5, log.end());
+  EXPECT_EQ(dump[0], "[I] CBinaryAiroFlash flash data:\n");
+  EXPECT_EQ(dump[1].substr(0, 13), "[I] 00 01 02 ");
+  EXPECT_EQ(dump[1].size(), 4 + 32 * 3 + 1);
+  EXPECT_EQ(dump[2], "[I] 20 21 22 23 24 25 26 27 \n");
+  EXPECT_EQ(dump[3], "[I] \n");
+  EXPECT_EQ(dump[4], "[I] CBinaryAiroFlash::Load: done!\n");
+
+  // An empty file is refused; the image and its marker stay.
+  EXPECT_FALSE(image.Load(folder.Write("empty.airoflash", "")));
+  EXPECT_TRUE(capture.LogContains("[E] CBinaryAiroFlash::Load: ERROR - empty file: "));
+  EXPECT_TRUE(image.IsLoaded());
+  EXPECT_EQ(image.GetData()[1], 1);
+  EXPECT_FALSE(image.Load(folder.Path("missing.airoflash")));
+  EXPECT_TRUE(capture.LogContains("[E] CBinaryAiroFlash::Load: ERROR - couldn't open file: "));
+
+  image.ClearData();
+  EXPECT_FALSE(image.IsLoaded());
+  EXPECT_EQ(image.GetData(), nullptr);
+
+  CBinaryAiroFlash fresh;
+  EXPECT_FALSE(fresh.Load(folder.Write("empty2.airoflash", "")));
+  EXPECT_EQ(fresh.StartAddress(), CBinaryAiroFlash::kNotLoaded);
+}
+
+TEST(ScalarRTDISP, CountsAsLoadedWhileImageAndSizeAgree) {
+  CTempFolder folder;
+  CScalarRTDISP image;
+  // Nothing loaded and nothing expected: 0 equals 0.
+  EXPECT_TRUE(image.IsLoaded());
+  EXPECT_EQ(image.Size(), 0u);
+
+  LogCapture capture;
+  ASSERT_TRUE(image.Load(folder.Write("s.bin", Bytes(300, 7))));
+  EXPECT_TRUE(image.IsLoaded());
+  EXPECT_EQ(image.GetData(), Bytes(300, 7));
+  EXPECT_TRUE(capture.LogContains("[I] CScalarRTDISP flash data:\n"));
+  EXPECT_TRUE(capture.LogContains("[I] CScalarRTDISP::Load: done!\n"));
+
+  // The size of a refused file is taken before the refusal.
+  EXPECT_FALSE(image.Load(folder.Write("e.bin", "")));
+  EXPECT_TRUE(capture.LogContains("[E] CScalarRTDISP::Load: ERROR - empty file: "));
+  EXPECT_EQ(image.Size(), 0u);
+  EXPECT_FALSE(image.IsLoaded());
+
+  image.ClearData();
+  EXPECT_TRUE(image.GetData().empty());
+}
+
+TEST(ScalarBinary, CutsTheImageIntoCheckedBlocks) {
+  const uint8_t check[] = {'1', '2', '3', '4', '5', '6', '7', '8', '9'};
+  EXPECT_EQ(CScalarBinary::CRC8_ATM(check, 9, 0), 0xF4);
+  EXPECT_EQ(CScalarBinary::CRC8_ATM(check, 0, 0x5A), 0);
+  EXPECT_EQ(CScalarBinary::CRC8_ATM(check, -1, 0x5A), 0);
+
+  CTempFolder folder;
+  CScalarBinary image;
+  EXPECT_FALSE(image.IsLoaded());
+  ASSERT_TRUE(image.Load(folder.Write("one.bin", std::vector<uint8_t>{0x42})));
+  ASSERT_EQ(image.NumBlocks(), 1u);
+  const BLOCKDATA_SCALAR* block = image.BlockPtr(0);
+  ASSERT_NE(block, nullptr);
+  EXPECT_EQ(block->offset[0] | block->offset[1] | block->offset[2], 0);
+  EXPECT_EQ(block->data[0], 0x42);
+  EXPECT_EQ(block->data[1], 0xFF);
+  EXPECT_EQ(block->data[255], 0xFF);
+  EXPECT_EQ(block->crc, CScalarBinary::CRC8_ATM(block->data, 256, 0));
+  EXPECT_EQ(image.BlockPtr(1), nullptr);
+  EXPECT_EQ(image.Size(), 1u);
+
+  ASSERT_TRUE(image.Load(folder.Write("full.bin", Bytes(256))));
+  EXPECT_EQ(image.NumBlocks(), 1u);
+  ASSERT_TRUE(image.Load(folder.Write("more.bin", Bytes(257))));
+  ASSERT_EQ(image.NumBlocks(), 2u);
+  const uint8_t* second = reinterpret_cast<const uint8_t*>(image.BlockPtr(1));
+  EXPECT_EQ(std::vector<uint8_t>(second, second + 5),
+            (std::vector<uint8_t>{0x00, 0x01, 0x00, image.BlockPtr(1)->crc, 0x00}));
+
+  // Offsets have 24 bits: past 16 MiB they start again.
+  std::vector<uint8_t> large(size_t{16} << 20 | 1, 0);
+  ASSERT_TRUE(image.Prepare(large));
+  ASSERT_EQ(image.NumBlocks(), 65537u);
+  EXPECT_EQ(image.BlockPtr(65536)->offset[0] | image.BlockPtr(65536)->offset[1] |
+                image.BlockPtr(65536)->offset[2],
+            0);
+
+  EXPECT_FALSE(image.Prepare({}));
+  EXPECT_EQ(image.NumBlocks(), 0u);
+}
+
+TEST(ScalarBinary, RefusesAnEmptyFileWithItsBufferAssertion) {
+  CTempFolder folder;
+  CScalarBinary image;
+  ASSERT_TRUE(image.Load(folder.Write("a.bin", Bytes(10))));
+  LogCapture capture;
+  EXPECT_FALSE(image.Load(folder.Write("empty.bin", "")));
+  EXPECT_TRUE(
+      capture.AssertionContains("failed assertion: \"CScalarBinary::Load - ERROR - could not alloc "
+                                "data buf\""));
+  // The blocks of the earlier file stay; the size is the new file's.
+  EXPECT_TRUE(image.IsLoaded());
+  EXPECT_EQ(image.Size(), 0u);
+  EXPECT_FALSE(image.Load(folder.Path("missing.bin")));
+  EXPECT_TRUE(capture.LogContains("[E] CScalarBinary::Load: ERROR - couldn't open file: "));
+
+  image.Clear();
+  EXPECT_FALSE(image.IsLoaded());
+  EXPECT_EQ(image.NumBlocks(), 0u);
+}

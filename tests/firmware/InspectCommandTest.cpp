@@ -1,0 +1,164 @@
+#include <gtest/gtest.h>
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <cstdio>
+#include <string>
+#include <vector>
+
+#include "app/CCommandLine.h"
+#include "app/CInspectCommand.h"
+#include "firmware/FirmwareFiles.h"
+
+namespace {
+
+struct SRun {
+  int status = -1;
+  std::string out;
+  std::string err;
+};
+
+std::string Drain(std::FILE* file_I) {
+  std::string text;
+  std::rewind(file_I);
+  for (int c; (c = std::fgetc(file_I)) != EOF;) text += static_cast<char>(c);
+  std::fclose(file_I);
+  return text;
+}
+
+SRun Inspect(const std::vector<std::string>& arguments_I) {
+  CCommandLine commandLine;
+  EXPECT_TRUE(commandLine.Parse(arguments_I)) << commandLine.GetError();
+  std::FILE* out = std::tmpfile();
+  std::FILE* err = std::tmpfile();
+  SRun run;
+  run.status = CInspectCommand(commandLine).Run(out, err);
+  run.out = Drain(out);
+  run.err = Drain(err);
+  return run;
+}
+
+const std::string kEnd = HexRecord(1, 0, {});
+
+}  // namespace
+
+TEST(InspectCommand, ShowsWhatEachFormatHolds) {
+  CTempFolder folder;
+  const std::string pen = folder.Write(
+      "fw.pen", SRecLine('1', 0x120, {1, 2, 3, 4}) + "\n" + SRecLine('1', 0x100, Bytes(16)) + "\n");
+  SRun run = Inspect({"--inspect", pen});
+  EXPECT_EQ(run.status, 0);
+  EXPECT_EQ(run.err, "");
+  EXPECT_EQ(run.out, "File: " + pen +
+                         "\nFormat: EDS_SREC_PEN (S-record, pen controller)\nBlocks: 2\n"
+                         "  start 0x00000100  size 16  sum 120\n"
+                         "  start 0x00000120  size 4  sum 10\nBytes: 20\n");
+  run = Inspect({"--inspect", pen, "--json"});
+  EXPECT_EQ(run.out, "{\"file\":\"" + pen +
+                         "\",\"format\":\"EDS_SREC_PEN\",\"formatValue\":0,"
+                         "\"description\":\"S-record, pen controller\",\"blocks\":["
+                         "{\"start\":256,\"size\":16,\"sum\":120},"
+                         "{\"start\":288,\"size\":4,\"sum\":10}],\"size\":20}\n");
+
+  const std::string hex =
+      folder.Write("t.hex", HexRecord(0, 0x8000, {0x01, 0x02}) + "\r\n" + kEnd + "\r\n");
+  run = Inspect({"--inspect", hex});
+  EXPECT_NE(run.out.find("Format: EDS_INTEL_HEX (Intel hex)\n"), std::string::npos);
+  // Two bytes and 510 erased bytes, each erased one counting minus one.
+  EXPECT_NE(run.out.find("Start address: 0x00008000\nSize: 512\nChecksum: 0xFE05\n"),
+            std::string::npos)
+      << run.out;
+  run = Inspect({"--inspect", hex, "--json"});
+  EXPECT_NE(run.out.find("\"startAddress\":32768,\"size\":512,\"checksum\":65029}"),
+            std::string::npos);
+
+  const std::string bin = folder.Write("s.bin", Bytes(300));
+  run = Inspect({"--inspect", bin});
+  EXPECT_NE(run.out.find("EDS_SCALAR_BINARY"), std::string::npos);
+  EXPECT_NE(run.out.find("Size: 300\nBlocks: 2\n"), std::string::npos);
+  run = Inspect({"--inspect", bin, "--interface", "FTDI", "--json"});
+  EXPECT_NE(run.out.find("\"format\":\"EDS_SCALAR_RTDISP\",\"formatValue\":5"), std::string::npos);
+  run = Inspect({"--inspect", folder.Write("b.airoflash2", Bytes(3)), "--json"});
+  EXPECT_NE(run.out.find("\"formatValue\":7,\"description\":\"Bluetooth module binary, second "
+                         "kind\",\"size\":3}"),
+            std::string::npos);
+}
+
+TEST(InspectCommand, WritesTheLoadedImageAsFlatBytes) {
+  CTempFolder folder;
+  const std::string image = folder.Path("image.out");
+  const std::string pen = folder.Write(
+      "fw.pen", SRecLine('1', 0x120, {1, 2, 3, 4}) + "\n" + SRecLine('1', 0x100, Bytes(16)) + "\n");
+  ASSERT_EQ(Inspect({"--inspect", pen, "--output-binary", image}).status, 0);
+  std::vector<uint8_t> expected = Bytes(16);
+  expected.resize(32, 0xFF);
+  expected.insert(expected.end(), {1, 2, 3, 4});
+  EXPECT_EQ(CTempFolder::Read(image), std::string(expected.begin(), expected.end()));
+
+  const std::string hex =
+      folder.Write("t.hex", HexRecord(0, 0x8000, {0x01, 0x02}) + "\r\n" + kEnd + "\r\n");
+  ASSERT_EQ(Inspect({"--inspect", hex, "--output-binary", image}).status, 0);
+  expected.assign(512, 0xFF);
+  expected[0] = 1;
+  expected[1] = 2;
+  EXPECT_EQ(CTempFolder::Read(image), std::string(expected.begin(), expected.end()));
+
+  for (const std::vector<std::string>& kind :
+       {std::vector<std::string>{"s.bin"}, {"s.bin", "--interface", "ftdi"}, {"b.airoflash"}}) {
+    const std::string input = folder.Write(kind[0], Bytes(300, 5));
+    std::vector<std::string> arguments{"--inspect", input, "--output-binary", image};
+    arguments.insert(arguments.end(), kind.begin() + 1, kind.end());
+    ASSERT_EQ(Inspect(arguments).status, 0);
+    EXPECT_EQ(CTempFolder::Read(image), CTempFolder::Read(input)) << kind[0];
+  }
+
+  EXPECT_EQ(Inspect({"--inspect", pen, "--output-binary", folder.Path("no/such/dir")}).status, 1);
+}
+
+TEST(InspectCommand, RefusesAFileThatDoesNotLoadInTheReadersWords) {
+  CTempFolder folder;
+  const std::string image = folder.Path("image.out");
+  SRun run = Inspect({"--inspect", folder.Write("bad.pen", "S1050000010200\n"), "--output-binary",
+                      image, "--json"});
+  EXPECT_EQ(run.status, 1);
+  EXPECT_EQ(run.err, "LoadSRecFile - FAILED on invalid CRC, line 1\n");
+  EXPECT_EQ(run.out, "");
+  EXPECT_NE(access(image.c_str(), F_OK), 0);
+
+  const std::string text = folder.Write("notes.txt", "hello");
+  run = Inspect({"--inspect", text});
+  EXPECT_EQ(run.status, 1);
+  EXPECT_EQ(run.err, "unrecognized file format for file: " + text + "\n");
+
+  run = Inspect({"--inspect", folder.Write("empty.bin", "")});
+  EXPECT_EQ(run.status, 1);
+  EXPECT_EQ(run.err, "CScalarBinary::Load - ERROR - could not alloc data buf\n");
+
+  run = Inspect({"--inspect", folder.Write("x.hex", HexRecord(0, 0x9000, {1}) + "\r\n")});
+  EXPECT_EQ(run.err, "CIntelHex::Load: ERROR - start_address exceeds 32768\n");
+
+  run = Inspect({"--inspect", text, "--interface", "usb"});
+  EXPECT_EQ(run.status, 1);
+  EXPECT_EQ(run.err, "unknown interface usb: use hid, bulk, i2c or ftdi\n");
+
+  CCommandLine commandLine;
+  EXPECT_FALSE(commandLine.Parse({"--json"}));
+  EXPECT_FALSE(commandLine.Parse({"--inspect"}));
+}
+
+TEST(InspectCommand, ExitsWithTheStatusFromTheCommandLine) {
+  CTempFolder folder;
+  const std::string good = folder.Write("fw.tav", SRecLine('3', 0, Bytes(8)) + "\n");
+  const std::string bad = folder.Write("fw.touch", "\n\nS9\n");
+  const auto status = [&](const std::string& file_I, const std::string& errorFile_I) {
+    const std::string command =
+        std::string(TAV_FWUPDATER_BINARY) + " --inspect " + file_I + " >/dev/null 2>" + errorFile_I;
+    const int raw = std::system(command.c_str());
+    return WIFEXITED(raw) ? WEXITSTATUS(raw) : -1;
+  };
+  EXPECT_EQ(status(good, folder.Path("good.err")), 0);
+  EXPECT_EQ(CTempFolder::Read(folder.Path("good.err")), "");
+  EXPECT_EQ(status(bad, folder.Path("bad.err")), 1);
+  EXPECT_EQ(CTempFolder::Read(folder.Path("bad.err")),
+            "LoadSRecFile - FAILED on invalid record length, line 3\n");
+}

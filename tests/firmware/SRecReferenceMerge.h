@@ -1,0 +1,62 @@
+#pragma once
+// The S-record merge written the plain way, as a yardstick: every record
+// walks all blocks in their order, then the blocks are sorted and checked
+// for overlap. Slow, short and obviously the rule.
+
+#include <algorithm>
+#include <cstdint>
+#include <vector>
+
+#include "firmware/SContinuousDataBlock.h"
+
+struct SReferenceMergeResult {
+  std::vector<SContinuousDataBlock> blocks;  // empty when the load fails
+  int overlapPair = 0;                       // 1-based pair number, 0 without overlap
+};
+
+inline SReferenceMergeResult ReferenceMerge(const std::vector<SContinuousDataBlock>& records_I) {
+  std::vector<SContinuousDataBlock> blocks;
+  for (const SContinuousDataBlock& record : records_I) {
+    const uint64_t a = record.startAddress;
+    const uint64_t n = record.data.size();
+    bool taken = false;
+    for (SContinuousDataBlock& block : blocks) {
+      const uint64_t b = block.startAddress;
+      const uint64_t m = block.data.size();
+      if (a >= b && a < b + m) {
+        taken = true;
+        break;
+      }
+      bool merged = false;
+      if (b + m == a) {
+        block.data.insert(block.data.end(), record.data.begin(), record.data.end());
+        merged = true;
+      }
+      if (a + n == b) {
+        block.data.insert(block.data.begin(), record.data.begin(), record.data.end());
+        block.startAddress = record.startAddress;
+        merged = true;
+      }
+      if (merged) {
+        taken = true;
+        break;
+      }
+    }
+    if (!taken) blocks.push_back(record);
+  }
+
+  SReferenceMergeResult result;
+  std::stable_sort(blocks.begin(), blocks.end(),
+                   [](const SContinuousDataBlock& x_I, const SContinuousDataBlock& y_I) {
+                     return x_I.startAddress < y_I.startAddress;
+                   });
+  for (size_t pair = 1; pair < blocks.size(); ++pair) {
+    if (uint64_t{blocks[pair - 1].startAddress} + blocks[pair - 1].data.size() >
+        blocks[pair].startAddress) {
+      result.overlapPair = static_cast<int>(pair);
+      return result;
+    }
+  }
+  result.blocks = std::move(blocks);
+  return result;
+}
