@@ -29,6 +29,15 @@ bool CCommandLine::Parse(const std::vector<std::string>& arguments_I) {
       value = arguments_I[++i];
     } else if (argument == "--json") {
       mInspectJson = true;
+    } else if (argument == "--list") {
+      mList = true;
+    } else if (argument == "--lab") {
+      mLab = true;
+      // The product name is optional: what follows is taken unless it is an option.
+      if (i + 1 < arguments_I.size() && !arguments_I[i + 1].empty() &&
+          arguments_I[i + 1][0] != '-') {
+        mLabName = arguments_I[++i];
+      }
     } else if (argument.rfind("--", 0) == 0) {
       mError = "unknown option " + argument;
       return false;
@@ -36,9 +45,16 @@ bool CCommandLine::Parse(const std::vector<std::string>& arguments_I) {
       mUpdaterArguments.push_back(argument);
     }
   }
-  if (mInspectFile.empty() &&
-      (mInspectJson || !mInspectInterface.empty() || !mInspectOutputBinary.empty())) {
-    mError = "--interface, --json and --output-binary go with --inspect";
+  if (mInspectFile.empty() && (!mInspectInterface.empty() || !mInspectOutputBinary.empty())) {
+    mError = "--interface and --output-binary go with --inspect";
+    return false;
+  }
+  if (mInspectJson && mInspectFile.empty() && !mList) {
+    mError = "--json goes with --inspect or --list";
+    return false;
+  }
+  if (mList && !mInspectFile.empty()) {
+    mError = "--list and --inspect do not go together";
     return false;
   }
   return true;
@@ -67,5 +83,12 @@ std::string CCommandLine::HelpText() {
          "      --inspect FILE        load FILE as an update would and show its content\n"
          "      --interface NAME      hid (default), bulk, i2c or ftdi; decides how .bin is read\n"
          "      --json                show the content as one JSON object\n"
-         "      --output-binary PATH  write the loaded image to PATH as flat bytes\n";
+         "      --output-binary PATH  write the loaded image to PATH as flat bytes\n"
+         "\n"
+         "Finding devices, without updating them:\n"
+         "      --list                show each tablet or pen display found and its boards\n"
+         "      --lab [NAME]          use the built-in emulated products instead of USB;\n"
+         "                            NAME picks one (default wireless-tablet), \"list\" names\n"
+         "                            them all\n"
+         "      --json                with --list, show the result as one JSON object\n";
 }

@@ -20,6 +20,12 @@ class CCommandLine {
   const std::string& GetInspectInterface() const { return mInspectInterface; }
   bool GetInspectJson() const { return mInspectJson; }
   const std::string& GetInspectOutputBinary() const { return mInspectOutputBinary; }
+  // --list [--lab [NAME]] [--json] [-f CONFIG]
+  bool GetList() const { return mList; }
+  // --lab runs on the lab's emulated products instead of the hardware.
+  bool GetLab() const { return mLab; }
+  // The product after --lab; empty for the default one.
+  const std::string& GetLabName() const { return mLabName; }
   // What is left for the updater, in order.
   const std::vector<std::string>& GetUpdaterArguments() const { return mUpdaterArguments; }
 
@@ -35,5 +41,8 @@ class CCommandLine {
   std::string mInspectInterface;
   bool mInspectJson = false;
   std::string mInspectOutputBinary;
+  bool mList = false;
+  bool mLab = false;
+  std::string mLabName;
   std::vector<std::string> mUpdaterArguments;
 };

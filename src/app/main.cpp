@@ -4,6 +4,7 @@
 
 #include "app/CCommandLine.h"
 #include "app/CInspectCommand.h"
+#include "app/CListCommand.h"
 #include "app/CLogOutputs.h"
 #include "app/TavVersion.h"
 #include "common/TavLog.h"
@@ -31,7 +32,9 @@ int main(int argc, char** argv) {
                  commandLine.GetLogFile().c_str());
     return 1;
   }
-  if (!commandLine.GetInspectFile().empty()) return CInspectCommand(commandLine).Run(stdout, stderr);
+  if (!commandLine.GetInspectFile().empty())
+    return CInspectCommand(commandLine).Run(stdout, stderr);
+  if (commandLine.GetList()) return CListCommand(commandLine).Run(stdout, stderr);
   TavLog::Info("%s %s starting\n", TAV_PROGRAM_NAME, TAV_PROGRAM_VERSION);
 
   std::fputs("No update can run yet: the updater is not built in this version.\n", stderr);

@@ -1,22 +1,25 @@
 #pragma once
 // Builds the list of attached products from the interfaces the device
-// registry reports, and searches it.
+// registry reports, and searches it. The base reads the configuration and
+// keeps the list; a platform form fills the list from what is attached.
 
 #include <memory>
 #include <string>
 
 #include "devices/CDeviceList.h"
+#include "devices/CSupportedDeviceInfo.h"
 
 class CDiscovery {
  public:
   CDiscovery() = default;
   virtual ~CDiscovery() = default;
 
-  void SetConfig(const std::string& path_I) { mConfigPath = path_I; }
-  std::string GetConfig() const { return mConfigPath; }
+  void SetConfig(const std::string& path_I) { mSupportedDeviceInfo.SetConfigPath(path_I); }
+  std::string GetConfig() const { return mSupportedDeviceInfo.GetConfigPath(); }
 
-  // Rebuilds the list from what is attached.
-  virtual bool GenerateDeviceList() = 0;
+  // Reads the configuration unless an earlier read gave products, and empties
+  // the list. Always true.
+  virtual bool GenerateDeviceList();
 
   CDeviceList GetDeviceList() const { return mDeviceList; }
   std::shared_ptr<CDevice> GetBestDevice() const { return mDeviceList.GetBestDevice(); }
@@ -27,7 +30,9 @@ class CDiscovery {
     return mDeviceList.GetDevice(path_I);
   }
 
+  const CSupportedDeviceInfo& GetSupportedDeviceInfo() const { return mSupportedDeviceInfo; }
+
  protected:
-  std::string mConfigPath;
+  CSupportedDeviceInfo mSupportedDeviceInfo;
   CDeviceList mDeviceList;
 };

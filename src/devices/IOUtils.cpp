@@ -1,5 +1,6 @@
 #include "devices/IOUtils.h"
 
+#include <algorithm>
 #include <sstream>
 
 namespace {
@@ -84,6 +85,60 @@ std::vector<DeviceInfo> FindMatchedDevices(CDeviceRegistry& registry_I,
     if (CompareDeviceInfo(entry.info, criterion_I, mask_I | kVendorId)) found.push_back(entry.info);
   }
   return found;
+}
+
+uint32_t CriterionMask(const DeviceInfo& criterion_I) {
+  uint32_t mask = kVendorId;
+  if (criterion_I.productId != 0) mask |= kProductId;
+  if (criterion_I.locationId != 0) mask |= kLocationId;
+  if (criterion_I.usage != 0) mask |= kUsage;
+  if (criterion_I.usagePage != 0) mask |= kUsagePage;
+  return mask;
+}
+
+std::vector<DeviceInfo> FindMatchedDevicesMultiple(CDeviceRegistry& registry_I,
+                                                   const std::vector<DeviceInfo>& criteria_I) {
+  std::vector<DeviceInfo> found;
+  for (const DeviceInfo& criterion : criteria_I) {
+    for (const DeviceInfo& info :
+         FindMatchedDevices(registry_I, criterion, CriterionMask(criterion))) {
+      if (std::find(found.begin(), found.end(), info) == found.end()) found.push_back(info);
+    }
+  }
+  return found;
+}
+
+std::vector<DeviceInfo> FindUsbDevices(CDeviceRegistry& registry_I, uint32_t vendorId_I) {
+  std::vector<DeviceInfo> found;
+  for (const SUsbEntry& entry : registry_I.ListUsbDevices(vendorId_I)) {
+    found.push_back(DeviceInfo{entry.vendorId, entry.productId, entry.locationId, 0, 0});
+  }
+  return found;
+}
+
+uint32_t AncestorLocationId(uint32_t locationId_I, unsigned levels_I) {
+  // The deepest port is the lowest nibble that is not 0.
+  uint32_t location = locationId_I;
+  for (unsigned level = 0; level < levels_I; ++level) {
+    bool climbed = false;
+    for (int shift = 0; shift <= 20; shift += 4) {
+      const uint32_t nibble = 0xFu << shift;
+      if (location & nibble) {
+        location &= ~nibble;
+        climbed = true;
+        break;
+      }
+    }
+    if (!climbed) break;
+  }
+  return location;
+}
+
+std::string BasePathFromInfo(const DeviceInfo& info_I, uint8_t topology_I) {
+  // Without a location nothing can be told about the interface's product.
+  if (info_I.locationId == 0) return std::string();
+  const unsigned levels = topology_I == 0 ? 0u : topology_I - 1u;
+  return std::to_string(AncestorLocationId(info_I.locationId, levels));
 }
 
 }  // namespace IOUtils

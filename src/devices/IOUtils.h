@@ -40,4 +40,25 @@ bool IsAcceptedEntry(const SHidEntry& entry_I);
 std::vector<DeviceInfo> FindMatchedDevices(CDeviceRegistry& registry_I,
                                            const DeviceInfo& criterion_I, uint32_t mask_I);
 
+// The mask a criterion of a multiple search is matched with: the vendor id
+// always, each further field when it is not 0.
+uint32_t CriterionMask(const DeviceInfo& criterion_I);
+// Runs each criterion in order; of entries equal in all five fields only the
+// first found is kept.
+std::vector<DeviceInfo> FindMatchedDevicesMultiple(CDeviceRegistry& registry_I,
+                                                   const std::vector<DeviceInfo>& criteria_I);
+
+// Every attached USB device of `vendorId_I` as an identity with usage and
+// usage page 0: how a vendor-class interface, which has no HID node, is found.
+std::vector<DeviceInfo> FindUsbDevices(CDeviceRegistry& registry_I, uint32_t vendorId_I);
+
+// The location id of the USB device `levels_I` steps up the tree from the
+// one at `locationId_I` (bus in bits 31-24, one port nibble a level from bit
+// 23 down). Climbing past the root port gives the bus alone.
+uint32_t AncestorLocationId(uint32_t locationId_I, unsigned levels_I);
+// The text that is equal for interfaces of one product: the location of the
+// USB device `topology_I` levels up from the interface, 1 being the
+// interface's own device (0 counts as 1). Empty without a location.
+std::string BasePathFromInfo(const DeviceInfo& info_I, uint8_t topology_I);
+
 }  // namespace IOUtils

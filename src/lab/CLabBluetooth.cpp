@@ -10,7 +10,8 @@ constexpr uint8_t kAB1122Header[] = {0x02, 0x00, 0x0F, 0x06, 0x01, 0x08, 0x01};
 constexpr uint32_t kReservedStart = 0x3000;
 constexpr uint32_t kReservedEnd = 0x8000;
 
-SLabProgrammingDescription Describe(CLabBluetooth::EChip chip_I, std::string name_I) {
+SLabProgrammingDescription Describe(CLabBluetooth::EChip chip_I, std::string name_I,
+                                    const SLabBoardIds& ids_I) {
   SLabProgrammingDescription description;
   description.name = std::move(name_I);
   const bool ab1122 = chip_I == CLabBluetooth::EChip::eAB1122;
@@ -23,13 +24,14 @@ SLabProgrammingDescription Describe(CLabBluetooth::EChip chip_I, std::string nam
   // The AB1555 erases for a good while after the start.
   description.startBusy = ab1122 ? 0.3 : 1.5;
   description.endBusy = ab1122 ? 0.2 : 1.0;
+  ids_I.ApplyTo(description);
   return description;
 }
 
 }  // namespace
 
-CLabBluetooth::CLabBluetooth(EChip chip_I, std::string name_I)
-    : CLabProgrammingBoard(Describe(chip_I, std::move(name_I))), mChip(chip_I) {
+CLabBluetooth::CLabBluetooth(EChip chip_I, std::string name_I, const SLabBoardIds& ids_I)
+    : CLabProgrammingBoard(Describe(chip_I, std::move(name_I), ids_I)), mChip(chip_I) {
   FactoryReset(chip_I == EChip::eAB1122 ? 0xB122 : 0xB555);
 }
 

@@ -15,7 +15,7 @@ class CLabBluetooth : public CLabProgrammingBoard {
   enum class EChip { eAB1122, eAB1555 };
   static constexpr uint32_t kPage = 256;
 
-  explicit CLabBluetooth(EChip chip_I, std::string name_I = "bluetooth");
+  CLabBluetooth(EChip chip_I, std::string name_I = "bluetooth", const SLabBoardIds& ids_I = {});
 
   EChip GetChip() const { return mChip; }
 

@@ -26,10 +26,19 @@ CLabBus::~CLabBus() {
 }
 
 void CLabBus::Plug(std::shared_ptr<CLabBoard> board_I) {
+  uint32_t location = 0;
+  {
+    std::lock_guard<std::recursive_mutex> guard(mLock);
+    location = 0x01000000u | (static_cast<uint32_t>(mBoards.size() + 1) << 20);
+  }
+  Plug(std::move(board_I), location);
+}
+
+void CLabBus::Plug(std::shared_ptr<CLabBoard> board_I, uint32_t locationId_I) {
   {
     std::lock_guard<std::recursive_mutex> guard(mLock);
     board_I->mBus = this;
-    board_I->mLocationId = 0x01000000u | (static_cast<uint32_t>(mBoards.size() + 1) << 20);
+    board_I->mLocationId = locationId_I;
     mBoards.push_back(board_I);
     if (!board_I->mUnplugged) Attach(*board_I);
   }

@@ -6,7 +6,8 @@
 // they come and go.
 //
 // Locations: the board plugged in k-th (from 0) sits on bus 1, port k + 1,
-// so its location id is 0x01000000 | (k + 1) << 20, the same in every mode.
+// so its location id is 0x01000000 | (k + 1) << 20, the same in every mode,
+// unless the board is plugged in at a location given with it.
 //
 // Threads: every entry takes the bus's lock; listeners are called after it
 // is released, on the thread that caused the event (a report's caller, or
@@ -43,6 +44,10 @@ class CLabBus : public std::enable_shared_from_this<CLabBus> {
 
   // Plugs a board in: it gets its location and attaches as it stands.
   void Plug(std::shared_ptr<CLabBoard> board_I);
+  // Plugs a board in at a location of the caller's choosing: a board behind
+  // a product's own hub (bus 1, root port p, hub port q: 0x01000000 | p << 20
+  // | q << 16). The caller keeps locations apart.
+  void Plug(std::shared_ptr<CLabBoard> board_I, uint32_t locationId_I);
   std::vector<std::shared_ptr<CLabBoard>> GetBoards() const;
   std::shared_ptr<CLabBoard> FindBoard(const std::string& name_I) const;
 

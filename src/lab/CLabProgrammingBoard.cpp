@@ -1,5 +1,12 @@
 #include "lab/CLabProgrammingBoard.h"
 
+void SLabBoardIds::ApplyTo(SLabProgrammingDescription& description_IO) const {
+  if (vendorId != 0) description_IO.vendorId = vendorId;
+  if (productId != 0) description_IO.productId = productId;
+  if (loaderProductId != 0) description_IO.loaderProductId = loaderProductId;
+  if (usage != std::pair<uint16_t, uint16_t>{0, 0}) description_IO.usage = usage;
+}
+
 CLabProgrammingBoard::CLabProgrammingBoard(SLabProgrammingDescription description_I)
     : CLabBoard(description_I.name),
       mDescription(std::move(description_I)),

@@ -36,6 +36,17 @@ struct SLabProgrammingDescription {
   double endBusy = 0.2;
 };
 
+// The USB identity a lab product gives one of its programming boards; a 0
+// keeps the board's own value.
+struct SLabBoardIds {
+  uint16_t vendorId = 0;
+  uint16_t productId = 0;
+  uint16_t loaderProductId = 0;
+  std::pair<uint16_t, uint16_t> usage{0, 0};
+
+  void ApplyTo(SLabProgrammingDescription& description_IO) const;
+};
+
 class CLabProgrammingBoard : public CLabBoard {
  public:
   enum class EMode { eNormal, eLoader };

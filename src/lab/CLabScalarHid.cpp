@@ -4,7 +4,7 @@
 
 namespace {
 
-SLabProgrammingDescription Describe(std::string name_I) {
+SLabProgrammingDescription Describe(std::string name_I, const SLabBoardIds& ids_I) {
   SLabProgrammingDescription description;
   description.name = std::move(name_I);
   description.productId = 0x0351;
@@ -13,13 +13,14 @@ SLabProgrammingDescription Describe(std::string name_I) {
   description.target = 4;
   description.imageBase = 0;
   description.imageSize = 512 * 1024;
+  ids_I.ApplyTo(description);
   return description;
 }
 
 }  // namespace
 
-CLabScalarHid::CLabScalarHid(std::string name_I)
-    : CLabProgrammingBoard(Describe(std::move(name_I))) {
+CLabScalarHid::CLabScalarHid(std::string name_I, const SLabBoardIds& ids_I)
+    : CLabProgrammingBoard(Describe(std::move(name_I), ids_I)) {
   FactoryReset(0x5CA1);
 }
 

@@ -8,7 +8,7 @@
 
 class CLabScalarHid : public CLabProgrammingBoard {
  public:
-  explicit CLabScalarHid(std::string name_I = "scalar");
+  explicit CLabScalarHid(std::string name_I = "scalar", const SLabBoardIds& ids_I = {});
 
  protected:
   bool TakeData(const std::vector<uint8_t>& report_I) override;

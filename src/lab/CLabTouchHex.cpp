@@ -2,7 +2,7 @@
 
 namespace {
 
-SLabProgrammingDescription Describe(std::string name_I) {
+SLabProgrammingDescription Describe(std::string name_I, const SLabBoardIds& ids_I) {
   SLabProgrammingDescription description;
   description.name = std::move(name_I);
   description.productId = 0x0321;
@@ -11,12 +11,14 @@ SLabProgrammingDescription Describe(std::string name_I) {
   description.target = 0;
   description.imageBase = CLabTouchHex::kImageBase;
   description.imageSize = 196608;
+  ids_I.ApplyTo(description);
   return description;
 }
 
 }  // namespace
 
-CLabTouchHex::CLabTouchHex(std::string name_I) : CLabProgrammingBoard(Describe(std::move(name_I))) {
+CLabTouchHex::CLabTouchHex(std::string name_I, const SLabBoardIds& ids_I)
+    : CLabProgrammingBoard(Describe(std::move(name_I), ids_I)) {
   FactoryReset(0x4E78);
 }
 

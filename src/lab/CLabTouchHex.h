@@ -11,7 +11,7 @@ class CLabTouchHex : public CLabProgrammingBoard {
   static constexpr uint32_t kImageBase = 0x8000;
   static constexpr uint32_t kChunk = 128;
 
-  explicit CLabTouchHex(std::string name_I = "touch-hex");
+  explicit CLabTouchHex(std::string name_I = "touch-hex", const SLabBoardIds& ids_I = {});
 
  protected:
   bool TakeData(const std::vector<uint8_t>& report_I) override;

@@ -4,6 +4,7 @@
 
 #include "common/CClock.h"
 #include "common/TavLog.h"
+#include "devices/IOUtils.h"
 #include "platform/linux/LinuxPlatformConstants.h"
 
 CLinuxBulkFLDeviceInterface::CLinuxBulkFLDeviceInterface(const DeviceInfo& info_I,
@@ -23,8 +24,10 @@ DeviceInfo CLinuxBulkFLDeviceInterface::RebuildInfo() const {
   return DeviceInfo{mVendorId, mProductId, mLocationId, mUsageId, mUsagePage};
 }
 
-std::string CLinuxBulkFLDeviceInterface::GetBasePath(uint8_t /*topology_I*/) {
-  return PathFromInfo(RebuildInfo());
+// The boards of one product share a USB ancestor: `topology_I` says how many
+// levels up it is, so equal texts mean one product.
+std::string CLinuxBulkFLDeviceInterface::GetBasePath(uint8_t topology_I) {
+  return IOUtils::BasePathFromInfo(RebuildInfo(), topology_I);
 }
 
 bool CLinuxBulkFLDeviceInterface::Open() {

@@ -3,6 +3,7 @@
 #include "common/CClock.h"
 #include "common/TavAssert.h"
 #include "common/TavLog.h"
+#include "devices/IOUtils.h"
 #include "platform/linux/LinuxPlatformConstants.h"
 
 CLinuxHIDFLDeviceInterface::CLinuxHIDFLDeviceInterface(const DeviceInfo& info_I,
@@ -72,6 +73,8 @@ bool CLinuxHIDFLDeviceInterface::GetAttributes() {
   return true;
 }
 
-std::string CLinuxHIDFLDeviceInterface::GetBasePath(uint8_t /*topology_I*/) {
-  return PathFromInfo(RebuildInfo());
+// The boards of one product share a USB ancestor: `topology_I` says how many
+// levels up it is, so equal texts mean one product.
+std::string CLinuxHIDFLDeviceInterface::GetBasePath(uint8_t topology_I) {
+  return IOUtils::BasePathFromInfo(RebuildInfo(), topology_I);
 }

@@ -3,6 +3,7 @@
 #include "common/CClock.h"
 #include "common/TavAssert.h"
 #include "common/TavLog.h"
+#include "devices/IOUtils.h"
 #include "platform/linux/LinuxPlatformConstants.h"
 
 CLinuxI2CFLDeviceInterface::CLinuxI2CFLDeviceInterface(const DeviceInfo& info_I,
@@ -22,8 +23,10 @@ DeviceInfo CLinuxI2CFLDeviceInterface::RebuildInfo() const {
   return DeviceInfo{mVendorId, mProductId, mLocationId, mUsageId, mUsagePage};
 }
 
-std::string CLinuxI2CFLDeviceInterface::GetBasePath(uint8_t /*topology_I*/) {
-  return PathFromInfo(RebuildInfo());
+// The boards of one product share a USB ancestor: `topology_I` says how many
+// levels up it is, so equal texts mean one product.
+std::string CLinuxI2CFLDeviceInterface::GetBasePath(uint8_t topology_I) {
+  return IOUtils::BasePathFromInfo(RebuildInfo(), topology_I);
 }
 
 bool CLinuxI2CFLDeviceInterface::Open() {

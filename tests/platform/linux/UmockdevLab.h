@@ -15,6 +15,7 @@
 #include <linux/usbdevice_fs.h>
 #include <umockdev.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstddef>
 #include <cstdio>
@@ -131,6 +132,40 @@ class UmockdevLab {
     return device_I.nodes.back().get();
   }
 
+  static std::vector<unsigned> PortsOf(uint32_t location_I) {
+    std::vector<unsigned> ports;
+    for (int shift = 20; shift >= 0; shift -= 4) {
+      const unsigned port = (location_I >> shift) & 0xF;
+      if (port == 0) break;
+      ports.push_back(port);
+    }
+    return ports;
+  }
+
+  static std::string Devpath(const std::vector<unsigned>& ports_I, size_t depth_I) {
+    std::string devpath;
+    for (size_t i = 0; i < depth_I; ++i) devpath += (i ? "." : "") + std::to_string(ports_I[i]);
+    return devpath;
+  }
+
+  static std::string UsbPath(const std::vector<unsigned>& ports_I, size_t depth_I) {
+    std::string path = "/devices/usb1";
+    for (size_t depth = 1; depth <= depth_I; ++depth) path += "/1-" + Devpath(ports_I, depth);
+    return path;
+  }
+
+  // The hubs a device hangs behind, each added once and kept to the end.
+  void AddHubs(const std::vector<unsigned>& ports_I) {
+    for (size_t depth = 1; depth < ports_I.size(); ++depth) {
+      const std::string path = UsbPath(ports_I, depth);
+      if (std::find(mHubs.begin(), mHubs.end(), path) != mHubs.end()) continue;
+      mHubs.push_back(path);
+      Add("P: " + path + "\nE: SUBSYSTEM=usb\nE: DEVTYPE=usb_device\nE: DRIVER=usb\n" +
+          "A: idVendor=7a5d\\n\nA: idProduct=00f0\\n\nA: bcdDevice=0100\\n\n" +
+          "A: bDeviceClass=09\\n\nA: busnum=1\\n\nA: devpath=" + Devpath(ports_I, depth) + "\\n\n");
+    }
+  }
+
   void AddDevice(uint32_t location_I, const std::vector<SLabInterface>& listed_I) {
     auto device = std::make_shared<SDevice>();
     device->location = location_I;
@@ -139,12 +174,16 @@ class UmockdevLab {
     }
     const SLabInterface& first = device->interfaces.front();
     device->usbfs = first.link == ELabLink::eUsbVendor;
-    const unsigned port = (location_I >> 20) & 0xF;
+    // The location's port nibbles give the device's place: "2", or "2.3"
+    // behind a hub on root port 2.
+    const std::vector<unsigned> ports = PortsOf(location_I);
+    const std::string devpath = Devpath(ports, ports.size());
+    AddHubs(ports);
     const unsigned devnum = mNextDevnum++;
     char buffer[512];
     std::snprintf(buffer, sizeof(buffer), "/dev/bus/usb/001/%03u", devnum);
     const std::string usbNode = buffer;
-    const std::string usbPath = "/devices/usb1/1-" + std::to_string(port);
+    const std::string usbPath = UsbPath(ports, ports.size());
 
     // Device descriptor, one configuration, one interface per usage (HID
     // class 3) or one vendor-class interface (0xFF, subclass 0).
@@ -193,18 +232,17 @@ class UmockdevLab {
                   "P: %s\nN: bus/usb/001/%03u=00\nE: SUBSYSTEM=usb\nE: DEVTYPE=usb_device\n"
                   "E: DRIVER=usb\nE: BUSNUM=001\nE: DEVNUM=%03u\nE: DEVNAME=%s\n"
                   "A: idVendor=%04x\\n\nA: idProduct=%04x\\n\nA: bcdDevice=%04x\\n\n"
-                  "A: busnum=1\\n\nA: devnum=%u\\n\nA: devpath=%u\\n\nA: speed=480\\n\n"
+                  "A: busnum=1\\n\nA: devnum=%u\\n\nA: devpath=%s\\n\nA: speed=480\\n\n"
                   "A: bConfigurationValue=1\\n\nA: dev=189:%u\nH: descriptors=",
                   usbPath.c_str(), devnum, devnum, usbNode.c_str(), vendor, product, first.release,
-                  devnum, port, devnum);
+                  devnum, devpath.c_str(), devnum);
     Add(std::string(buffer) + Hex(descriptors) + "\n");
     device->syspaths.push_back(usbPath);
 
     if (!device->usbfs) {
       for (size_t i = 0; i < device->interfaces.size(); ++i) {
         const SLabInterface& entry = device->interfaces[i];
-        const std::string interfacePath =
-            usbPath + "/1-" + std::to_string(port) + ":1." + std::to_string(i);
+        const std::string interfacePath = usbPath + "/1-" + devpath + ":1." + std::to_string(i);
         Add("P: " + interfacePath +
             "\nE: SUBSYSTEM=usb\nE: DEVTYPE=usb_interface\nA: bInterfaceClass=03\\n\n"
             "A: bInterfaceNumber=0" +
@@ -416,6 +454,7 @@ class UmockdevLab {
   std::shared_ptr<CLabBus> mBus;
   UMockdevTestbed* mTestbed;
   std::vector<std::shared_ptr<SDevice>> mDevices;
+  std::vector<std::string> mHubs;
   unsigned mNextDevnum = 2;
   unsigned mNextHid = 1;
   unsigned mNextHidraw = 0;

@@ -8,8 +8,11 @@
 #include <string>
 
 #include "lab/CLabPenController.h"
+#include "lab/CLabProducts.h"
 #include "lab/CLabTouchBulk.h"
 #include "platform/linux/CLinuxBulkFLDeviceInterface.h"
+#include "platform/linux/CLinuxDeviceRegistry.h"
+#include "platform/linux/CLinuxDiscovery.h"
 #include "platform/linux/CLinuxHIDFLDeviceInterface.h"
 #include "platform/linux/CLinuxHidNode.h"
 #include "platform/linux/CLinuxUsbControl.h"
@@ -159,6 +162,45 @@ TEST_F(Umockdev, TouchControllerSwitchedOverLibusbAndUpdatedOnItsLoader) {
   CLinuxBulkFLDeviceInterface again(normal, std::make_unique<CLinuxUsbControl>());
   ASSERT_TRUE(again.Open());
   EXPECT_TRUE(again.IsAlive());
+}
+
+TEST_F(Umockdev, DiscoveryFindsLabProductsBehindTheirHubsThroughLibudev) {
+  const auto classic = CLabProducts::Plug(*mBus, "classic-tablet", 1);
+  const auto wireless = CLabProducts::Plug(*mBus, "wireless-tablet", 2);
+  Start();
+  auto registry = std::make_shared<CLinuxDeviceRegistry>();
+  CLinuxDiscovery discovery(
+      registry, [registry] { return std::make_unique<CLinuxHidNode>(registry); },
+      [] { return std::make_unique<CLinuxUsbControl>(); });
+  discovery.SetConfig(TAV_DATA_DIR "/fw_loader.ini");
+
+  ASSERT_TRUE(discovery.GenerateDeviceList());
+  CDeviceList list = discovery.GetDeviceList();
+  ASSERT_EQ(list.GetDeviceCount(), 2u);
+  const auto tablet = list.GetDevice(0);
+  EXPECT_EQ(tablet->GetDeviceName(), "Lab Classic Tablet");
+  // Locations come from busnum and devpath: hub on port 1, boards on its ports.
+  EXPECT_EQ(tablet->GetPenInterface()->GetPath(), "31325:769:17891328:1:65280");
+  ASSERT_NE(tablet->GetTouchInterface(), nullptr);
+  EXPECT_EQ(tablet->GetTouchInterface()->GetPath(), "31325:785:17956864:0:0");
+  EXPECT_EQ(tablet->GetTouchInterface()->GetInterfaceType(), EBULK_INTERFACE);
+  const auto other = list.GetDevice(1);
+  EXPECT_EQ(other->GetDeviceName(), "Lab Wireless Tablet");
+  ASSERT_NE(other->GetBluetoothInterface(), nullptr);
+  EXPECT_EQ(other->GetBluetoothInterface()->GetPath(), "31325:1057:19070976:1:65280");
+
+  // The pen goes to its loader through its hidraw node and comes back under
+  // another product id at the same place.
+  ASSERT_TRUE(tablet->GetPenInterface()->SwitchToBLMode());
+  TavSleep(1.0);
+  mLab->Sync();
+  ASSERT_TRUE(discovery.GenerateDeviceList());
+  const auto best = discovery.GetBestDevice();
+  ASSERT_NE(best, nullptr);
+  EXPECT_TRUE(best->GetIsFlashLoader());
+  EXPECT_EQ(best->GetPenInterface()->GetPath(), "31325:770:17891328:1:65280");
+  EXPECT_EQ(best->GetTouchInterface()->GetPath(), "31325:785:17956864:0:0");
+  EXPECT_NE(discovery.FindDevice(other->GetBluetoothInterface()->GetPath()), nullptr);
 }
 
 }  // namespace

@@ -1,0 +1,58 @@
+#pragma once
+// --list [--lab [NAME]] [--json] [-f CONFIG]: runs discovery once and shows
+// each product found with its boards: where each board was found, how it
+// is reached, its version and the firmware file the configuration names
+// for it. Nothing is sent to a device.
+//
+// Exit status: 0 with at least one product, 2 with none, 1 for a wrong
+// lab product name.
+
+#include <cstdio>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "devices/CDeviceList.h"
+
+class CCommandLine;
+class CDeviceRegistry;
+class CRunSeams;
+
+class CListCommand {
+ public:
+  explicit CListCommand(const CCommandLine& commandLine_I);
+
+  int Run(std::FILE* out_IO, std::FILE* err_IO);
+  // Lists what `seams_I` shows, with the configuration at `configPath_I`.
+  int Run(const CRunSeams& seams_I, const std::string& configPath_I, std::FILE* out_IO,
+          std::FILE* err_IO);
+
+  // -f CONFIG, else fw_loader.ini beside the program, else the installed one.
+  static std::string ConfigPath(const std::vector<std::string>& updaterArguments_I);
+  static void PrintLabProducts(std::FILE* out_IO);
+
+ private:
+  struct SBoardLine {
+    std::string board;      // "pen", "touch", "bluetooth", "scalar"
+    std::string path;       // empty when not found
+    std::string interface;  // "HID", "BULK", "I2C", "FTDI", or "" for none configured
+    std::string version;    // empty when unknown
+    std::string firmware;
+    bool searched = true;  // false for a scalar behind the display's bridge
+  };
+  struct SProductLine {
+    std::string name;
+    bool loaderMode = false;
+    std::vector<SBoardLine> boards;
+  };
+
+  std::vector<SProductLine> Describe(const CDeviceList& list_I, CDeviceRegistry& registry_I) const;
+  void PrintText(const std::vector<SProductLine>& products_I, std::FILE* out_IO) const;
+  void PrintJson(const std::vector<SProductLine>& products_I, std::FILE* out_IO) const;
+
+  std::string mConfigPath;
+  bool mLab = false;
+  std::string mLabName;
+  bool mJson = false;
+  bool mConfigRead = false;
+};

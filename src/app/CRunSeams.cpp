@@ -1,0 +1,42 @@
+#include "app/CRunSeams.h"
+
+#include "lab/CLabBus.h"
+#include "lab/CLabDeviceRegistry.h"
+#include "lab/CLabHidNode.h"
+#include "lab/CLabOptions.h"
+#include "lab/CLabProducts.h"
+#include "lab/CLabUsbControl.h"
+#include "platform/linux/CLinuxDeviceRegistry.h"
+#include "platform/linux/CLinuxHidNode.h"
+#include "platform/linux/CLinuxUsbControl.h"
+
+std::unique_ptr<CRunSeams> CRunSeams::MakeLinux() {
+  std::unique_ptr<CRunSeams> seams(new CRunSeams());
+  auto registry = std::make_shared<CLinuxDeviceRegistry>();
+  seams->mRegistry = registry;
+  seams->mMakeHidNode = [registry] { return std::make_unique<CLinuxHidNode>(registry); };
+  seams->mMakeUsbControl = [] { return std::make_unique<CLinuxUsbControl>(); };
+  return seams;
+}
+
+std::unique_ptr<CRunSeams> CRunSeams::MakeLab(const std::string& product_I, std::string& error_O) {
+  const std::string product = product_I.empty() ? CLabProducts::DefaultName() : product_I;
+  if (!CLabProducts::IsKnown(product)) {
+    error_O = "there is no lab product called " + product + "; --lab list names them";
+    return nullptr;
+  }
+  std::unique_ptr<CRunSeams> seams(new CRunSeams());
+  auto bus = CLabBus::Create();
+  CLabProducts::Plug(*bus, product);
+  // As the last lab run left the boards; nothing is written back.
+  bus->LoadState(CLabOptions().GetStateFolder());
+  seams->mLabBus = bus;
+  seams->mRegistry = std::make_shared<CLabDeviceRegistry>(bus);
+  seams->mMakeHidNode = [bus] { return std::make_unique<CLabHidNode>(bus); };
+  seams->mMakeUsbControl = [bus] { return std::make_unique<CLabUsbControl>(bus); };
+  return seams;
+}
+
+std::unique_ptr<CLinuxDiscovery> CRunSeams::MakeDiscovery() const {
+  return std::make_unique<CLinuxDiscovery>(mRegistry, mMakeHidNode, mMakeUsbControl);
+}

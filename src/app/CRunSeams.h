@@ -1,0 +1,32 @@
+#pragma once
+// The seams a run works through: the Linux ones (libudev, hidraw, libusb),
+// or the lab's, with one emulated product plugged into the lab bus. Only
+// the application chooses between the two; everything above the seams is
+// the same in both.
+
+#include <memory>
+#include <string>
+
+#include "platform/linux/CLinuxDiscovery.h"
+#include "seams/CDeviceRegistry.h"
+
+class CLabBus;
+
+class CRunSeams {
+ public:
+  static std::unique_ptr<CRunSeams> MakeLinux();
+  // The lab with product `product_I` (empty for the default one) as a
+  // previous lab run left it; null, with a reason, for an unknown product.
+  static std::unique_ptr<CRunSeams> MakeLab(const std::string& product_I, std::string& error_O);
+
+  const std::shared_ptr<CDeviceRegistry>& GetRegistry() const { return mRegistry; }
+  std::unique_ptr<CLinuxDiscovery> MakeDiscovery() const;
+
+ private:
+  CRunSeams() = default;
+
+  std::shared_ptr<CLabBus> mLabBus;
+  std::shared_ptr<CDeviceRegistry> mRegistry;
+  CLinuxDiscovery::HidNodeFactory mMakeHidNode;
+  CLinuxDiscovery::UsbControlFactory mMakeUsbControl;
+};

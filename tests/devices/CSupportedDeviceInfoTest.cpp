@@ -1,0 +1,359 @@
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <filesystem>
+#include <fstream>
+
+#include "devices/CDiscovery.h"
+#include "devices/CFakeInterface.h"
+#include "devices/CSupportedDeviceInfo.h"
+#include "settings/CSettingsArray.h"
+#include "settings/CSettingsMap.h"
+#include "support/LogCapture.h"
+
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr const char* kTypeWarning = "CSettingsMap::ObjectForKey got a";
+
+std::shared_ptr<CSettingsArray> Products(const std::string& json_I) {
+  auto array = CSettingsArray::CastToArray(CSettingsObject::ReadFromJSONBuffer(json_I), false);
+  EXPECT_NE(array, nullptr) << json_I;
+  return array;
+}
+
+CDevice Product(const std::string& json_I) {
+  CSupportedDeviceInfo info;
+  return info.ParseBoards(
+      CSettingsMap::CastToMap(CSettingsObject::ReadFromJSONBuffer(json_I), false));
+}
+
+// A configuration file of its own for each test, removed afterwards.
+class ConfigFile {
+ public:
+  ConfigFile() {
+    mPath = fs::temp_directory_path() /
+            ("fw_loader-" + std::to_string(getpid()) + "-" +
+             ::testing::UnitTest::GetInstance()->current_test_info()->name() + ".ini");
+  }
+  ~ConfigFile() { fs::remove(mPath); }
+  void Write(const std::string& text_I) const { std::ofstream(mPath) << text_I; }
+  std::string Path() const { return mPath.string(); }
+
+ private:
+  fs::path mPath;
+};
+
+constexpr const char* kTwoProducts = R"([
+  {"name": "Slate", "penBoard": {"pid": "0x300", "update": "slate.pen"}},
+  {"name": "Easel", "penBoard": {"pid": "301"}, "touchBoard": {"pid": "302"}}
+])";
+
+}  // namespace
+
+TEST(CSupportedDeviceInfoTest, BoardsLeftOutKeepTheDeviceDefaultsAndBoardsGivenTakeTheirOwn) {
+  CDevice onlyPid = Product(R"({"name": "Slate", "penBoard": {"pid": "300"}})");
+  EXPECT_EQ(onlyPid.GetDeviceName(), "Slate");
+  EXPECT_EQ(onlyPid.GetPenVendorId(), 0x7A5Du);
+  EXPECT_EQ(onlyPid.GetPenProductId(), 0x300u);
+  EXPECT_EQ(onlyPid.GetPenInterfaceType(), EHID_INTERFACE);
+  EXPECT_EQ(onlyPid.GetPenTopology(), 1);
+  EXPECT_EQ(onlyPid.GetPenUsageId(), 0u);
+  EXPECT_TRUE(onlyPid.getPenIntoBLMode());
+  EXPECT_FALSE(onlyPid.GetIsFlashLoader());
+  // Boards left out are not supported and keep the device's zero identity.
+  EXPECT_FALSE(onlyPid.GetTouchSupported());
+  EXPECT_FALSE(onlyPid.GetScalarSupported());
+  EXPECT_EQ(onlyPid.GetScalarVendorId(), 0u);
+  EXPECT_EQ(onlyPid.GetScalarInterfaceType(), EINVALID_INTERFACE);
+
+  CDevice empties = Product(R"({"name": "Panel", "touchBoard": {}, "bluetoothBoard": {},
+                                "scalarBoard": {}})");
+  EXPECT_TRUE(empties.GetTouchSupported());
+  EXPECT_TRUE(empties.GetScalarSupported());
+  EXPECT_EQ(empties.GetTouchVendorId(), 0x7A5Du);
+  EXPECT_EQ(empties.GetBluetoothInterfaceType(), EHID_INTERFACE);
+  EXPECT_EQ(empties.GetScalarVendorId(), 0x5B27u);
+  EXPECT_EQ(empties.GetScalarInterfaceType(), EFTDI_INTERFACE);
+  EXPECT_EQ(empties.GetScalarUsageId(), 0xAu);
+  EXPECT_EQ(empties.GetScalarUsagePage(), 0xFF00u);
+  // No pen board: the pen members stay as a default device has them.
+  EXPECT_EQ(empties.GetPenVendorId(), 0u);
+  EXPECT_EQ(empties.GetPenInterfaceType(), EINVALID_INTERFACE);
+
+  CDevice full = Product(R"({"name": "Full",
+    "penBoard": {"vid": "1234", "pid": "56", "interface": "BULK", "sectors": 74565,
+                 "init": true, "topology": 258, "usageId": "1", "usagePg": "FF0D",
+                 "update": "full.pen"},
+    "touchBoard": {"pid": "57", "interface": "I2C", "sectors": 9, "topology": 3,
+                   "update": "full.hex"},
+    "scalarBoard": {"vid": "0x1111", "pid": "1060", "interface": "HID", "sectors": 64,
+                    "quantaScalarBoard": true, "qisdaVenusScalarBoard": true,
+                    "update": "full.bin", "usageId": "2", "usagePg": "FF01"}})");
+  EXPECT_EQ(full.GetPenVendorId(), 0x1234u);
+  EXPECT_EQ(full.GetPenInterfaceType(), EBULK_INTERFACE);
+  EXPECT_EQ(full.GetPenFlashSectors(), 0x2345u);  // low 16 bits of 0x12345
+  EXPECT_EQ(full.GetPenTopology(), 2);            // low 8 bits of 0x102
+  EXPECT_EQ(full.GetPenUsagePage(), 0xFF0Du);
+  EXPECT_EQ(full.GetPenUpdate(), "full.pen");
+  EXPECT_EQ(full.GetTouchInterfaceType(), EI2C_INTERFACE);
+  EXPECT_EQ(full.GetTouchTopology(), 3);
+  EXPECT_EQ(full.GetScalarVendorId(), 0x1111u);
+  EXPECT_EQ(full.GetScalarInterfaceType(), EHID_INTERFACE);
+  EXPECT_TRUE(full.GetIsQuantaScalarBoard());
+  EXPECT_TRUE(full.GetIsQisdaVenusScalarBoard());
+  EXPECT_EQ(full.GetScalarUpdate(), "full.bin");
+  EXPECT_EQ(full.GetScalarUsagePage(), 0xFF01u);
+
+  // init is only visible in the device's text, which needs a pen interface.
+  full.SetPenInterface(CFakeInterface::Make("1:2:3:4:5"));
+  EXPECT_NE(full.ToString().find("\tInit Eeprom = YES\n"), std::string::npos);
+}
+
+TEST(CSupportedDeviceInfoTest, ValuesOfTheWrongJsonTypeWarnAndFallBackToTheBoardDefault) {
+  LogCapture log;
+  CDevice device = Product(R"({"name": "Slate",
+    "penBoard": {"vid": 4660, "pid": 827, "interface": 1, "sectors": "12", "init": "yes",
+                 "topology": 2.5, "usageId": 1, "update": 7, "intoBLMode": "no"},
+    "scalarBoard": {"vid": 4660, "usagePg": 65281, "quantaScalarBoard": 1},
+    "touchBoard": "not an object"})");
+  EXPECT_EQ(device.GetPenVendorId(), 0x7A5Du);
+  EXPECT_EQ(device.GetPenProductId(), 0u);
+  EXPECT_EQ(device.GetPenInterfaceType(), EHID_INTERFACE);
+  EXPECT_EQ(device.GetPenFlashSectors(), 0u);
+  EXPECT_EQ(device.GetPenTopology(), 1);
+  EXPECT_EQ(device.GetPenUsageId(), 0u);
+  EXPECT_EQ(device.GetPenUpdate(), "");
+  EXPECT_TRUE(device.getPenIntoBLMode());
+  EXPECT_EQ(device.GetScalarVendorId(), 0x5B27u);
+  EXPECT_EQ(device.GetScalarUsagePage(), 0xFF00u);
+  EXPECT_FALSE(device.GetIsQuantaScalarBoard());
+  // A board key holding no object is a board left out.
+  EXPECT_FALSE(device.GetTouchSupported());
+  EXPECT_TRUE(log.LogContains(std::string(kTypeWarning) + " integer and failed to cast to "
+                                                          "CSettingsString"));
+  EXPECT_TRUE(log.LogContains(std::string(kTypeWarning) + " string and failed to cast to "
+                                                          "CSettingsInteger"));
+  EXPECT_TRUE(log.LogContains(std::string(kTypeWarning) + " string and failed to cast to "
+                                                          "CSettingsBool"));
+  EXPECT_TRUE(log.LogContains(std::string(kTypeWarning) + " string and failed to cast to "
+                                                          "CSettingsMap"));
+}
+
+TEST(CSupportedDeviceInfoTest, EveryBoardTakesTheIntoBootloaderFlagOfThePenBoard) {
+  // The touch board's own flag has no effect.
+  CDevice touchOnly = Product(R"({"name": "A", "penBoard": {"pid": "1"},
+                                  "touchBoard": {"pid": "2", "intoBLMode": false}})");
+  EXPECT_TRUE(touchOnly.getPenIntoBLMode());
+  EXPECT_EQ(touchOnly.GetProtocolType(), EFL_PROTOCOL_LOADER);
+
+  CDevice penFalse = Product(R"({"name": "B", "penBoard": {"pid": "1", "intoBLMode": false},
+                                 "touchBoard": {"pid": "2", "intoBLMode": true},
+                                 "scalarBoard": {"pid": "3", "sectors": 5}})");
+  EXPECT_FALSE(penFalse.getPenIntoBLMode());
+  EXPECT_FALSE(penFalse.CanGoIntoBootloaderMode());
+  EXPECT_EQ(penFalse.GetProtocolType(), EFL_PROTOCOL_NON_BL);
+
+  // No pen board to read it from: the other boards are read as able to go
+  // into their loader, and nothing breaks.
+  CDevice noPen = Product(R"({"name": "C", "touchBoard": {"pid": "2"},
+                              "bluetoothBoard": {"pid": "3"}, "scalarBoard": {}})");
+  EXPECT_TRUE(noPen.GetTouchSupported());
+  EXPECT_TRUE(noPen.getPenIntoBLMode());
+}
+
+TEST(CSupportedDeviceInfoTest, LoaderBoardReplacesThePenIdentityButNotItsFileOrFlag) {
+  CDevice alone = Product(R"({"name": "Slate", "loaderBoard": {"pid": "95"}})");
+  EXPECT_TRUE(alone.GetIsFlashLoader());
+  EXPECT_EQ(alone.GetPenVendorId(), 0x7A5Du);
+  EXPECT_EQ(alone.GetPenProductId(), 0x95u);
+  EXPECT_EQ(alone.GetPenInterfaceType(), EHID_INTERFACE);
+
+  CDevice beside = Product(R"({"name": "Slate",
+    "penBoard": {"pid": "300", "interface": "HID", "sectors": 12, "topology": 2,
+                 "usageId": "1", "usagePg": "FF0D", "update": "slate.pen",
+                 "intoBLMode": false},
+    "loaderBoard": {"pid": "95", "interface": "BULK", "update": "ignored.pen"}})");
+  EXPECT_TRUE(beside.GetIsFlashLoader());
+  EXPECT_EQ(beside.GetPenProductId(), 0x95u);
+  EXPECT_EQ(beside.GetPenInterfaceType(), EBULK_INTERFACE);
+  // Every identity key is overwritten, by its default where the loader
+  // leaves it out.
+  EXPECT_EQ(beside.GetPenFlashSectors(), 0u);
+  EXPECT_EQ(beside.GetPenTopology(), 1);
+  EXPECT_EQ(beside.GetPenUsageId(), 0u);
+  EXPECT_EQ(beside.GetPenUsagePage(), 0u);
+  // The file and the into-bootloader flag are the pen board's.
+  EXPECT_EQ(beside.GetPenUpdate(), "slate.pen");
+  EXPECT_FALSE(beside.getPenIntoBLMode());
+}
+
+TEST(CSupportedDeviceInfoTest, ProductsAreStoredUnderThePlainSumOfEachBoardsIds) {
+  LogCapture log;
+  CSupportedDeviceInfo info;
+  CSupportedDeviceInfo::DeviceMap devices = info.ParseDevices(Products(R"([
+    {"name": "Tablet", "penBoard": {"pid": "300"}, "touchBoard": {"pid": "301"},
+     "bluetoothBoard": {"pid": "302"}},
+    {"name": "Shared", "penBoard": {"vid": "7A00", "pid": "5D"},
+     "touchBoard": {"vid": "7A5D", "pid": "0"}, "bluetoothBoard": {"vid": "7A5C", "pid": "1"}},
+    {"name": "Display", "penBoard": {"pid": "400"}, "scalarBoard": {"pid": "1060"}},
+    {"name": "Display2", "penBoard": {"pid": "401", "usagePg": "FF00"},
+     "scalarBoard": {"pid": "1063"}},
+    {"name": "Nameless board"}
+  ])"));
+
+  ASSERT_EQ(devices.count(0x7A5D + 0x300), 1u);
+  EXPECT_EQ(devices[0x7A5D + 0x301].GetDeviceName(), "Tablet");
+  EXPECT_EQ(devices[0x7A5D + 0x302].GetDeviceName(), "Tablet");
+  // Each key holds the whole product.
+  EXPECT_EQ(devices[0x7A5D + 0x302].GetTouchProductId(), 0x301u);
+
+  // Identities that sum to the pen key add no key of their own.
+  EXPECT_EQ(devices[0x7A5D].GetDeviceName(), "Shared");
+  EXPECT_FALSE(log.LogContains("adding board for touch: Shared"));
+  EXPECT_FALSE(log.LogContains("adding board for bluetooth: Shared"));
+  EXPECT_TRUE(log.LogContains("ParseDevices: adding board for pen: Shared; pid: 0x5D\n"));
+  EXPECT_TRUE(log.LogContains("ParseDevices: adding board for touch: Tablet; pid: 0x301\n"));
+
+  // A scalar on another usage page than the pen has the page in its key.
+  EXPECT_EQ(devices.count(0x5B27 + 0x1060), 0u);
+  EXPECT_EQ(devices[0x5B27 + 0x1060 + 0xFF00].GetDeviceName(), "Display");
+  EXPECT_TRUE(log.LogContains("ParseDevices: adding board for scalar: Display; pid: 0x1060\n"));
+  EXPECT_EQ(devices[0x5B27 + 0x1063].GetDeviceName(), "Display2");
+
+  // An element with neither pen nor loader board lands on key 0.
+  EXPECT_EQ(devices[0].GetDeviceName(), "Nameless board");
+  EXPECT_EQ(devices.size(), 9u);
+  EXPECT_TRUE(log.LogContains("ParseDevices...\n"));
+}
+
+TEST(CSupportedDeviceInfoTest, LaterElementsWinCollisionsAndScalarSectorsNeverReachADevice) {
+  CSupportedDeviceInfo info;
+  CSupportedDeviceInfo::DeviceMap devices = info.ParseDevices(Products(R"([
+    {"name": "First", "penBoard": {"pid": "300"}},
+    {"name": "Loader", "loaderBoard": {"pid": "95"}},
+    {"name": "Second", "penBoard": {"pid": "300"}, "scalarBoard": {"pid": "1", "sectors": 64}}
+  ])"));
+  EXPECT_EQ(devices[0x7A5D + 0x300].GetDeviceName(), "Second");
+  EXPECT_TRUE(devices[0x7A5D + 0x95].GetIsFlashLoader());
+  // Stored by assignment: the scalar sectors of a map entry stay as they were.
+  EXPECT_EQ(devices[0x7A5D + 0x300].GetScalarFlashSectors(), 0u);
+  EXPECT_EQ(devices[0x5B27 + 1 + 0xFF00].GetScalarFlashSectors(), 0u);
+  EXPECT_TRUE(info.ParseDevices(nullptr).empty());
+}
+
+TEST(CSupportedDeviceInfoTest, HexTextsFollowTheStreamRules) {
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("7A5D", 1), 0x7A5Du);
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("0x7a5d", 1), 0x7A5Du);
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("0X7A5D", 1), 0x7A5Du);
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam(" 1f", 1), 0x1Fu);
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("12zz", 1), 0x12u);
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("FFFFFFFF", 1), 0xFFFFFFFFu);
+  // No leading digit reads as 0; nothing at all, or blanks alone, keep the default.
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("zz", 1), 0u);
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("", 0x5B27), 0x5B27u);
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("   ", 0x5B27), 0x5B27u);
+
+  CDevice device =
+      Product(R"({"name": "A", "penBoard": {"vid": "zz"}, "scalarBoard": {"vid": ""}})");
+  EXPECT_EQ(device.GetPenVendorId(), 0u);
+  EXPECT_EQ(device.GetScalarVendorId(), 0x5B27u);
+}
+
+TEST(CSupportedDeviceInfoTest, InterfaceWordsAreExactAndUnknownWordsAreInvalid) {
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("HID", EFTDI_INTERFACE), EHID_INTERFACE);
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("BULK", EHID_INTERFACE), EBULK_INTERFACE);
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("I2C", EHID_INTERFACE), EI2C_INTERFACE);
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("FTDI", EHID_INTERFACE), EFTDI_INTERFACE);
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("", EFTDI_INTERFACE), EFTDI_INTERFACE);
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("hid", EHID_INTERFACE), EINVALID_INTERFACE);
+  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("HID ", EHID_INTERFACE),
+            EINVALID_INTERFACE);
+  EXPECT_EQ(Product(R"({"name": "A", "penBoard": {"interface": "hid"}})").GetPenInterfaceType(),
+            EINVALID_INTERFACE);
+}
+
+TEST(CSupportedDeviceInfoTest, LookupsCompareOnlyTheSumAndListEveryKeyInOrder) {
+  CSupportedDeviceInfo info;
+  ConfigFile file;
+  file.Write(kTwoProducts);
+  info.SetConfigPath(file.Path());
+  ASSERT_TRUE(info.ParseConfig());
+
+  EXPECT_EQ(info.FindDevice(0x7A5D, 0x300).GetDeviceName(), "Slate");
+  EXPECT_EQ(info.FindDevice(0x7A5D, 0x300).GetPenUpdate(), "slate.pen");
+  // Any pair with the same sum finds the entry.
+  EXPECT_EQ(info.FindDevice(0x7A5D + 0x300, 0).GetDeviceName(), "Slate");
+  EXPECT_EQ(info.FindDevice(0x7A5D, 0x302).GetDeviceName(), "Easel");
+  EXPECT_FALSE(info.FindDevice(0x7A5D, 0x303).IsValid());
+
+  std::vector<CDevice> all = info.GetAllDevices();
+  ASSERT_EQ(all.size(), 3u);
+  EXPECT_EQ(all[0].GetDeviceName(), "Slate");
+  EXPECT_EQ(all[1].GetDeviceName(), "Easel");
+  EXPECT_EQ(all[2].GetDeviceName(), "Easel");
+  // Devices in the map have no interfaces, so each entry is its key alone.
+  EXPECT_EQ(info.ToString(), "[32093]: [32094]: [32095]: ");
+}
+
+TEST(CSupportedDeviceInfoTest, UnreadableOrEmptyDocumentsGiveFalseAndAnEmptyMap) {
+  LogCapture log;
+  ConfigFile file;
+  CSupportedDeviceInfo info;
+  EXPECT_EQ(info.GetConfigPath(), "./fw_loader.ini");
+  info.SetConfigPath(file.Path());
+  EXPECT_FALSE(info.ParseConfig());  // missing
+
+  file.Write("[{\"name\": \"Slate\", ");
+  EXPECT_FALSE(info.ParseConfig());
+  file.Write("[]");
+  EXPECT_FALSE(info.ParseConfig());
+  file.Write(R"({"name": "Slate", "penBoard": {"pid": "300"}})");
+  EXPECT_FALSE(info.ParseConfig());
+  EXPECT_TRUE(log.LogContains("CastToArray got a map"));
+  EXPECT_FALSE(info.IsValid());
+
+  file.Write(kTwoProducts);
+  ASSERT_TRUE(info.ParseConfig());
+  // A failed read afterwards empties the map: a parse starts from nothing.
+  fs::remove(file.Path());
+  EXPECT_FALSE(info.ParseConfig());
+  EXPECT_FALSE(info.IsValid());
+}
+
+TEST(CSupportedDeviceInfoTest, ElementsThatAreNoObjectsAreSkipped) {
+  LogCapture log;
+  ConfigFile file;
+  file.Write(R"([42, "text", null, [], {"name": "Slate", "penBoard": {"pid": "300"}}])");
+  CSupportedDeviceInfo info;
+  info.SetConfigPath(file.Path());
+  ASSERT_TRUE(info.ParseConfig());
+  EXPECT_EQ(info.GetAllDevices().size(), 1u);
+  EXPECT_EQ(info.FindDevice(0x7A5D, 0x300).GetDeviceName(), "Slate");
+  EXPECT_TRUE(log.LogContains("CastToMap got a integer"));
+  // Nothing of those elements reached the map under key 0.
+  EXPECT_FALSE(info.FindDevice(0, 0).IsValid());
+}
+
+TEST(CSupportedDeviceInfoTest, DiscoveryReadsTheConfigurationUntilOneReadGivesProducts) {
+  ConfigFile file;
+  CDiscovery discovery;
+  discovery.SetConfig(file.Path());
+  EXPECT_EQ(discovery.GetConfig(), file.Path());
+
+  EXPECT_TRUE(discovery.GenerateDeviceList());  // no file yet: still true
+  EXPECT_FALSE(discovery.GetSupportedDeviceInfo().IsValid());
+
+  file.Write(kTwoProducts);
+  EXPECT_TRUE(discovery.GenerateDeviceList());
+  ASSERT_TRUE(discovery.GetSupportedDeviceInfo().IsValid());
+  EXPECT_EQ(discovery.GetDeviceList().GetDeviceCount(), 0u);
+
+  // Once read, neither a changed file nor another path is read again.
+  file.Write(R"([{"name": "Other", "penBoard": {"pid": "999"}}])");
+  discovery.SetConfig(file.Path() + ".other");
+  EXPECT_TRUE(discovery.GenerateDeviceList());
+  EXPECT_EQ(discovery.GetSupportedDeviceInfo().FindDevice(0x7A5D, 0x300).GetDeviceName(), "Slate");
+  EXPECT_FALSE(discovery.GetSupportedDeviceInfo().FindDevice(0x7A5D, 0x999).IsValid());
+}
