@@ -31,6 +31,22 @@ bool CCommandLine::Parse(const std::vector<std::string>& arguments_I) {
       mInspectJson = true;
     } else if (argument == "--list") {
       mList = true;
+    } else if (argument == "--headless") {
+      mHeadless = true;
+    } else if (argument == "--yes") {
+      mYes = true;
+    } else if (argument == "--lab-fast") {
+      mLabFast = true;
+    } else if (argument == "--lab-fault" || argument == "--lab-state") {
+      if (i + 1 >= arguments_I.size()) {
+        mError = argument + " needs a value";
+        return false;
+      }
+      if (argument == "--lab-fault") {
+        mLabFaults.push_back(arguments_I[++i]);
+      } else {
+        mLabState = arguments_I[++i];
+      }
     } else if (argument == "--lab") {
       mLab = true;
       // The product name is optional: what follows is taken unless it is an option.
@@ -51,6 +67,10 @@ bool CCommandLine::Parse(const std::vector<std::string>& arguments_I) {
   }
   if (mInspectJson && mInspectFile.empty() && !mList) {
     mError = "--json goes with --inspect or --list";
+    return false;
+  }
+  if (!mLab && (mLabFast || !mLabFaults.empty() || !mLabState.empty())) {
+    mError = "--lab-fault, --lab-state and --lab-fast go with --lab";
     return false;
   }
   if (mList && !mInspectFile.empty()) {
@@ -90,5 +110,13 @@ std::string CCommandLine::HelpText() {
          "      --lab [NAME]          use the built-in emulated products instead of USB;\n"
          "                            NAME picks one (default wireless-tablet), \"list\" names\n"
          "                            them all\n"
+         "      --lab-fault KIND@N    inject a fault into the lab (repeatable): vanish@N,\n"
+         "                            fail-read@N, fail-write@N, stall@N, busy@N,\n"
+         "                            refuse-switch, bad-crc@N\n"
+         "      --lab-state DIR       where the lab keeps its boards between runs\n"
+         "      --lab-fast            run the lab on a virtual clock: no real waiting\n"
+         "      --headless            no window; exit status 0 updated, 1 failed, 2 no\n"
+         "                            device, 3 firmware file refused, 4 not confirmed\n"
+         "      --yes                 answer the confirmation with yes\n"
          "      --json                with --list, show the result as one JSON object\n";
 }

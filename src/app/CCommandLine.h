@@ -24,6 +24,14 @@ class CCommandLine {
   bool GetList() const { return mList; }
   // --lab runs on the lab's emulated products instead of the hardware.
   bool GetLab() const { return mLab; }
+  // No window; a run ends with a status that tells its outcome.
+  bool GetHeadless() const { return mHeadless; }
+  // The confirmation is answered yes without asking.
+  bool GetYes() const { return mYes; }
+  // Lab runs: faults to inject (KIND@N), the state folder, the virtual clock.
+  const std::vector<std::string>& GetLabFaults() const { return mLabFaults; }
+  const std::string& GetLabState() const { return mLabState; }
+  bool GetLabFast() const { return mLabFast; }
   // The product after --lab; empty for the default one.
   const std::string& GetLabName() const { return mLabName; }
   // What is left for the updater, in order.
@@ -43,6 +51,11 @@ class CCommandLine {
   std::string mInspectOutputBinary;
   bool mList = false;
   bool mLab = false;
+  bool mHeadless = false;
+  bool mYes = false;
+  std::vector<std::string> mLabFaults;
+  std::string mLabState;
+  bool mLabFast = false;
   std::string mLabName;
   std::vector<std::string> mUpdaterArguments;
 };

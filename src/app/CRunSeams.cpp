@@ -20,6 +20,12 @@ std::unique_ptr<CRunSeams> CRunSeams::MakeLinux() {
 }
 
 std::unique_ptr<CRunSeams> CRunSeams::MakeLab(const std::string& product_I, std::string& error_O) {
+  return MakeLab(product_I, std::string(), error_O);
+}
+
+std::unique_ptr<CRunSeams> CRunSeams::MakeLab(const std::string& product_I,
+                                              const std::string& stateFolder_I,
+                                              std::string& error_O) {
   const std::string product = product_I.empty() ? CLabProducts::DefaultName() : product_I;
   if (!CLabProducts::IsKnown(product)) {
     error_O = "there is no lab product called " + product + "; --lab list names them";
@@ -29,7 +35,9 @@ std::unique_ptr<CRunSeams> CRunSeams::MakeLab(const std::string& product_I, std:
   auto bus = CLabBus::Create();
   CLabProducts::Plug(*bus, product);
   // As the last lab run left the boards; nothing is written back.
-  bus->LoadState(CLabOptions().GetStateFolder());
+  CLabOptions options;
+  options.SetStateFolder(stateFolder_I);
+  bus->LoadState(options.GetStateFolder());
   seams->mLabBus = bus;
   seams->mRegistry = std::make_shared<CLabDeviceRegistry>(bus);
   seams->mMakeHidNode = [bus] { return std::make_unique<CLabHidNode>(bus); };

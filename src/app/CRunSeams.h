@@ -18,6 +18,12 @@ class CRunSeams {
   // The lab with product `product_I` (empty for the default one) as a
   // previous lab run left it; null, with a reason, for an unknown product.
   static std::unique_ptr<CRunSeams> MakeLab(const std::string& product_I, std::string& error_O);
+  // The same, with the boards' state read from `stateFolder_I` (empty: the
+  // default folder).
+  static std::unique_ptr<CRunSeams> MakeLab(const std::string& product_I,
+                                            const std::string& stateFolder_I, std::string& error_O);
+  // The lab's bus; null in a Linux run.
+  const std::shared_ptr<CLabBus>& GetLabBus() const { return mLabBus; }
 
   const std::shared_ptr<CDeviceRegistry>& GetRegistry() const { return mRegistry; }
   std::unique_ptr<CLinuxDiscovery> MakeDiscovery() const;

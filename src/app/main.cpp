@@ -6,6 +6,7 @@
 #include "app/CInspectCommand.h"
 #include "app/CListCommand.h"
 #include "app/CLogOutputs.h"
+#include "app/CUpdateCommand.h"
 #include "app/TavVersion.h"
 #include "common/TavLog.h"
 
@@ -36,7 +37,5 @@ int main(int argc, char** argv) {
     return CInspectCommand(commandLine).Run(stdout, stderr);
   if (commandLine.GetList()) return CListCommand(commandLine).Run(stdout, stderr);
   TavLog::Info("%s %s starting\n", TAV_PROGRAM_NAME, TAV_PROGRAM_VERSION);
-
-  std::fputs("No update can run yet: the updater is not built in this version.\n", stderr);
-  return 0;
+  return CUpdateCommand(commandLine, std::vector<std::string>(argv, argv + argc)).Run();
 }

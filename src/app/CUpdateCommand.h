@@ -1,0 +1,21 @@
+#pragma once
+// The program's main job: an update run with the board arguments, on the
+// hardware or, with --lab, on an emulated product.
+
+#include <string>
+#include <vector>
+
+#include "app/CCommandLine.h"
+
+class CUpdateCommand {
+ public:
+  CUpdateCommand(const CCommandLine& commandLine_I, std::vector<std::string> processArguments_I)
+      : mCommandLine(commandLine_I), mProcessArguments(std::move(processArguments_I)) {}
+  // Ends the process itself once the run is over; returns only on a set-up
+  // error, with the status to exit with.
+  int Run();
+
+ private:
+  const CCommandLine& mCommandLine;
+  std::vector<std::string> mProcessArguments;
+};
