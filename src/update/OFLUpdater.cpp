@@ -13,6 +13,9 @@
 #include "common/SystemState.h"
 #include "common/TavLog.h"
 #include "devices/IOUtils.h"
+#include "settings/CSettingsArray.h"
+#include "settings/CSettingsMap.h"
+#include "settings/CSettingsString.h"
 
 namespace {
 
@@ -202,6 +205,61 @@ uint32_t OFLUpdater::toHex(const std::string& word_I) {
     if (value > 0xFFFFFFFFull) return 0xFFFFFFFFu;
   }
   return static_cast<uint32_t>(value);
+}
+
+std::vector<std::string> OFLUpdater::createArgumentsFromAutoConfig() {
+  std::vector<std::string> arguments;
+  if (!mHIDManager) return arguments;
+
+  // The rule file is a resource of the program: beside it, else installed.
+  std::string rules = JoinPath(mSetup.executableFolder, "autoconfig.ini");
+  if (!FileExists(rules)) rules = JoinPath(mSetup.installedDataFolder, "autoconfig.ini");
+  if (!FileExists(rules)) return arguments;
+
+  const std::shared_ptr<CSettingsMap> map =
+      CSettingsMap::CastToMap(CSettingsObject::ReadFromJSONFile(rules), false);
+  if (!map || !map->IsKeyPresent("auto") || !map->IsKeyPresent("product")) return arguments;
+  auto words = [&map](const char* key_I) {
+    std::vector<std::string> texts;
+    const auto array = CSettingsArray::CastToArray(map->ObjectForKey(key_I), false);
+    if (!array) return texts;
+    for (size_t i = 0; i < array->ObjectCount(); ++i) {
+      // Entries that are not strings are skipped.
+      if (auto text = CSettingsString::CastToString(array->ObjectForIndex(i))) {
+        texts.push_back(text->GetStringValue());
+      }
+    }
+    return texts;
+  };
+  const std::vector<std::string> kinds = words("auto");
+  std::vector<uint32_t> products;
+  for (const std::string& word : words("product")) products.push_back(toHex(word));
+
+  arguments.push_back(JoinPath(mSetup.executableFolder, "tavik-fwupdater"));
+  const CDeviceList list = mUpdater->GetDeviceList();
+  for (const std::string& kind : kinds) {
+    for (uint32_t product : products) {
+      for (unsigned int index = 0;; ++index) {
+        const std::shared_ptr<CDevice> device = list.GetDevice(index);
+        if (!device) break;
+        auto add = [&](const char* option_I, const CDevice::InterfacePtr& interface_I,
+                       uint32_t productId_I) {
+          if (interface_I && productId_I == product) {
+            arguments.push_back(option_I);
+            arguments.push_back(interface_I->GetPath());
+          }
+        };
+        if (kind == "pen") add("-p", device->GetPenInterface(), device->GetPenProductId());
+        if (kind == "touch") add("-t", device->GetTouchInterface(), device->GetTouchProductId());
+        if (kind == "bluetooth") {
+          add("-b", device->GetBluetoothInterface(), device->GetBluetoothProductId());
+        }
+        // "scalar" asks the attached displays, which come with the display
+        // path; until then it adds nothing.
+      }
+    }
+  }
+  return arguments;
 }
 
 bool OFLUpdater::setupUpdate() {

@@ -62,6 +62,10 @@ class OFLUpdater : public CRegistryWatcher {
   // Throws std::out_of_range for an option in last place.
   static std::vector<UpdateEntry> parseArguments(const std::vector<std::string>& arguments_I);
   static uint32_t toHex(const std::string& word_I);
+  // Arguments built from the attached devices and the rule file
+  // "autoconfig.ini" (JSON: "auto" board words, "product" hex ids). Nothing
+  // on the launch path calls it; the arguments in force come from getArgs.
+  std::vector<std::string> createArgumentsFromAutoConfig();
 
   bool setupUpdate();
   void setUpdateType(const std::string& word_I);

@@ -279,6 +279,24 @@ TEST_F(Updater, ProgressIsOneBarAndOnlyTheLastSuccessIsShown) {
   EXPECT_TRUE(mDelegate.mJournal.Contains("state:5"));
 }
 
+TEST_F(Updater, AutoConfigBuildsArgumentsForTheNamedBoardsOfTheNamedProducts) {
+  AttachProduct();
+  OFLUpdater* updater = Make({"prog", "-p", ""});
+  EXPECT_EQ(updater->createArgumentsFromAutoConfig(), std::vector<std::string>{});  // no watch yet
+  ASSERT_TRUE(updater->setupUpdate());
+  EXPECT_EQ(updater->createArgumentsFromAutoConfig(), std::vector<std::string>{});  // no rule file
+
+  std::ofstream(mFolder / "bin" / "autoconfig.ini")
+      << R"({"auto": ["touch", "pen", 7, "pen"], "product": ["0x100", "FFFF", 3]})";
+  // The touch board is absent; the pen matches product 0x100, once per word.
+  EXPECT_EQ(updater->createArgumentsFromAutoConfig(),
+            (std::vector<std::string>{(mFolder / "bin" / "tavik-fwupdater").string(), "-p", kPath,
+                                      "-p", kPath}));
+
+  std::ofstream(mFolder / "bin" / "autoconfig.ini") << R"({"auto": ["pen"]})";
+  EXPECT_EQ(updater->createArgumentsFromAutoConfig(), std::vector<std::string>{});
+}
+
 TEST_F(Updater, UpdateDeviceListMakesUpForAMissedReEnumeration) {
   auto device = AttachProduct();
   OFLUpdater* updater = Make({"prog", "-p", ""});
