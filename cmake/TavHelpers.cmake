@@ -42,6 +42,11 @@ function(tav_test_suite name)
   target_include_directories(${name} PRIVATE ${PROJECT_SOURCE_DIR}/src ${PROJECT_SOURCE_DIR}/tests)
   target_link_libraries(${name} PRIVATE ${ARG_DEPS} GTest::gmock GTest::gtest GTest::gmock_main Threads::Threads)
   tav_target_options(${name})
+  # Sanitized builds run several times slower.
+  set(timeout 120)
+  if(TAV_SANITIZE)
+    set(timeout 1200)
+  endif()
   gtest_discover_tests(${name} DISCOVERY_MODE PRE_TEST
-    PROPERTIES ENVIRONMENT "TMPDIR=${CMAKE_CURRENT_BINARY_DIR}" TIMEOUT 120)
+    PROPERTIES ENVIRONMENT "TMPDIR=${CMAKE_CURRENT_BINARY_DIR}" TIMEOUT ${timeout})
 endfunction()

@@ -24,7 +24,9 @@ double CLabBoard::Now() const { return CClock::Get()->Now(); }
 
 void CLabBoard::Trace(SLabTraceEntry::EKind kind_I, std::vector<uint8_t> bytes_I, size_t length_I,
                       bool ok_I) {
-  if (mTraceEnabled) mTrace.push_back({kind_I, std::move(bytes_I), length_I, ok_I});
+  if (!mTraceEnabled) return;
+  std::lock_guard<std::mutex> guard(mTraceLock);
+  mTrace.push_back({kind_I, std::move(bytes_I), length_I, ok_I});
 }
 
 void CLabBoard::AfterReport() {

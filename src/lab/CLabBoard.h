@@ -19,6 +19,8 @@
 #include "seams/CHidNode.h"
 #include "seams/CUsbControl.h"
 
+#include <mutex>
+
 class CLabBus;
 
 // The identity a board shows in one of its modes.
@@ -57,8 +59,15 @@ class CLabBoard {
                      std::vector<uint8_t>& data_IO, size_t& transferred_O);
 
   CLabFaults& Faults() { return mFaults; }
-  const std::vector<SLabTraceEntry>& GetTrace() const { return mTrace; }
-  void ClearTrace() { mTrace.clear(); }
+  // A copy: the board is driven from the seam's thread while tests read it.
+  std::vector<SLabTraceEntry> GetTrace() const {
+    std::lock_guard<std::mutex> guard(mTraceLock);
+    return mTrace;
+  }
+  void ClearTrace() {
+    std::lock_guard<std::mutex> guard(mTraceLock);
+    mTrace.clear();
+  }
   void SetTraceEnabled(bool enabled_I) { mTraceEnabled = enabled_I; }
   uint64_t GetReportCount() const { return mReportCount; }
   // Rules of the protocol or of the flash that the host broke.
@@ -105,6 +114,7 @@ class CLabBoard {
 
   std::string mName;
   CLabFaults mFaults;
+  mutable std::mutex mTraceLock;
   std::vector<SLabTraceEntry> mTrace;
   bool mTraceEnabled = true;
   uint64_t mReportCount = 0;

@@ -84,13 +84,14 @@ TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
   const uint64_t sequence = pen->GetReportCount();
   uint64_t firstCommit = 0;
   uint64_t lastCommit = 0;
-  for (size_t i = 0; i < pen->GetTrace().size(); ++i) {
-    const SLabTraceEntry& entry = pen->GetTrace()[i];
+  const std::vector<SLabTraceEntry> trace = pen->GetTrace();
+  for (size_t i = 0; i < trace.size(); ++i) {
+    const SLabTraceEntry& entry = trace[i];
     if (entry.kind != SLabTraceEntry::eSetFeature || entry.bytes[0] != commitId) continue;
     if (firstCommit == 0) firstCommit = i + 1;
     lastCommit = i + 1;
   }
-  ASSERT_EQ(pen->GetTrace().size(), sequence);
+  ASSERT_EQ(trace.size(), sequence);
   ASSERT_LT(firstCommit, lastCommit);
 
   uint64_t keptOld = 0;

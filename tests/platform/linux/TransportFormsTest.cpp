@@ -279,7 +279,7 @@ class BulkTransport : public LabFixture {
     mInterface = std::make_unique<CLinuxBulkFLDeviceInterface>(
         Listed(*mTouch), std::make_unique<CLabUsbControl>(mBus));
   }
-  const Bytes& LastSetup() const { return mTouch->GetTrace().back().bytes; }
+  Bytes LastSetup() const { return mTouch->GetTrace().back().bytes; }
 
   std::shared_ptr<CLabTouchBulk> mTouch;
   std::unique_ptr<CLinuxBulkFLDeviceInterface> mInterface;
