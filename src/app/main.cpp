@@ -3,7 +3,7 @@
 #include <vector>
 
 #include "app/CCommandLine.h"
-#include "app/CInspectCommand.h"
+#include "app/CFirmwareReportCommand.h"
 #include "app/CListCommand.h"
 #include "app/CLogOutputs.h"
 #include "app/CUpdateCommand.h"
@@ -34,7 +34,7 @@ int main(int argc, char** argv) {
     return 1;
   }
   if (!commandLine.GetInspectFile().empty())
-    return CInspectCommand(commandLine).Run(stdout, stderr);
+    return CFirmwareReportCommand(commandLine).Run(stdout, stderr);
   if (commandLine.GetList()) return CListCommand(commandLine).Run(stdout, stderr);
   TavLog::Info("%s %s starting\n", TAV_PROGRAM_NAME, TAV_PROGRAM_VERSION);
   return CUpdateCommand(commandLine, std::vector<std::string>(argv, argv + argc)).Run();

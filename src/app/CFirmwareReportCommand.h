@@ -11,9 +11,9 @@
 class CCommandLine;
 class CSRec;
 
-class CInspectCommand {
+class CFirmwareReportCommand {
  public:
-  explicit CInspectCommand(const CCommandLine& commandLine_I);
+  explicit CFirmwareReportCommand(const CCommandLine& commandLine_I);
 
   // 0 when the file loaded and everything asked for was written; 1 with the
   // reason on err_IO otherwise. A file that does not load writes nothing to

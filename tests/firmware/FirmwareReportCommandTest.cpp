@@ -7,7 +7,7 @@
 #include <vector>
 
 #include "app/CCommandLine.h"
-#include "app/CInspectCommand.h"
+#include "app/CFirmwareReportCommand.h"
 #include "firmware/FirmwareFiles.h"
 
 namespace {
@@ -32,7 +32,7 @@ SRun Inspect(const std::vector<std::string>& arguments_I) {
   std::FILE* out = std::tmpfile();
   std::FILE* err = std::tmpfile();
   SRun run;
-  run.status = CInspectCommand(commandLine).Run(out, err);
+  run.status = CFirmwareReportCommand(commandLine).Run(out, err);
   run.out = Drain(out);
   run.err = Drain(err);
   return run;

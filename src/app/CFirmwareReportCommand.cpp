@@ -1,4 +1,4 @@
-#include "app/CInspectCommand.h"
+#include "app/CFirmwareReportCommand.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -172,13 +172,13 @@ class CImageWriter {
 
 }  // namespace
 
-CInspectCommand::CInspectCommand(const CCommandLine& commandLine_I)
+CFirmwareReportCommand::CFirmwareReportCommand(const CCommandLine& commandLine_I)
     : mFile(commandLine_I.GetInspectFile()),
       mInterfaceName(commandLine_I.GetInspectInterface()),
       mJson(commandLine_I.GetInspectJson()),
       mOutputBinary(commandLine_I.GetInspectOutputBinary()) {}
 
-bool CInspectCommand::ParseInterface(const std::string& name_I, EINTERFACE_TYPE& interface_O) {
+bool CFirmwareReportCommand::ParseInterface(const std::string& name_I, EINTERFACE_TYPE& interface_O) {
   const std::string name = StringUtilities::ToLower_Copy(name_I);
   if (name == "hid")
     interface_O = EHID_INTERFACE;
@@ -193,7 +193,7 @@ bool CInspectCommand::ParseInterface(const std::string& name_I, EINTERFACE_TYPE&
   return true;
 }
 
-int CInspectCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
+int CFirmwareReportCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
   if (!mInterfaceName.empty() && !ParseInterface(mInterfaceName, mInterface)) {
     std::fprintf(err_IO, "unknown interface %s: use hid, bulk, i2c or ftdi\n",
                  mInterfaceName.c_str());
@@ -221,7 +221,7 @@ int CInspectCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
 // of its lines: a file is loaded unobserved, and only a failed load is read
 // once more with a listener to learn why. A file of no known format is not
 // read at all, so it is observed at once, and its assertion is raised once.
-bool CInspectCommand::Load(CSRec& source_IO, std::string& reason_O) const {
+bool CFirmwareReportCommand::Load(CSRec& source_IO, std::string& reason_O) const {
   if (CSRec::FormatFor(mFile, mInterface) != EDS_UNKNOWN && source_IO.Load(mFile, mInterface)) {
     return true;
   }
@@ -231,7 +231,7 @@ bool CInspectCommand::Load(CSRec& source_IO, std::string& reason_O) const {
   return false;
 }
 
-void CInspectCommand::PrintText(const CSRec& source_I, std::FILE* out_IO) const {
+void CFirmwareReportCommand::PrintText(const CSRec& source_I, std::FILE* out_IO) const {
   const EDataSourceFormat format = source_I.GetDataSourceFormat();
   std::fprintf(out_IO, "File: %s\n", mFile.c_str());
   std::fprintf(out_IO, "Format: %s (%s)\n", TextOf(format).name, TextOf(format).description);
@@ -273,7 +273,7 @@ void CInspectCommand::PrintText(const CSRec& source_I, std::FILE* out_IO) const 
   }
 }
 
-void CInspectCommand::PrintJson(const CSRec& source_I, std::FILE* out_IO) const {
+void CFirmwareReportCommand::PrintJson(const CSRec& source_I, std::FILE* out_IO) const {
   const EDataSourceFormat format = source_I.GetDataSourceFormat();
   std::string json = "{\"file\":" + JsonString(mFile) + ",\"format\":\"" + TextOf(format).name +
                      "\",\"formatValue\":" + std::to_string(format) +
@@ -314,7 +314,7 @@ void CInspectCommand::PrintJson(const CSRec& source_I, std::FILE* out_IO) const 
 
 // S-record blocks are laid out from the lowest start with gaps erased to
 // 0xFF; the other formats are written as their reader holds them.
-bool CInspectCommand::WriteImage(const CSRec& source_I, std::string& reason_O) const {
+bool CFirmwareReportCommand::WriteImage(const CSRec& source_I, std::string& reason_O) const {
   CImageWriter writer(mOutputBinary);
   const EDataSourceFormat format = source_I.GetDataSourceFormat();
   if (IsSRecord(format)) {
