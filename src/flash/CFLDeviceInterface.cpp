@@ -137,6 +137,19 @@ std::string CFLDeviceInterface::PathFromInfo(const DeviceInfo& info_I) {
          Dec(info_I.usage) + ":" + Dec(info_I.usagePage);
 }
 
+void CFLDeviceInterface::SetIdentity(const DeviceInfo& info_I) {
+  mVendorId = info_I.vendorId;
+  mProductId = info_I.productId;
+  mLocationId = info_I.locationId;
+  mUsageId = info_I.usage;
+  mUsagePage = info_I.usagePage;
+  mPath = PathFromInfo(info_I);
+}
+
+DeviceInfo CFLDeviceInterface::RebuildInfo() const {
+  return DeviceInfo{mVendorId, mProductId, mLocationId, mUsageId, mUsagePage};
+}
+
 void CFLDeviceInterface::ReportLog(const std::string& text_I) {
   if (mNotifier != nullptr) {
     mNotifier->InterfaceLog(text_I);

@@ -152,6 +152,10 @@ class CFLDeviceInterface {
   // The interface path of a DeviceInfo: its five numbers in decimal,
   // joined by ":".
   static std::string PathFromInfo(const DeviceInfo& info_I);
+  // The interface's identity: kept in its five fields, with the path made
+  // from them; RebuildInfo gives it back as one DeviceInfo.
+  void SetIdentity(const DeviceInfo& info_I);
+  DeviceInfo RebuildInfo() const;
 
   void ReportLog(const std::string& text_I);
   void ReportError(const std::string& text_I);

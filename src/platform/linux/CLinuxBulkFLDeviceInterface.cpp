@@ -10,19 +10,10 @@
 CLinuxBulkFLDeviceInterface::CLinuxBulkFLDeviceInterface(const DeviceInfo& info_I,
                                                          std::unique_ptr<CUsbControl> usb_I)
     : CBulkFLDeviceInterface(), mUsb(std::move(usb_I)) {
-  mVendorId = info_I.vendorId;
-  mProductId = info_I.productId;
-  mLocationId = info_I.locationId;
-  mUsageId = info_I.usage;
-  mUsagePage = info_I.usagePage;
-  mPath = PathFromInfo(info_I);
+  SetIdentity(info_I);
 }
 
 CLinuxBulkFLDeviceInterface::~CLinuxBulkFLDeviceInterface() { Close(); }
-
-DeviceInfo CLinuxBulkFLDeviceInterface::RebuildInfo() const {
-  return DeviceInfo{mVendorId, mProductId, mLocationId, mUsageId, mUsagePage};
-}
 
 // The boards of one product share a USB ancestor: `topology_I` says how many
 // levels up it is, so equal texts mean one product.

@@ -29,7 +29,6 @@ class CLinuxBulkFLDeviceInterface : public virtual CBulkFLDeviceInterface {
                      uint16_t length_I, size_t bufferSize_I) override;
 
  private:
-  DeviceInfo RebuildInfo() const;
   bool OpenInterface();
   bool VectorRequest(const std::vector<uint8_t>& data_I);
 

@@ -9,19 +9,10 @@
 CLinuxHIDFLDeviceInterface::CLinuxHIDFLDeviceInterface(const DeviceInfo& info_I,
                                                        std::unique_ptr<CHidNode> node_I)
     : CHIDFLDeviceInterface(), mNode(std::move(node_I)) {
-  mVendorId = info_I.vendorId;
-  mProductId = info_I.productId;
-  mLocationId = info_I.locationId;
-  mUsageId = info_I.usage;
-  mUsagePage = info_I.usagePage;
-  mPath = PathFromInfo(info_I);
+  SetIdentity(info_I);
 }
 
 CLinuxHIDFLDeviceInterface::~CLinuxHIDFLDeviceInterface() { Close(); }
-
-DeviceInfo CLinuxHIDFLDeviceInterface::RebuildInfo() const {
-  return DeviceInfo{mVendorId, mProductId, mLocationId, mUsageId, mUsagePage};
-}
 
 bool CLinuxHIDFLDeviceInterface::Open() {
   const DeviceInfo info = RebuildInfo();

@@ -29,7 +29,6 @@ class CLinuxHIDFLDeviceInterface : public virtual CHIDFLDeviceInterface {
   bool Query() { return true; }
 
  private:
-  DeviceInfo RebuildInfo() const;
   bool OpenInterface(const DeviceInfo& info_I);
 
   std::unique_ptr<CHidNode> mNode;

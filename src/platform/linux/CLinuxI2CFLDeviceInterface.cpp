@@ -9,19 +9,10 @@
 CLinuxI2CFLDeviceInterface::CLinuxI2CFLDeviceInterface(const DeviceInfo& info_I,
                                                        std::unique_ptr<CHidNode> node_I)
     : CI2CFLDeviceInterface(), mNode(std::move(node_I)) {
-  mVendorId = info_I.vendorId;
-  mProductId = info_I.productId;
-  mLocationId = info_I.locationId;
-  mUsageId = info_I.usage;
-  mUsagePage = info_I.usagePage;
-  mPath = PathFromInfo(info_I);
+  SetIdentity(info_I);
 }
 
 CLinuxI2CFLDeviceInterface::~CLinuxI2CFLDeviceInterface() { Close(); }
-
-DeviceInfo CLinuxI2CFLDeviceInterface::RebuildInfo() const {
-  return DeviceInfo{mVendorId, mProductId, mLocationId, mUsageId, mUsagePage};
-}
 
 // The boards of one product share a USB ancestor: `topology_I` says how many
 // levels up it is, so equal texts mean one product.

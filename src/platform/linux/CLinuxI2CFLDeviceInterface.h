@@ -24,7 +24,6 @@ class CLinuxI2CFLDeviceInterface : public virtual CI2CFLDeviceInterface {
   bool Query() { return true; }
 
  private:
-  DeviceInfo RebuildInfo() const;
 
   std::unique_ptr<CHidNode> mNode;
 };
