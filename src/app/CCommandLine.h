@@ -7,7 +7,8 @@
 
 class CCommandLine {
  public:
-  // Returns false with an error text when an option is malformed.
+  // Returns false with a one-line error text for an unknown option, a stray
+  // word, a missing or malformed value, or options that do not go together.
   bool Parse(const std::vector<std::string>& arguments_I);
 
   bool GetHelp() const { return mHelp; }
@@ -34,12 +35,19 @@ class CCommandLine {
   bool GetLabFast() const { return mLabFast; }
   // The product after --lab; empty for the default one.
   const std::string& GetLabName() const { return mLabName; }
-  // What is left for the updater, in order.
+  // "--lab list": name the lab's products and stop.
+  bool GetLabListRequested() const;
+  // -p, -t, -b, -s and -f with their values, in order, for the updater.
   const std::vector<std::string>& GetUpdaterArguments() const { return mUpdaterArguments; }
+  bool HasBoardOption() const;
 
   static std::string HelpText();
 
  private:
+  bool Fail(const std::string& text_I);
+  bool Take(const std::string& name_I, const std::string& value_I, bool given_I);
+  bool CheckCombinations();
+
   bool mHelp = false;
   bool mVersion = false;
   bool mVerbose = false;

@@ -1,6 +1,11 @@
 #include "app/CUpdateCommand.h"
 
+#include <unistd.h>
+
+#include <cerrno>
 #include <cstdio>
+#include <cstring>
+#include <filesystem>
 
 #include "app/CRunSeams.h"
 #include "app/CUpdaterRun.h"
@@ -12,6 +17,25 @@
 #include "lab/CLabSession.h"
 #include "platform/linux/CLinuxDesktop.h"
 #include "platform/linux/CLinuxPowerInhibitor.h"
+#include "update/CApplicationDelegate.h"
+
+namespace {
+
+bool LabStateFolderWritable(const std::string& folder_I, std::string& error_O) {
+  std::error_code code;
+  std::filesystem::create_directories(folder_I, code);
+  if (code) {
+    error_O = code.message();
+    return false;
+  }
+  if (access(folder_I.c_str(), W_OK | X_OK) != 0) {
+    error_O = std::strerror(errno);
+    return false;
+  }
+  return true;
+}
+
+}  // namespace
 
 int CUpdateCommand::Run() {
   std::string error;
@@ -20,11 +44,17 @@ int CUpdateCommand::Run() {
     if (!labOptions.AddFault(fault, error)) {
       std::fprintf(stderr, "%s: --lab-fault %s: %s\n", TAV_PROGRAM_NAME, fault.c_str(),
                    error.c_str());
-      return 1;
+      return ERUN_USAGE;
     }
   }
   labOptions.SetStateFolder(mCommandLine.GetLabState());
   labOptions.SetFast(mCommandLine.GetLabFast());
+  // Found out now, not after an update whose result could not be kept.
+  if (mCommandLine.GetLab() && !LabStateFolderWritable(labOptions.GetStateFolder(), error)) {
+    std::fprintf(stderr, "%s: --lab-state %s: %s\n", TAV_PROGRAM_NAME,
+                 labOptions.GetStateFolder().c_str(), error.c_str());
+    return ERUN_FAILED;
+  }
 
   std::unique_ptr<CRunSeams> seams =
       mCommandLine.GetLab()
@@ -32,7 +62,7 @@ int CUpdateCommand::Run() {
           : CRunSeams::MakeLinux();
   if (!seams) {
     std::fprintf(stderr, "%s: %s\n", TAV_PROGRAM_NAME, error.c_str());
-    return 1;
+    return ERUN_USAGE;
   }
 
   // A lab run starts from the state the last one left and gives it back at
@@ -58,8 +88,11 @@ int CUpdateCommand::Run() {
   runSeams.installedDataFolder = LinuxPaths::GetInstalledDataFolderPath();
 
   SRunOptions options;
-  options.processArguments = mProcessArguments;
-  options.headless = mCommandLine.GetHeadless();
+  // The updater sees the board options alone, as the program was given them.
+  options.processArguments.push_back(mProgramPath);
+  for (const std::string& argument : mCommandLine.GetUpdaterArguments()) {
+    options.processArguments.push_back(argument);
+  }
   options.assumeYes = mCommandLine.GetYes();
   CLabSession* sessionToFinish = session.get();
   options.beforeExit = [sessionToFinish] {

@@ -9,13 +9,13 @@
 
 class CUpdateCommand {
  public:
-  CUpdateCommand(const CCommandLine& commandLine_I, std::vector<std::string> processArguments_I)
-      : mCommandLine(commandLine_I), mProcessArguments(std::move(processArguments_I)) {}
+  CUpdateCommand(const CCommandLine& commandLine_I, std::string programPath_I)
+      : mCommandLine(commandLine_I), mProgramPath(std::move(programPath_I)) {}
   // Ends the process itself once the run is over; returns only on a set-up
   // error, with the status to exit with.
   int Run();
 
  private:
   const CCommandLine& mCommandLine;
-  std::vector<std::string> mProcessArguments;
+  std::string mProgramPath;
 };

@@ -3,6 +3,7 @@
 #include <cstdio>
 #include <cstdlib>
 
+#include "app/TavVersion.h"
 #include "common/CMainThreadLoop.h"
 #include "common/LinuxPaths.h"
 #include "host/CLanguageManager.h"
@@ -13,6 +14,8 @@
 int CUpdaterRun::Run(SRunSeams seams_I, SRunOptions options_I) {
   // Made on the main thread before any other starts: it sets the locale.
   CLanguageManager::SharedInstance();
+  int status = 0;
+  SApplicationSetup app;
 
   CMainThreadLoop mainLoop;
   mainLoop.RegisterMainThread();
@@ -23,7 +26,26 @@ int CUpdaterRun::Run(SRunSeams seams_I, SRunOptions options_I) {
     window.PostToMainLoop([&mainLoop] { mainLoop.RunPending(); });
   });
 
+  app.window = &window;
+  app.desktop = seams_I.desktop;
+  app.terminal = options_I.terminal;
+  app.printResult = [&window](const std::string& line_I) { window.PrintLine(stdout, line_I); };
+  app.printError = [&window](const std::string& line_I) {
+    window.PrintLine(stderr, std::string(TAV_PROGRAM_NAME) + ": " + line_I);
+  };
+  app.exitProcess = [&options_I, &status](int status_I) {
+    status = status_I;
+    if (options_I.beforeExit) options_I.beforeExit();
+    std::fflush(nullptr);
+    // The device and update threads may still be inside a wait: the process
+    // ends here without unwinding them, as the platform's terminate does.
+    std::_Exit(status_I);
+  };
+  // Made before the updater: the updater asks it how the run was launched.
+  FLAppDelegate delegate(app);
+
   SUpdaterSetup setup;
+  setup.delegate = &delegate;
   setup.makeDiscovery = seams_I.makeDiscovery;
   setup.registry = seams_I.registry;
   setup.power = seams_I.power;
@@ -33,22 +55,6 @@ int CUpdaterRun::Run(SRunSeams seams_I, SRunOptions options_I) {
   setup.installedDataFolder = seams_I.installedDataFolder;
   OFLUpdater::Configure(std::move(setup));
 
-  int status = 0;
-  SApplicationSetup app;
-  app.window = &window;
-  app.desktop = seams_I.desktop;
-  app.headless = options_I.headless;
-  app.printResult = [](const std::string& line_I) { std::printf("%s\n", line_I.c_str()); };
-  app.exitProcess = [&options_I, &status](int status_I) {
-    status = status_I;
-    if (options_I.beforeExit) options_I.beforeExit();
-    std::fflush(nullptr);
-    // The device and update threads may still be inside a wait: the process
-    // ends here without unwinding them, as the platform's terminate does.
-    std::_Exit(status_I);
-  };
-
-  FLAppDelegate delegate(app);
   delegate.applicationDidFinishLaunching();
   window.RunMainLoop();
   return status;

@@ -25,7 +25,9 @@ struct SRunSeams {
 
 struct SRunOptions {
   std::vector<std::string> processArguments;  // program name first
-  bool headless = false;
+  // Reports per board and ends with the outcome as its status. Every run is
+  // one until the program has a window.
+  bool terminal = true;
   bool assumeYes = false;
   // Runs just before the process ends (a lab run saves its boards here).
   std::function<void()> beforeExit;

@@ -9,13 +9,17 @@
 #include "app/CUpdateCommand.h"
 #include "app/TavVersion.h"
 #include "common/TavLog.h"
+#include "host/CLanguageManager.h"
+#include "update/CApplicationDelegate.h"
 
 int main(int argc, char** argv) {
+  // Made on the main thread before any other starts: it sets the locale.
+  CLanguageManager::SharedInstance();
+
   CCommandLine commandLine;
   if (!commandLine.Parse(std::vector<std::string>(argv + 1, argv + argc))) {
     std::fprintf(stderr, "%s: %s\n", TAV_PROGRAM_NAME, commandLine.GetError().c_str());
-    std::fputs(CCommandLine::HelpText().c_str(), stderr);
-    return 1;
+    return ERUN_USAGE;
   }
   if (commandLine.GetHelp()) {
     std::fputs(CCommandLine::HelpText().c_str(), stdout);
@@ -25,11 +29,20 @@ int main(int argc, char** argv) {
     std::printf("%s %s\n", TAV_PROGRAM_NAME, TAV_PROGRAM_VERSION);
     return 0;
   }
+  if (commandLine.GetLabListRequested() && !commandLine.GetList()) {
+    if (commandLine.HasBoardOption()) {
+      std::fprintf(stderr, "%s: --lab list names the lab's products; give a product name to update\n",
+                   TAV_PROGRAM_NAME);
+      return ERUN_USAGE;
+    }
+    CListCommand::PrintLabProducts(stdout);
+    return 0;
+  }
 
   CLogOutputs logOutputs;
   if (commandLine.GetVerbose()) logOutputs.AttachStandardError();
   if (!commandLine.GetLogFile().empty() && !logOutputs.AttachFile(commandLine.GetLogFile())) {
-    std::fprintf(stderr, "%s: cannot open log file %s\n", TAV_PROGRAM_NAME,
+    std::fprintf(stderr, "%s: cannot open the log file %s\n", TAV_PROGRAM_NAME,
                  commandLine.GetLogFile().c_str());
     return 1;
   }
@@ -37,5 +50,5 @@ int main(int argc, char** argv) {
     return CFirmwareReportCommand(commandLine).Run(stdout, stderr);
   if (commandLine.GetList()) return CListCommand(commandLine).Run(stdout, stderr);
   TavLog::Info("%s %s starting\n", TAV_PROGRAM_NAME, TAV_PROGRAM_VERSION);
-  return CUpdateCommand(commandLine, std::vector<std::string>(argv, argv + argc)).Run();
+  return CUpdateCommand(commandLine, argc > 0 ? argv[0] : TAV_PROGRAM_NAME).Run();
 }

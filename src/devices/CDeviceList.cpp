@@ -1,8 +1,8 @@
 #include "devices/CDeviceList.h"
 
-#include <cstdio>
 
 #include "common/StringUtilities.h"
+#include "common/TavLog.h"
 #include "flash/CFLDeviceInterface.h"
 
 namespace {
@@ -14,7 +14,8 @@ bool PathMatches(const CDevice::InterfacePtr& interface_I, const char* board_I,
                  const std::string& wanted_I) {
   if (!interface_I) return false;
   const std::string path = interface_I->GetPath();
-  std::printf("%s GetDevice %s to %s\n", board_I, wanted_I.c_str(), path.c_str());
+  // For the log only: a run tells the user once when a path matches nothing.
+  TavLog::Debug("%s GetDevice %s to %s\n", board_I, wanted_I.c_str(), path.c_str());
   return StringUtilities::IEquals(wanted_I, path);
 }
 

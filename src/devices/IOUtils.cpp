@@ -69,12 +69,45 @@ bool CompareDeviceInfo(const DeviceInfo& a_I, const DeviceInfo& b_I, uint32_t ma
   return true;
 }
 
-bool IsAcceptedEntry(const SHidEntry& entry_I) {
-  if (entry_I.info.vendorId == kFamilyVendorId && entry_I.info.productId == kGuardedProductId) {
-    return entry_I.parentUsbVendorId == kFamilyVendorId &&
-           entry_I.parentUsbProductId == kGuardingParentProductId;
+namespace {
+
+bool IsAcceptedIdentity(uint32_t vendorId_I, uint32_t productId_I, uint32_t parentVendorId_I,
+                        uint32_t parentProductId_I) {
+  if (vendorId_I == kFamilyVendorId && productId_I == kGuardedProductId) {
+    return parentVendorId_I == kFamilyVendorId && parentProductId_I == kGuardingParentProductId;
   }
   return true;
+}
+
+}  // namespace
+
+bool IsAcceptedEntry(const SHidEntry& entry_I) {
+  return IsAcceptedIdentity(entry_I.info.vendorId, entry_I.info.productId,
+                            entry_I.parentUsbVendorId, entry_I.parentUsbProductId);
+}
+
+bool IsAcceptedEntry(const SUsbEntry& entry_I) {
+  return IsAcceptedIdentity(entry_I.vendorId, entry_I.productId, entry_I.parentUsbVendorId,
+                            entry_I.parentUsbProductId);
+}
+
+bool FindReleaseNumber(CDeviceRegistry& registry_I, const std::string& path_I,
+                       uint16_t& release_O) {
+  DeviceInfo info;
+  if (!DeviceInfoFromPath(path_I, info)) return false;
+  for (const SHidEntry& entry : registry_I.ListHidInterfaces(info.vendorId)) {
+    if (entry.info == info) {
+      release_O = entry.version;
+      return true;
+    }
+  }
+  for (const SUsbEntry& entry : registry_I.ListUsbDevices(info.vendorId)) {
+    if (entry.productId == info.productId && entry.locationId == info.locationId) {
+      release_O = entry.version;
+      return true;
+    }
+  }
+  return false;
 }
 
 std::vector<DeviceInfo> FindMatchedDevices(CDeviceRegistry& registry_I,
@@ -111,6 +144,7 @@ std::vector<DeviceInfo> FindMatchedDevicesMultiple(CDeviceRegistry& registry_I,
 std::vector<DeviceInfo> FindUsbDevices(CDeviceRegistry& registry_I, uint32_t vendorId_I) {
   std::vector<DeviceInfo> found;
   for (const SUsbEntry& entry : registry_I.ListUsbDevices(vendorId_I)) {
+    if (!IsAcceptedEntry(entry)) continue;
     found.push_back(DeviceInfo{entry.vendorId, entry.productId, entry.locationId, 0, 0});
   }
   return found;

@@ -34,6 +34,11 @@ bool CompareDeviceInfo(const DeviceInfo& a_I, const DeviceInfo& b_I, uint32_t ma
 // 0xFA of the vendor counts only behind its 0xF9 parent, and is dropped
 // otherwise.
 bool IsAcceptedEntry(const SHidEntry& entry_I);
+bool IsAcceptedEntry(const SUsbEntry& entry_I);
+
+// The release number (bcdDevice) of the USB device behind an interface
+// path, as the registry lists it; false when it is not attached.
+bool FindReleaseNumber(CDeviceRegistry& registry_I, const std::string& path_I, uint16_t& release_O);
 
 // Every attached HID identity whose vendor id matches `criterion_I`, and
 // the further fields selected by `mask_I` (vendor is always compared).
@@ -50,6 +55,7 @@ std::vector<DeviceInfo> FindMatchedDevicesMultiple(CDeviceRegistry& registry_I,
 
 // Every attached USB device of `vendorId_I` as an identity with usage and
 // usage page 0: how a vendor-class interface, which has no HID node, is found.
+// The guarded product counts only behind its parent, as in the HID search.
 std::vector<DeviceInfo> FindUsbDevices(CDeviceRegistry& registry_I, uint32_t vendorId_I);
 
 // The location id of the USB device `levels_I` steps up the tree from the

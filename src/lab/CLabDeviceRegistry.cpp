@@ -40,8 +40,12 @@ std::vector<SUsbEntry> CLabDeviceRegistry::ListUsbDevices(uint32_t vendorId_I) {
       return entry.locationId == interface.info.locationId;
     });
     if (known) continue;
-    devices.push_back({interface.info.vendorId, interface.info.productId, interface.info.locationId,
-                       interface.release});
+    SUsbEntry entry;
+    entry.vendorId = interface.info.vendorId;
+    entry.productId = interface.info.productId;
+    entry.locationId = interface.info.locationId;
+    entry.version = interface.release;
+    devices.push_back(entry);
   }
   return devices;
 }

@@ -6,7 +6,9 @@
 
 #include "update/UpdateTypes.h"
 
-// Why a run ends. A headless run exits with this number; a window run
+struct SBoardResult;
+
+// Why a run ends. A terminal run exits with this number; a window run
 // exits with 0 whatever it was.
 enum ERunOutcome : int {
   ERUN_SUCCESS = 0,
@@ -14,6 +16,7 @@ enum ERunOutcome : int {
   ERUN_NO_DEVICE = 2,     // no supported tablet, or it went away
   ERUN_REFUSED_FILE = 3,  // the firmware file was not accepted
   ERUN_DECLINED = 4,      // the user said no
+  ERUN_USAGE = 64,        // nothing to update, or an option without its value
 };
 
 class CApplicationDelegate {
@@ -30,4 +33,8 @@ class CApplicationDelegate {
   virtual void terminate(ERunOutcome outcome_I) = 0;
   // The update thread has gone through a non-empty list of updates.
   virtual void updatesFinished() {}
+  // A board is about to be updated: which, from which file, at which version.
+  virtual void boardStarting(const SBoardResult& /*board_I*/) {}
+  // A remark for the user that is no dialog (a path that matched nothing).
+  virtual void notice(const std::string& /*text_I*/) {}
 };

@@ -329,6 +329,9 @@ CUpdateController::InterfacePtr CUpdateController::GetLoaderMode() {
     CallbackLog(std::string("Switching ") + word + " to Loader mode... ");
     ProcessStateChange(ESTATE_WAIT_LOADER);
 
+    // An interface is opened before it is switched: a vendor-class one takes
+    // requests only once its interface is claimed; HID and I2C open anyway.
+    if (!active->Open()) CallbackLog("Could not open the interface before the switch");
     if (!active->SwitchToBLMode()) {
       if (active->GetInterfaceType() == EI2C_INTERFACE) {
         CallbackError(EERROR_PROGRAM, "I2C Device failed to switch to Loader mode");

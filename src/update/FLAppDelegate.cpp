@@ -4,7 +4,10 @@
 
 #include <cmath>
 
+#include <stdexcept>
+
 #include "common/CClock.h"
+#include "common/StringUtilities.h"
 #include "common/TavLog.h"
 #include "devices/CDevice.h"
 #include "flash/CFLDeviceInterface.h"
@@ -33,8 +36,21 @@ const char* OutcomeText(ERunOutcome outcome_I) {
     case ERUN_NO_DEVICE: return "Result: no supported tablet is connected.";
     case ERUN_REFUSED_FILE: return "Result: the firmware file was refused.";
     case ERUN_DECLINED: return "Result: nothing was updated.";
+    case ERUN_USAGE: return "Result: nothing was updated.";
   }
   return "Result: the update failed.";
+}
+
+const char* BoardName(const std::string& kind_I) {
+  if (kind_I == "pen") return "pen controller";
+  if (kind_I == "touch") return "touch controller";
+  if (kind_I == "bluetooth") return "Bluetooth module";
+  return "display scalar";
+}
+
+// A release number as the device gives it: 0x0120 is "1.20".
+std::string VersionText(uint32_t version_I) {
+  return StringUtilities::Format("%x.%02x", (version_I >> 8) & 0xFF, version_I & 0xFF);
 }
 
 }  // namespace
@@ -71,6 +87,8 @@ void FLAppDelegate::applicationDidFinishLaunching() {
     return;
   }
 
+  if (mSetup.terminal && !CheckTerminalArguments()) return;
+
   if (std::shared_ptr<OUpdaterClient> client = OUpdaterClient::client()) client->connectToService();
 
   TavLog::Info("Stopping driver\n");
@@ -79,7 +97,10 @@ void FLAppDelegate::applicationDidFinishLaunching() {
   mUpdater = OFLUpdater::updater();
   mUpdater->setAppDelegate(this);
   if (!mUpdater->setupUpdate()) {
-    if (!mTerminated) {
+    if (!mTerminated && mUpdater->watchFailed()) {
+      if (mSetup.terminal) notice(T("Could not secure USB for Firmware Updater."));
+      terminate(ERUN_FAILED);
+    } else if (!mTerminated) {
       notifyDialog(T("Error: No supported tablet is connected. Please connect a tablet."));
       terminate(ERUN_NO_DEVICE);
     }
@@ -124,6 +145,30 @@ void FLAppDelegate::presentDialog() {
   if (device->GetBluetoothInterface()) boards.push_back("Bluetooth");
   if (device->GetScalarSupported()) boards.push_back("Scalar");
   mWindowController->setBoardArray(boards);
+}
+
+bool FLAppDelegate::CheckTerminalArguments() {
+  OFLUpdater* updater = OFLUpdater::updater();
+  std::vector<OFLUpdater::UpdateEntry> entries;
+  try {
+    entries = OFLUpdater::parseArguments(updater->getArgs());
+  } catch (const std::out_of_range&) {
+    ExitBeforeStart(T("An option at the end of the arguments has no value."), ERUN_USAGE);
+    return false;
+  }
+  if (entries.empty()) {
+    ExitBeforeStart(T("No board to update: give -p, -t, -b or -s with an interface path from "
+                      "--list, or \"\" for the board found (see --help)."),
+                    ERUN_USAGE);
+    return false;
+  }
+  return true;
+}
+
+void FLAppDelegate::ExitBeforeStart(const std::string& error_I, int status_I) {
+  mTerminated = true;
+  if (mSetup.printError) mSetup.printError(error_I);
+  if (mSetup.exitProcess) mSetup.exitProcess(status_I);
 }
 
 bool FLAppDelegate::confirmProgram() {
@@ -212,7 +257,12 @@ void FLAppDelegate::doStateMachine(ECONTROLLER_STATE state_I) {
       // Blocks the main thread, and the reporting thread with it, while the
       // green text is on show.
       TavSleep(kSuccessShowSeconds);
-      notifyDialog(T("Firmware was successfully updated."));
+      // The last board's success says nothing of an earlier board that was
+      // not updated: the dialog does not claim more than happened.
+      notifyDialog(mUpdater != nullptr &&
+                           mUpdater->boardResults().Outcome(ERUN_SUCCESS) != ERUN_SUCCESS
+                       ? T("The last board was updated, but not every board was.")
+                       : T("Firmware was successfully updated."));
       with([](CWindowController& w) { w.enableClose(true); });
       terminate(ERUN_SUCCESS);
       return;
@@ -309,14 +359,69 @@ void FLAppDelegate::applicationWillTerminate() {
 }
 
 void FLAppDelegate::updatesFinished() {
-  if (mSetup.headless && !mTerminated) terminate(ERUN_FAILED);
+  if (mSetup.terminal && !mTerminated) terminate(ERUN_SUCCESS);
+}
+
+void FLAppDelegate::boardStarting(const SBoardResult& board_I) {
+  if (!mSetup.terminal || !mSetup.printResult) return;
+  std::string line = StringUtilities::Format(T("Updating the %s of %s").c_str(),
+                                             T(BoardName(board_I.kind)).c_str(),
+                                             board_I.product.c_str());
+  if (!board_I.path.empty()) line += " (" + board_I.path + ")";
+  if (board_I.versionKnown) {
+    line += StringUtilities::Format(T(", version %s found").c_str(),
+                                    VersionText(board_I.versionBefore).c_str());
+  }
+  if (!board_I.file.empty()) {
+    line += StringUtilities::Format(T(", from %s").c_str(), board_I.file.c_str());
+  }
+  mSetup.printResult(line + ".");
+}
+
+void FLAppDelegate::notice(const std::string& text_I) {
+  if (mSetup.terminal && mSetup.printError) mSetup.printError(text_I);
+}
+
+void FLAppDelegate::PrintBoardResults() {
+  if (mUpdater == nullptr || !mSetup.printResult) return;
+  const std::vector<SBoardResult> results = mUpdater->boardResults().Get();
+  bool reached = false;
+  for (const SBoardResult& result : results) reached |= result.outcome != EBOARD_NOT_REACHED;
+  if (!reached) return;
+  mUpdater->refreshVersionsAfter();
+  for (const SBoardResult& result : mUpdater->boardResults().Get()) {
+    std::string board = T(BoardName(result.kind));
+    if (!result.product.empty()) {
+      board = StringUtilities::Format(T("%s of %s").c_str(), board.c_str(), result.product.c_str());
+    }
+    std::string what;
+    switch (result.outcome) {
+      case EBOARD_UPDATED:
+        what = result.versionKnown && result.versionAfterKnown
+                   ? StringUtilities::Format(T("updated from version %s to %s").c_str(),
+                                             VersionText(result.versionBefore).c_str(),
+                                             VersionText(result.versionAfter).c_str())
+                   : T("updated");
+        break;
+      case EBOARD_FAILED: what = T("failed") + ": " + result.reason; break;
+      case EBOARD_NOT_FOUND: what = T("not found") + ": " + result.reason; break;
+      case EBOARD_FILE_REFUSED: what = T("firmware file refused") + ": " + result.reason; break;
+      default: what = T("not updated: the run ended before it"); break;
+    }
+    mSetup.printResult("  " + board + ": " + what);
+  }
 }
 
 void FLAppDelegate::terminate(ERunOutcome outcome_I) {
   if (mTerminated) return;
   mTerminated = true;
   applicationWillTerminate();
-  if (mSetup.headless && mSetup.printResult) mSetup.printResult(T(OutcomeText(outcome_I)));
-  const int status = mSetup.headless ? static_cast<int>(outcome_I) : 0;
+  ERunOutcome outcome = outcome_I;
+  if (mSetup.terminal) {
+    if (mUpdater != nullptr) outcome = mUpdater->boardResults().Outcome(outcome_I);
+    PrintBoardResults();
+    if (mSetup.printResult) mSetup.printResult(T(OutcomeText(outcome)));
+  }
+  const int status = mSetup.terminal ? static_cast<int>(outcome) : 0;
   if (mSetup.exitProcess) mSetup.exitProcess(status);
 }

@@ -20,13 +20,15 @@ class OFLUpdater;
 struct SApplicationSetup {
   CWindowController* window = nullptr;  // borrowed; made on the main thread
   std::shared_ptr<CDesktop> desktop;
-  // A headless run ends with the outcome as its exit status and prints a
-  // one-line result; a window run always exits with 0.
-  bool headless = false;
+  // A run in the terminal says what became of each board, ends with the
+  // outcome as its exit status, and refuses to start without a board to
+  // update; a window run always exits with 0.
+  bool terminal = false;
   // Ends the process. The program's form does not return.
   std::function<void(int status_I)> exitProcess;
-  // Where the one-line result of a headless run goes.
+  // Where a terminal run's report lines go, and its remarks and errors.
   std::function<void(const std::string& line_I)> printResult;
+  std::function<void(const std::string& line_I)> printError;
 };
 
 class FLAppDelegate : public CApplicationDelegate {
@@ -54,10 +56,12 @@ class FLAppDelegate : public CApplicationDelegate {
   static void stopDriver(CDesktop& desktop_I);
   static void startDriver(CDesktop& desktop_I);
 
-  // A headless run whose updates all ran without a state that ended the
-  // process (a loader that never came back) ends as a failure; a window
-  // run stays up as it is.
+  // A terminal run whose updates all ran without a state that ended the
+  // process (a loader that never came back) ends with what each board came
+  // to; a window run stays up as it is.
   void updatesFinished() override;
+  void boardStarting(const SBoardResult& board_I) override;
+  void notice(const std::string& text_I) override;
   bool HasTerminated() const { return mTerminated; }
 
   // The driver's applications, stopped at the start and started at the end.
@@ -67,6 +71,12 @@ class FLAppDelegate : public CApplicationDelegate {
  private:
   static OUpdaterClient::Request DriverRequest();
   void CheckLaunchSender();
+  // A terminal run with nothing to update ends before the driver is
+  // touched; false when it did.
+  bool CheckTerminalArguments();
+  void PrintBoardResults();
+  // Leaves without the terminate handler: nothing was taken yet.
+  void ExitBeforeStart(const std::string& error_I, int status_I);
 
   SApplicationSetup mSetup;
   CWindowController* mWindowController = nullptr;  // null until presentDialog

@@ -13,6 +13,8 @@
 #include "common/SystemState.h"
 #include "common/TavLog.h"
 #include "devices/IOUtils.h"
+#include "firmware/FirmwareFileCheck.h"
+#include "host/CLanguageManager.h"
 #include "settings/CSettingsArray.h"
 #include "settings/CSettingsMap.h"
 #include "settings/CSettingsString.h"
@@ -117,7 +119,8 @@ void OFLUpdater::DisposeInstance() {
   delete updater;
 }
 
-OFLUpdater::OFLUpdater(SUpdaterSetup setup_I) : mSetup(std::move(setup_I)) {
+OFLUpdater::OFLUpdater(SUpdaterSetup setup_I)
+    : mSetup(std::move(setup_I)), mDelegate(mSetup.delegate) {
   mUpdater = std::make_unique<CLinuxUpdateController>(mSetup.makeDiscovery());
   mNotifier = std::make_unique<CLinuxUpdateNotifier>(*this);
   SystemState::SetOSType();
@@ -273,8 +276,9 @@ bool OFLUpdater::setupUpdate() {
   }
   if (!listed) return false;
 
-  // No bound: only the end of the process (cleanup) stops this wait.
-  while (!mHIDManager && !mStopping) TavSleep(1.0);
+  // No bound: only the end of the process (cleanup) or a watch that could
+  // not be set up stops this wait.
+  while (!mHIDManager && !mStopping && !mWatchFailed) TavSleep(1.0);
   if (!mHIDManager) return false;
 
   mHIDMgrSemaphore->RequestSemaphore();
@@ -330,7 +334,9 @@ void OFLUpdater::runThreadDevice() {
   mHIDMgrSemaphore->RequestSemaphore();
   if (!mSetup.registry || !mSetup.registry->OpenWatch()) {
     TavLog::Error("Could not secure USB for Firmware Updater.");
-    Terminate(ERUN_FAILED);
+    // The main thread is still in setupUpdate, waiting for this watch: a
+    // dispatch to it would never run. It sees the flag and terminates.
+    mWatchFailed = true;
     mHIDMgrSemaphore->ReleaseSemaphore();
     return;
   }
@@ -370,39 +376,168 @@ void OFLUpdater::runThreadProgram() {
     mProgramFinished = true;
     return;
   }
-  for (const UpdateEntry& entry : mDeviceUpdates) {
-    const std::string& kind = entry.first;
-    const std::string& value = entry.second;
+  mResults.Reset(mDeviceUpdates);
+  for (size_t index = 0; index < mDeviceUpdates.size(); ++index) {
+    const std::string& kind = mDeviceUpdates[index].first;
+    const std::string& value = mDeviceUpdates[index].second;
+    mResults.Begin(index);
     setUpdateType(kind);
     ++mUpdateIndex;
-
-    if (!value.empty()) {
-      for (int attempt = 0; attempt < kSelectTries; ++attempt) {
-        if (mUpdater->SetSelectedDevice(value)) break;
-        TavSleep(1.0);
-      }
-    }
-
-    if (mUpdater->PenAutoUpdateExists() || mUpdater->TouchAutoUpdateExists() ||
-        mUpdater->BluetoothAutoUpdateExists() || mUpdater->ScalarAutoUpdateExists()) {
-      const std::string folder = JoinPath(FolderOf(mUpdater->getConfigPath()), "Firmware");
-      if (!mUpdater->SetAutoUpdateFile(kind, folder)) {
-        if (mDelegate != nullptr) {
-          OSUtils::DispatchOnMainThread([this] {
-            mDelegate->notifyDialog(
-                "Error: The specified file does not appear to be a valid firmware file.");
-          });
-        }
-        Terminate(ERUN_REFUSED_FILE);
-        mProgramFinished = true;
-        return;
-      }
+    if (!prepareEntry(kind, value)) {
+      if (mStopping) break;
+      continue;
     }
     runUpdateStep(value);
+    // A loader that never came ends the update without a state of its own.
+    mResults.Finish(EBOARD_FAILED, "the board did not reach its loader mode in time");
   }
   mProgramFinished = true;
-  if (mDelegate != nullptr && !mDeviceUpdates.empty()) {
+  if (mDelegate != nullptr && !mDeviceUpdates.empty() && !mStopping) {
     OSUtils::DispatchOnMainThread([this] { mDelegate->updatesFinished(); });
+  }
+}
+
+namespace {
+
+// The board of `kind_I` as the user reads it, and the device's interface
+// for it.
+const char* BoardName(const std::string& kind_I) {
+  if (kind_I == "pen") return "pen controller";
+  if (kind_I == "touch") return "touch controller";
+  if (kind_I == "bluetooth") return "Bluetooth module";
+  return "display scalar";
+}
+
+std::string UpdateNameOf(const CDevice& device_I, const std::string& kind_I) {
+  if (kind_I == "pen") return device_I.GetPenUpdate();
+  if (kind_I == "touch") return device_I.GetTouchUpdate();
+  if (kind_I == "bluetooth") return device_I.GetBluetoothUpdate();
+  return device_I.GetScalarUpdate();
+}
+
+}  // namespace
+
+bool OFLUpdater::prepareEntry(const std::string& kind_I, const std::string& value_I) {
+  if (!value_I.empty()) {
+    bool selected = false;
+    for (int attempt = 0; attempt < kSelectTries && !selected; ++attempt) {
+      selected = mUpdater->SetSelectedDevice(value_I);
+      if (!selected) TavSleep(1.0);
+    }
+    // The selection stays as it was; the board found is updated instead.
+    if (!selected && kind_I != "scalar") {
+      notice(StringUtilities::Format(
+          TTCLocalizedNSString("No attached board has the interface path %s; the %s found is "
+                               "updated instead.")
+              .c_str(),
+          value_I.c_str(), TTCLocalizedNSString(BoardName(kind_I)).c_str()));
+    }
+  }
+
+  const std::shared_ptr<CDevice> device = mUpdater->GetSelectedDevice();
+  const CDevice::InterfacePtr board = mUpdater->GetActiveInterface();
+  if (device) {
+    // The interface knows its release only once opened; the registry always.
+    uint16_t release = 0;
+    const bool known = board && mSetup.registry &&
+                       IOUtils::FindReleaseNumber(*mSetup.registry, board->GetPath(), release);
+    mResults.SetBoard(device->GetDeviceName(), board ? board->GetPath() : std::string(), known,
+                      release);
+  }
+
+  if (mUpdater->PenAutoUpdateExists() || mUpdater->TouchAutoUpdateExists() ||
+      mUpdater->BluetoothAutoUpdateExists() || mUpdater->ScalarAutoUpdateExists()) {
+    const std::string folder = JoinPath(FolderOf(mUpdater->getConfigPath()), "Firmware");
+    const std::string name = UpdateNameOf(*device, kind_I);
+    // A product without this board: said as such, then the run ends as it
+    // does for a file that is refused.
+    if (name.empty()) {
+      const std::string text = StringUtilities::Format(
+          TTCLocalizedNSString("Error: %s has no %s to update.").c_str(),
+          device->GetDeviceName().c_str(), TTCLocalizedNSString(BoardName(kind_I)).c_str());
+      mResults.Finish(EBOARD_NOT_FOUND, text);
+      if (mDelegate != nullptr) {
+        OSUtils::DispatchOnMainThread([this, text] { mDelegate->notifyDialog(text); });
+      }
+      Terminate(ERUN_NO_DEVICE);
+      mStopping = true;
+      return false;
+    }
+    const std::string file = JoinPath(folder, name);
+    const EINTERFACE_TYPE loadType =
+        kind_I == "scalar" ? device->GetScalarInterfaceType() : EHID_INTERFACE;
+    mResults.SetFile(file);
+    const bool keepAway = FirmwareFileCheck::KeepsReaderAway(file, loadType);
+    if (keepAway || !mUpdater->SetAutoUpdateFile(kind_I, folder)) {
+      std::string problem = FirmwareFileCheck::Problem(file, loadType);
+      if (problem.empty()) problem = "its content is not a valid firmware file";
+      TavLog::Error("Firmware file %s refused: %s\n", file.c_str(), problem.c_str());
+      mResults.Finish(EBOARD_FILE_REFUSED, file + ": " + problem);
+      if (mDelegate != nullptr) {
+        OSUtils::DispatchOnMainThread([this] {
+          mDelegate->notifyDialog(TTCLocalizedNSString(
+              "Error: The specified file does not appear to be a valid firmware file."));
+        });
+      }
+      Terminate(ERUN_REFUSED_FILE);
+      mStopping = true;
+      return false;
+    }
+  }
+
+  // Configured, but not attached: nothing to switch, nothing to program.
+  if (!device || (!board && mUpdater->GetUpdateType() != EUPDATE_SCALAR_FTDI)) {
+    mResults.Finish(EBOARD_NOT_FOUND,
+                    device ? StringUtilities::Format(
+                                 TTCLocalizedNSString("the %s of %s was not found").c_str(),
+                                 TTCLocalizedNSString(BoardName(kind_I)).c_str(),
+                                 device->GetDeviceName().c_str())
+                           : TTCLocalizedNSString("no supported tablet is connected"));
+    return false;
+  }
+  if (mDelegate != nullptr) {
+    const SBoardResult starting = mResults.GetCurrent();
+    OSUtils::DispatchOnMainThread([this, starting] { mDelegate->boardStarting(starting); });
+  }
+  return true;
+}
+
+void OFLUpdater::notice(const std::string& text_I) {
+  TavLog::Info("%s\n", text_I.c_str());
+  if (mDelegate == nullptr) return;
+  OSUtils::DispatchOnMainThread([this, text_I] { mDelegate->notice(text_I); });
+}
+
+void OFLUpdater::refreshVersionsAfter() {
+  const std::vector<SBoardResult> results = mResults.Get();
+  std::unique_ptr<CDiscovery> discovery;
+  for (size_t index = 0; index < results.size(); ++index) {
+    const SBoardResult& result = results[index];
+    DeviceInfo before;
+    if (result.outcome != EBOARD_UPDATED || !IOUtils::DeviceInfoFromPath(result.path, before)) {
+      continue;
+    }
+    if (!discovery) {
+      discovery = mSetup.makeDiscovery();
+      discovery->SetConfig(mUpdater->getConfigPath());
+      discovery->GenerateDeviceList();
+    }
+    // The board is back where it was plugged in, whatever id it shows.
+    const CDeviceList list = discovery->GetDeviceList();
+    for (unsigned int i = 0; const std::shared_ptr<CDevice> device = list.GetDevice(i); ++i) {
+      const CDevice::InterfacePtr board = result.kind == "pen"         ? device->GetPenInterface()
+                                          : result.kind == "touch"     ? device->GetTouchInterface()
+                                          : result.kind == "bluetooth" ? device->GetBluetoothInterface()
+                                                                       : device->GetScalarInterface();
+      DeviceInfo now;
+      uint16_t release = 0;
+      if (board && IOUtils::DeviceInfoFromPath(board->GetPath(), now) &&
+          now.locationId == before.locationId && mSetup.registry &&
+          IOUtils::FindReleaseNumber(*mSetup.registry, board->GetPath(), release)) {
+        mResults.SetVersionAfter(index, release);
+        break;
+      }
+    }
   }
 }
 
@@ -411,7 +546,10 @@ void OFLUpdater::runUpdateStep(const std::string& value_I) {
   // Held for the length of this update; released on every way out.
   std::unique_ptr<CPowerAssertion> assertion =
       mSetup.power->Create("Updating Tavik tablet firmware");
-  if (!assertion) return;
+  if (!assertion) {
+    mResults.Finish(EBOARD_FAILED, "the system would not stay awake for the update");
+    return;
+  }
 
   if (mUpdater->GetUpdateType() != EUPDATE_SCALAR_FTDI) {
     mUpdater->UpdateDevice();
@@ -421,10 +559,18 @@ void OFLUpdater::runUpdateStep(const std::string& value_I) {
   const std::string serial = parts.size() > 2 ? parts[2] : std::string();
   const unsigned char index =
       parts.size() > 3 ? static_cast<unsigned char>(std::atoi(parts[3].c_str())) : 0;
-  if (mSetup.updateScalar) mSetup.updateScalar(*mUpdater, serial, index);
+  if (mSetup.updateScalar) {
+    mSetup.updateScalar(*mUpdater, serial, index);
+  } else {
+    mResults.Finish(EBOARD_FAILED, "a scalar behind the display's bridge cannot be updated yet");
+  }
 }
 
 void OFLUpdater::callBackStatus(ECONTROLLER_STATE state_I) {
+  // Recorded before the state machine sees it: a last success or a failure
+  // ends the process from there.
+  if (state_I == ESTATE_SUCCESS) mResults.Finish(EBOARD_UPDATED);
+  if (state_I == ESTATE_FAILURE) mResults.Finish(EBOARD_FAILED);
   if (state_I == ESTATE_SUCCESS && mUpdateIndex < static_cast<int>(mDeviceUpdates.size())) {
     TavSleep(kIntermediateSuccessHoldSeconds);
     return;

@@ -17,6 +17,7 @@
 #include "seams/CDeviceRegistry.h"
 #include "seams/CPowerInhibitor.h"
 #include "update/CApplicationDelegate.h"
+#include "update/CBoardResults.h"
 #include "update/CLinuxUpdateController.h"
 #include "update/CLinuxUpdateNotifier.h"
 
@@ -34,6 +35,9 @@ struct SUpdaterSetup {
   // that kind is refused through this hook.
   std::function<void(CUpdateController&, const std::string& serial, unsigned char index)>
       updateScalar;
+  // The application object, known at creation: whether it was launched by
+  // the user decides where the arguments, and the configuration, come from.
+  CApplicationDelegate* delegate = nullptr;
 };
 
 class OFLUpdater : public CRegistryWatcher {
@@ -87,6 +91,16 @@ class OFLUpdater : public CRegistryWatcher {
   int updateIndex() const { return mUpdateIndex; }
   void setUpdateIndex(int index_I) { mUpdateIndex = index_I; }
   std::vector<UpdateEntry> deviceUpdates() const { return mDeviceUpdates; }
+  // What became of each board asked for.
+  const CBoardResults& boardResults() const { return mResults; }
+  CBoardResults& boardResults() { return mResults; }
+  // Reads the boards that were updated once more, for the version they now
+  // run. Call once the run is over.
+  void refreshVersionsAfter();
+  // An error the controller reported, kept as the reason of the current board.
+  void noteError(const std::string& text_I) { mResults.NoteError(text_I); }
+  // The device watch could not be set up.
+  bool watchFailed() const { return mWatchFailed; }
   // True once the update thread has gone through its list.
   bool programThreadFinished() const { return mProgramFinished; }
   // Waits for the update thread to end (tests and the end of a headless run).
@@ -98,6 +112,9 @@ class OFLUpdater : public CRegistryWatcher {
   void runThreadDevice();
   void runThreadProgram();
   void runUpdateStep(const std::string& value_I);
+  // False when the entry cannot go on; its outcome is then recorded.
+  bool prepareEntry(const std::string& kind_I, const std::string& value_I);
+  void notice(const std::string& text_I);
   static bool MatchesWatchedUsage(const DeviceInfo& info_I);
   void Terminate(ERunOutcome outcome_I);
 
@@ -113,6 +130,8 @@ class OFLUpdater : public CRegistryWatcher {
   std::vector<UpdateEntry> mDeviceUpdates;
   std::atomic<bool> mProgramFinished{false};
   std::atomic<bool> mStopping{false};
+  std::atomic<bool> mWatchFailed{false};
+  CBoardResults mResults;
   std::thread mThreadProgram;
   std::thread mThreadDevice;
 };

@@ -47,7 +47,7 @@ class Application : public ::testing::Test {
   }
 
   // The run's seams and the application object, as main makes them.
-  FLAppDelegate& Make(std::vector<std::string> arguments_I, bool headless_I = true) {
+  FLAppDelegate& Make(std::vector<std::string> arguments_I, bool terminal_I = true) {
     SUpdaterSetup setup;
     auto bus = mBus;
     setup.makeDiscovery = [bus] { return std::make_unique<CFakeDiscovery>(bus); };
@@ -62,7 +62,7 @@ class Application : public ::testing::Test {
     SApplicationSetup app;
     app.window = &mWindow;
     app.desktop = mDesktop;
-    app.headless = headless_I;
+    app.terminal = terminal_I;
     app.exitProcess = [this](int status_I) { mExitStatus = status_I; };
     app.printResult = [this](const std::string& line_I) { mResult = line_I; };
     mApp = std::make_unique<FLAppDelegate>(app);
@@ -184,7 +184,7 @@ TEST_F(Application, SuccessfulRunShowsEveryStepAndEndsWithStatusZero) {
 TEST_F(Application, WindowRunExitsWithZeroWhateverTheOutcome) {
   auto pen = AttachPen();
   pen->mProgramResult = false;
-  FLAppDelegate& app = Make({"-p", ""}, /*headless=*/false);
+  FLAppDelegate& app = Make({"-p", ""}, /*terminal=*/false);
   RunToTheEnd(app);
   EXPECT_TRUE(mWindow.Called("text:" + T("Programming Failed")));
   EXPECT_TRUE(mWindow.Called("color:3"));

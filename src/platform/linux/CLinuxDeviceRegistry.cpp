@@ -73,13 +73,13 @@ bool ReadUsbDevice(udev_device* usb_I, SUsbEntry& entry_O) {
 }
 
 // The hub a USB device hangs behind; root hubs stand for no hub at all.
-void ReadParentHub(udev_device* usb_I, SHidEntry& entry_IO) {
+void ReadParentHub(udev_device* usb_I, uint32_t& vendorId_O, uint32_t& productId_O) {
   udev_device* hub = UsbDeviceAbove(usb_I);
   if (hub == nullptr || UsbDeviceAbove(hub) == nullptr) return;
   SUsbEntry hubEntry;
   if (!ReadUsbDevice(hub, hubEntry)) return;
-  entry_IO.parentUsbVendorId = hubEntry.vendorId;
-  entry_IO.parentUsbProductId = hubEntry.productId;
+  vendorId_O = hubEntry.vendorId;
+  productId_O = hubEntry.productId;
 }
 
 bool ReadReportDescriptor(udev_device* hidraw_I, std::vector<uint8_t>& bytes_O) {
@@ -105,7 +105,7 @@ bool ReadInterfaceBase(udev_device* hidraw_I, SHidEntry& base_O) {
   base_O.version = usbEntry.version;
   const char* node = udev_device_get_devnode(hidraw_I);
   base_O.nodePath = node != nullptr ? node : std::string();
-  ReadParentHub(usb, base_O);
+  ReadParentHub(usb, base_O.parentUsbVendorId, base_O.parentUsbProductId);
   return true;
 }
 
@@ -203,7 +203,9 @@ std::vector<SUsbEntry> CLinuxDeviceRegistry::ListUsbDevices(uint32_t vendorId_I)
     if (type == nullptr || std::strcmp(type, "usb_device") != 0) return;
     SUsbEntry entry;
     if (!ReadUsbDevice(device_I, entry)) return;
-    if (vendorId_I == 0 || entry.vendorId == vendorId_I) entries.push_back(entry);
+    if (vendorId_I != 0 && entry.vendorId != vendorId_I) return;
+    ReadParentHub(device_I, entry.parentUsbVendorId, entry.parentUsbProductId);
+    entries.push_back(entry);
   });
   return entries;
 }

@@ -157,6 +157,13 @@ void CTerminalWindowController::setTouchNewChecksum(uint32_t /*checksum_I*/) {}
 void CTerminalWindowController::enableUIElements(bool /*enable_I*/) {}
 void CTerminalWindowController::enableProgramButton(bool /*enable_I*/) {}
 
+void CTerminalWindowController::PrintLine(FILE* stream_I, const std::string& text_I) {
+  EndStatusLine();
+  std::fflush(mOutput);
+  std::fputs((text_I + "\n").c_str(), stream_I);
+  std::fflush(stream_I);
+}
+
 int CTerminalWindowController::ShowAlert(const SAlert& alert_I) {
   EndStatusLine();
   WriteAlertText(alert_I);

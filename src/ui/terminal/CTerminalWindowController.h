@@ -75,6 +75,9 @@ class CTerminalWindowController : public CWindowController {
   void enableUIElements(bool enable_I) override;
   void enableProgramButton(bool enable_I) override;
 
+  // A line of the run's own report on `stream_I`, below the status line.
+  void PrintLine(FILE* stream_I, const std::string& text_I);
+
   int ShowAlert(const SAlert& alert_I) override;
   bool AskYesNo(const SAlert& question_I) override;
 

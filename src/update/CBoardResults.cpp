@@ -1,0 +1,94 @@
+#include "update/CBoardResults.h"
+
+void CBoardResults::Reset(const std::vector<std::pair<std::string, std::string>>& entries_I) {
+  std::lock_guard<std::mutex> guard(mLock);
+  mResults.clear();
+  for (const auto& entry : entries_I) {
+    SBoardResult result;
+    result.kind = entry.first;
+    result.value = entry.second;
+    mResults.push_back(result);
+  }
+  mCurrent = SIZE_MAX;
+  mFirstError.clear();
+}
+
+void CBoardResults::Begin(size_t index_I) {
+  std::lock_guard<std::mutex> guard(mLock);
+  if (index_I >= mResults.size()) return;
+  mCurrent = index_I;
+  mResults[index_I].outcome = EBOARD_UPDATING;
+  mFirstError.clear();
+}
+
+void CBoardResults::SetBoard(const std::string& product_I, const std::string& path_I,
+                             bool versionKnown_I, uint32_t version_I) {
+  std::lock_guard<std::mutex> guard(mLock);
+  if (mCurrent >= mResults.size()) return;
+  SBoardResult& result = mResults[mCurrent];
+  result.product = product_I;
+  result.path = path_I;
+  result.versionKnown = versionKnown_I;
+  result.versionBefore = version_I;
+}
+
+void CBoardResults::SetFile(const std::string& file_I) {
+  std::lock_guard<std::mutex> guard(mLock);
+  if (mCurrent < mResults.size()) mResults[mCurrent].file = file_I;
+}
+
+void CBoardResults::Finish(EBoardOutcome outcome_I, const std::string& reason_I) {
+  std::lock_guard<std::mutex> guard(mLock);
+  if (mCurrent >= mResults.size()) return;
+  SBoardResult& result = mResults[mCurrent];
+  if (result.outcome != EBOARD_UPDATING) return;
+  result.outcome = outcome_I;
+  result.reason = reason_I.empty() && outcome_I != EBOARD_UPDATED ? mFirstError : reason_I;
+}
+
+void CBoardResults::NoteError(const std::string& text_I) {
+  std::lock_guard<std::mutex> guard(mLock);
+  if (mFirstError.empty()) mFirstError = text_I;
+}
+
+void CBoardResults::SetVersionAfter(size_t index_I, uint32_t version_I) {
+  std::lock_guard<std::mutex> guard(mLock);
+  if (index_I >= mResults.size()) return;
+  mResults[index_I].versionAfterKnown = true;
+  mResults[index_I].versionAfter = version_I;
+}
+
+std::vector<SBoardResult> CBoardResults::Get() const {
+  std::lock_guard<std::mutex> guard(mLock);
+  return mResults;
+}
+
+SBoardResult CBoardResults::GetCurrent() const {
+  std::lock_guard<std::mutex> guard(mLock);
+  return mCurrent < mResults.size() ? mResults[mCurrent] : SBoardResult();
+}
+
+bool CBoardResults::HasCurrent() const {
+  std::lock_guard<std::mutex> guard(mLock);
+  return mCurrent < mResults.size();
+}
+
+ERunOutcome CBoardResults::Outcome(ERunOutcome ending_I) const {
+  std::lock_guard<std::mutex> guard(mLock);
+  bool refused = false, notFound = false, incomplete = false;
+  for (const SBoardResult& result : mResults) {
+    switch (result.outcome) {
+      // A board that failed is the one thing a caller must not miss.
+      case EBOARD_FAILED: return ERUN_FAILED;
+      case EBOARD_FILE_REFUSED: refused = true; break;
+      case EBOARD_NOT_FOUND: notFound = true; break;
+      case EBOARD_UPDATED: break;
+      default: incomplete = true; break;
+    }
+  }
+  if (ending_I != ERUN_SUCCESS) return ending_I;
+  if (refused) return ERUN_REFUSED_FILE;
+  if (notFound) return ERUN_NO_DEVICE;
+  if (incomplete) return ERUN_FAILED;
+  return ERUN_SUCCESS;
+}
