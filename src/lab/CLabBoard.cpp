@@ -15,6 +15,13 @@ std::vector<SLabInterface> SLabIdentity::Interfaces() const {
     entry.release = release;
     interfaces.push_back(entry);
   }
+  for (const auto& [page, usage] : hidUsages) {
+    SLabInterface entry;
+    entry.info = DeviceInfo{vendorId, productId, 0, usage, page};
+    entry.link = ELabLink::eHid;
+    entry.release = release;
+    interfaces.push_back(entry);
+  }
   return interfaces;
 }
 

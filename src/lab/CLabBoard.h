@@ -31,6 +31,9 @@ struct SLabIdentity {
   // One interface per pair: (usage page, usage). Vendor-class USB
   // interfaces have no usage: one pair of zeroes.
   std::vector<std::pair<uint16_t, uint16_t>> usages;
+  // HID collections a vendor-class device shows beside its vendor interface,
+  // as a touch controller shows its touch input: (usage page, usage).
+  std::vector<std::pair<uint16_t, uint16_t>> hidUsages;
   uint16_t release = 0;
 
   std::vector<SLabInterface> Interfaces() const;

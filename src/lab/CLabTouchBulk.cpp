@@ -8,6 +8,8 @@ SLabIdentity NormalIdentity(const SLabTouchBulkDescription& description_I) {
   identity.productId = description_I.productId;
   identity.link = ELabLink::eUsbVendor;
   identity.usages = {{0, 0}};
+  // Its touch input is HID: the device's return is seen by the HID watch.
+  identity.hidUsages = {{0xFF0D, 0x0001}};
   identity.release = description_I.release;
   return identity;
 }

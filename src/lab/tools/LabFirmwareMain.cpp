@@ -4,7 +4,7 @@
 //
 // Every image fits the lab board it is meant for: pen images cover the
 // pen's unprotected blocks, the vendor-class touch image the unprotected
-// blocks of its first CPU, the others are plain images of a few pages. The
+// blocks of its second CPU, the others are plain images of a few pages. The
 // bytes are a pattern with no 0xFF, so that every word is written.
 
 #include <cstdint>
@@ -88,10 +88,10 @@ std::string AsText(const Bytes& data_I) { return std::string(data_I.begin(), dat
 // The pen's flash: 48 blocks of 4 KiB from 0x08000000, the first protected.
 constexpr uint32_t kPenStart = 0x08000000 + 4096;
 constexpr size_t kPenBytes = 47 * 4096;
-// The vendor-class touch controller's first CPU: 16 blocks of 2 KiB from 0,
-// the first protected.
-constexpr uint32_t kTouchStart = 2048;
-constexpr size_t kTouchBytes = 15 * 2048;
+// The vendor-class touch controller's firmware runs on its second CPU: 24
+// blocks of 2 KiB from 0x00100000, the first protected.
+constexpr uint32_t kTouchStart = 0x00100000 + 2048;
+constexpr size_t kTouchBytes = 23 * 2048;
 // The pen behind the I2C tunnel: 24 blocks of 1 KiB from 0, the first
 // protected.
 constexpr uint32_t kTunnelStart = 1024;
