@@ -8,35 +8,58 @@ STATE="$(mktemp -d "${TMPDIR:-/tmp}/lab-runs.XXXXXX")"
 trap 'rm -rf "$STATE"' EXIT
 failures=0
 
-expect() {  # expect STATUS DESCRIPTION ARGUMENTS...
+runs=0
+# expect STATUS DESCRIPTION ARGUMENTS... ; with SAYS set, the output must
+# also hold each of its lines.
+expect() {
   local want="$1" what="$2"
   shift 2
+  runs=$((runs + 1))
   local output
-  output="$(timeout 120 "$PROGRAM" --headless --lab-fast "$@" </dev/null 2>&1)"
+  output="$(timeout 120 "$PROGRAM" --lab-fast "$@" </dev/null 2>&1)"
   local got=$?
-  if [ "$got" -ne "$want" ]; then
-    echo "FAIL: $what: exit $got, expected $want"
+  local missing=""
+  while IFS= read -r line; do
+    [ -z "$line" ] && continue
+    grep -qF -- "$line" <<<"$output" || missing="$missing
+  missing: $line"
+  done <<<"${SAYS:-}"
+  if [ "$got" -ne "$want" ] || [ -n "$missing" ]; then
+    echo "FAIL: $what: exit $got, expected $want$missing"
     echo "$output" | tail -15
     failures=$((failures + 1))
   else
     echo "ok: $what"
   fi
+  SAYS=""
 }
 
-expect 0 "wireless tablet, pen touch and Bluetooth" --lab --lab-state "$STATE/w" --yes -p "" -t "" -b ""
-expect 0 "wireless tablet again, from the state the first run left" --lab --lab-state "$STATE/w" --yes -p ""
+SAYS="  touch controller of Lab Wireless Tablet: updated from version
+  Bluetooth module of Lab Wireless Tablet: updated from version
+  pen controller of Lab Wireless Tablet: updated from version
+Result: the firmware was updated." \
+expect 0 "wireless tablet, pen touch and Bluetooth" --lab --headless --lab-state "$STATE/w" --yes -t "" -b "" -p ""
+expect 0 "wireless tablet again, from the state the first run left" --lab --headless --lab-state "$STATE/w" --yes -p ""
 expect 0 "classic tablet, pen re-enumerating" --lab classic-tablet --lab-state "$STATE/c" --yes -p ""
-# The vendor-class transport asks for the loader only on an open interface,
-# and the update flow never opens it first: the switch is refused, the loader
-# never comes, and the run ends as a failure once the wait runs out.
-expect 1 "classic tablet, vendor-class touch never reaches its loader" --lab classic-tablet --lab-state "$STATE/c" --yes -t ""
+SAYS="  touch controller of Lab Classic Tablet: updated" \
+expect 0 "classic tablet, vendor-class touch through its loader" --lab classic-tablet --lab-state "$STATE/c" --yes -t ""
 expect 0 "AB1122 Bluetooth" --lab wireless-tablet-1122 --lab-state "$STATE/b" --yes -b ""
 expect 0 "pen display, HID scalar" --lab display-hid --lab-state "$STATE/d" --yes -p "" -t "" -s ""
 expect 0 "pen through the I2C tunnel" --lab tunnel-tablet --lab-state "$STATE/t" --yes -p ""
-expect 1 "scalar behind the bridge is refused" --lab display-ftdi --lab-state "$STATE/f" --yes -s "1:2:SN:255"
+SAYS="  display scalar of Lab Pen Display FTDI: failed:" \
+expect 1 "scalar behind the bridge is refused, with or without --headless" --lab display-ftdi --lab-state "$STATE/f" --yes -s ""
 expect 4 "nobody confirms" --lab --lab-state "$STATE/n" -p ""
-expect 1 "a board that fails every read" --lab --lab-state "$STATE/r" --yes --lab-fault fail-read@1000 -p ""
+SAYS="  pen controller of Lab Wireless Tablet: failed:" \
+expect 1 "a board that fails every read" --lab --headless --lab-state "$STATE/r" --yes --lab-fault fail-read@1000 -p ""
 expect 1 "cut off mid-update" --lab classic-tablet --lab-state "$STATE/v" --yes --lab-fault vanish@200 -p ""
 expect 0 "the next run finishes the cut-off update" --lab classic-tablet --lab-state "$STATE/v" --yes -p ""
-echo "$(( 12 - failures )) passed, $failures failed"
+SAYS="No attached board has the interface path 1:2:3:4:5; the pen controller found is updated instead." \
+expect 0 "a path that matches nothing is said once" --lab --lab-state "$STATE/p" --yes -p "1:2:3:4:5"
+SAYS="No board to update" \
+expect 64 "a terminal run without a board" --lab --headless --lab-state "$STATE/e" --yes
+# Each "GetDevice" comparison belongs in the log, not on the screen.
+if "$PROGRAM" --lab --lab-fast --lab-state "$STATE/p" --yes -p "1:2:3:4:5" </dev/null 2>&1 | grep -q GetDevice; then
+  echo "FAIL: GetDevice lines on the screen"; failures=$((failures + 1))
+fi
+echo "$(( runs - failures )) passed, $failures failed"
 [ "$failures" -eq 0 ]

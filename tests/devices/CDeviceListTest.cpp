@@ -1,6 +1,8 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include "support/LogCapture.h"
+
 #include <stdexcept>
 
 #include "devices/CDeviceList.h"
@@ -19,10 +21,15 @@ std::shared_ptr<CDevice> MakeDevice(const std::string& name_I, uint32_t penProdu
 // GetDevice(path) prints its comparisons to standard output.
 std::string FindPrinting(const CDeviceList& list_I, const std::string& path_I,
                          std::shared_ptr<CDevice>& found_O) {
+  // Written to the log, not to standard output.
+  LogCapture capture;
   testing::internal::CaptureStdout();
   found_O = list_I.GetDevice(path_I);
   std::fflush(stdout);
-  return testing::internal::GetCapturedStdout();
+  EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+  std::string lines;
+  for (const std::string& piece : capture.Log()) lines += piece.substr(piece.find("] ") + 2);
+  return lines;
 }
 
 }  // namespace

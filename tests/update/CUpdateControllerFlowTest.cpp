@@ -33,11 +33,12 @@ TEST_F(Flow, PenReEnumeratesIntoItsLoaderAndBack) {
   EXPECT_TRUE(mNotifier.Logged("Switching Pen to Loader mode... "));
   EXPECT_TRUE(mNotifier.Logged("Setting protocolType to 0"));
 
-  // The order on the wire: switch, open the loader, init, program, leave
+  // The order on the wire: open and switch, open the loader, init, program, leave
   // with save, then carry the loader's sums to the new normal interface.
   const std::vector<std::string> journal = mJournal.Entries();
   const std::vector<std::string> expectedOrder = {
-      "pen.RegisterCallback",    "pen.SwitchToBLMode",       "loader.Open",
+      "pen.RegisterCallback",    "pen.Open",                 "pen.SwitchToBLMode",
+      "loader.Open",
       "loader.RegisterCallback", "loader.SetProtocolType(0)", "loader.Init(64 bytes)",
       "loader.ProgramBoard",     "loader.RegisterCallback",  "loader.SwitchFromBLMode(true)",
       "penAgain.Open",           "penAgain.RegisterCallback",

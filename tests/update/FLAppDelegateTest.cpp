@@ -8,6 +8,10 @@
 #include <filesystem>
 #include <fstream>
 
+#include <atomic>
+#include <thread>
+
+#include "common/CMainThreadLoop.h"
 #include "common/CVirtualClock.h"
 #include "host/CLanguageManager.h"
 #include "host/CLinuxLanguageManager.h"
@@ -63,8 +67,15 @@ class Application : public ::testing::Test {
     app.window = &mWindow;
     app.desktop = mDesktop;
     app.terminal = terminal_I;
-    app.exitProcess = [this](int status_I) { mExitStatus = status_I; };
-    app.printResult = [this](const std::string& line_I) { mResult = line_I; };
+    app.exitProcess = [this](int status_I) {
+      mExitStatus = status_I;
+      if (mLoop) mLoop->Quit();
+    };
+    app.printResult = [this](const std::string& line_I) {
+      mResult = line_I;
+      mReport.push_back(line_I);
+    };
+    app.printError = [this](const std::string& line_I) { mErrors.push_back(line_I); };
     mApp = std::make_unique<FLAppDelegate>(app);
     return *mApp;
   }
@@ -84,6 +95,29 @@ class Application : public ::testing::Test {
     return pen;
   }
 
+  // Launches on a main loop of its own, as the program does, until the run
+  // ends; false when it had not ended after ten real seconds.
+  bool RunOnMainLoop(FLAppDelegate& app_I) {
+    CMainThreadLoop loop;
+    loop.RegisterMainThread();
+    mLoop = &loop;
+    std::atomic<bool> ended{false};
+    std::thread watchdog([&] {
+      for (int i = 0; i < 1000 && !ended; ++i) {
+        std::this_thread::sleep_for(std::chrono::milliseconds(10));
+      }
+      loop.Quit();
+    });
+    loop.Post([&app_I] { app_I.applicationDidFinishLaunching(); });
+    loop.Run();
+    const bool finished = app_I.HasTerminated();
+    ended = true;
+    watchdog.join();
+    mLoop = nullptr;
+    loop.Unregister();
+    return finished;
+  }
+
   void RunToTheEnd(FLAppDelegate& app_I) {
     app_I.applicationDidFinishLaunching();
     OFLUpdater::updater()->joinProgramThread();
@@ -101,6 +135,10 @@ class Application : public ::testing::Test {
   std::unique_ptr<FLAppDelegate> mApp;
   int mExitStatus = -100;
   std::string mResult;
+  std::vector<std::string> mReport;
+  std::vector<std::string> mErrors;
+  // A real main loop, for the runs where dispatch must not run inline.
+  CMainThreadLoop* mLoop = nullptr;
   fs::path mFolder;
 };
 
@@ -192,7 +230,7 @@ TEST_F(Application, WindowRunExitsWithZeroWhateverTheOutcome) {
   EXPECT_EQ(mResult, "");
 }
 
-TEST_F(Application, HeadlessStatusesTellEachOutcome) {
+TEST_F(Application, TerminalStatusesTellEachOutcome) {
   {
     auto pen = AttachPen();
     pen->mProgramResult = false;
@@ -222,27 +260,82 @@ TEST_F(Application, HeadlessStatusesTellEachOutcome) {
     fs::remove(mFolder / "cfg" / "Firmware" / "pen.pen");
     RunToTheEnd(Make({"-p", ""}));
     EXPECT_EQ(mExitStatus, ERUN_REFUSED_FILE);
+    EXPECT_NE(std::find(mReport.begin(), mReport.end(),
+                        "  " + T("pen controller") + " of Lab Tablet: " + T("firmware file refused") +
+                            ": " + (mFolder / "cfg" / "Firmware" / "pen.pen").string() +
+                            ": No such file or directory"),
+              mReport.end());
     OFLUpdater::DisposeInstance();
+  }
+  {
+    // A product without the board asked for says so, not that the file is bad.
+    AttachPen();
+    RunToTheEnd(Make({"-b", ""}));
+    EXPECT_EQ(mExitStatus, ERUN_NO_DEVICE);
+    EXPECT_TRUE(mWindow.Called("alert:" + T("Tavik Firmware Update Utility") +
+                               "|Error: Lab Tablet has no " + T("Bluetooth module") + " to update."));
   }
 }
 
-TEST_F(Application, HeadlessRunWhoseLoaderNeverReturnsEndsAsAFailure) {
-  auto pen = AttachPen();
+TEST_F(Application, TerminalRunReportsEveryBoardAndCountsEachOne) {
+  AttachPen();
+  // Named in the configuration, but not attached.
+  mBus->devices.front()->SetTouchUpdate("pen.pen");
+  RunToTheEnd(Make({"-t", "", "-p", ""}));
+  EXPECT_TRUE(mJournal.Contains("pen.ProgramBoard"));
+  // The last board's success does not stand for the run.
+  EXPECT_TRUE(mWindow.Called("alert:" + T("Tavik Firmware Update Utility") + "|" +
+                             T("The last board was updated, but not every board was.")));
+  EXPECT_EQ(mExitStatus, ERUN_NO_DEVICE);
+  const std::string file = (mFolder / "cfg" / "Firmware" / "pen.pen").string();
+  EXPECT_EQ(mReport,
+            (std::vector<std::string>{
+                "Updating the pen controller of Lab Tablet (" + std::string(kPath) + "), from " +
+                    file + ".",
+                "  touch controller of Lab Tablet: not found: the touch controller of Lab Tablet "
+                "was not found",
+                "  pen controller of Lab Tablet: updated",
+                T("Result: no supported tablet is connected.")}));
+}
+
+TEST_F(Application, TerminalRunWhoseLoaderNeverReturnsEndsAsAFailure) {
+  AttachPen();
   mBus->devices.front()->SetPenIntoBLMode(true);  // waits for a loader that never comes
   RunToTheEnd(Make({"-p", ""}));
   EXPECT_FALSE(mJournal.Contains("pen.ProgramBoard"));
   EXPECT_EQ(mExitStatus, ERUN_FAILED);
+  EXPECT_EQ(mReport.end()[-2],
+            "  pen controller of Lab Tablet: failed: the board did not reach its loader mode in time");
 }
 
-TEST_F(Application, RunWithNoArgumentsStaysInProgramUntilStoppedFromOutside) {
+TEST_F(Application, WithoutABoardATerminalRunEndsAtOnceAndAWindowRunWaits) {
   AttachPen();
-  FLAppDelegate& app = Make({});
-  RunToTheEnd(app);
-  EXPECT_EQ(app.state(), ESTATE_PROGRAM);
-  EXPECT_FALSE(app.HasTerminated());
+  FLAppDelegate& terminal = Make({});
+  terminal.applicationDidFinishLaunching();
+  EXPECT_EQ(mExitStatus, ERUN_USAGE);
+  ASSERT_EQ(mErrors.size(), 1u);
+  EXPECT_NE(mErrors[0].find("-p, -t, -b or -s"), std::string::npos);
+  EXPECT_TRUE(mDesktop->mJournal.Entries().empty());  // the driver was never touched
+  OFLUpdater::DisposeInstance();
+
+  FLAppDelegate& window = Make({}, /*terminal=*/false);
+  RunToTheEnd(window);
+  EXPECT_EQ(window.state(), ESTATE_PROGRAM);
+  EXPECT_FALSE(window.HasTerminated());
   EXPECT_TRUE(mWindow.Called("close:0"));  // the window cannot be closed either
-  app.terminate(ERUN_DECLINED);            // from outside
-  EXPECT_EQ(mExitStatus, ERUN_DECLINED);
+  window.terminate(ERUN_DECLINED);          // from outside
+  EXPECT_EQ(mExitStatus, 0);
+}
+
+TEST_F(Application, WatchThatCannotBeSetUpEndsTheRunOnARealMainLoop) {
+  AttachPen();
+  mRegistry->mCanWatch = false;
+  ASSERT_TRUE(RunOnMainLoop(Make({"-p", ""}))) << "the run hung";
+  EXPECT_EQ(mExitStatus, ERUN_FAILED);
+  EXPECT_EQ(mErrors, std::vector<std::string>{T("Could not secure USB for Firmware Updater.")});
+  // The terminate handler ran: the driver is back.
+  EXPECT_TRUE(mDesktop->mJournal.Contains("launch:com.tavik.TabletDriver"));
+  EXPECT_TRUE(mDesktop->mJournal.Contains("notify:com.tavik.TFUCompleted"));
 }
 
 TEST_F(Application, StateTableDrivesTheWindowInOrder) {

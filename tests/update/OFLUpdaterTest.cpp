@@ -49,10 +49,9 @@ class Updater : public ::testing::Test {
     setup.preferencesFolder = (mFolder / "prefs").string();
     setup.executableFolder = (mFolder / "bin").string();
     setup.installedDataFolder = (mFolder / "share").string();
+    setup.delegate = &mDelegate;
     OFLUpdater::Configure(std::move(setup));
-    OFLUpdater* updater = OFLUpdater::updater();
-    updater->setAppDelegate(&mDelegate);
-    return updater;
+    return OFLUpdater::updater();
   }
 
   // A product whose pen interface has the watched usage, with an update
@@ -132,6 +131,13 @@ TEST_F(Updater, ConfigPathPrefersTheOptionThenBesideTheProgramThenTheInstallatio
   EXPECT_EQ(updater->configPath(), (mFolder / "bin" / "fw_loader.ini").string());
   // Worked out once, at creation.
   EXPECT_EQ(updater->GetController().getConfigPath(), (mFolder / "share" / "fw_loader.ini").string());
+  OFLUpdater::DisposeInstance();
+
+  // Launched by another program, the preferences file names the boards and
+  // the configuration alike, and the configuration is the one updated from.
+  std::ofstream(mFolder / "prefs" / "fwupdater.parm") << "-p  -f /opt/parm.ini";
+  mDelegate.mUserLaunched = false;
+  EXPECT_EQ(Make({"prog"})->GetController().getConfigPath(), "/opt/parm.ini");
 }
 
 TEST_F(Updater, ToHexReadsLeadingHexDigits) {
@@ -187,21 +193,17 @@ TEST_F(Updater, OptionInLastPlaceEndsTheRunWithAMessage) {
                 "dialog:Error: An option at the end of the arguments has no value.", "terminate"}));
 }
 
-TEST_F(Updater, WatchThatCannotBeSetUpEndsTheRun) {
+TEST_F(Updater, WatchThatCannotBeSetUpEndsSetupWithoutWaitingOnTheMainThread) {
   mRegistry->mCanWatch = false;
   AttachProduct();
   OFLUpdater* updater = Make({"prog", "-p", ""});
-  bool result = true;
-  std::thread waiter([&] { result = updater->setupUpdate(); });
-  // setupUpdate waits for the watch without bound; the end of the process
-  // (cleanup, from the terminate handler) is what stops it.
-  while (!mDelegate.mJournal.Contains("terminate")) mClock->Advance(1.0);
+  // The device thread must not dispatch to the main thread, which is this
+  // one, still inside setupUpdate: a dispatch would wait forever.
+  EXPECT_FALSE(updater->setupUpdate());
+  EXPECT_TRUE(updater->watchFailed());
   EXPECT_TRUE(mCapture.LogContains("Could not secure USB for Firmware Updater."));
-  mClock->Advance(30.0);
-  updater->cleanup();
-  waiter.join();
-  EXPECT_FALSE(result);
   EXPECT_FALSE(updater->isCommandLine());
+  EXPECT_FALSE(mDelegate.mJournal.Contains("terminate"));
 }
 
 TEST_F(Updater, UpdateRunsWithThePowerAssertionAndFileFromTheFirmwareFolder) {

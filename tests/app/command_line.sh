@@ -1,0 +1,63 @@
+#!/usr/bin/env bash
+# Wrong input, as a user types it: one line on standard error that starts
+# with the program's name, the usage status, nothing on standard output and
+# never the help text; and the few commands that print and stop.
+set -u
+PROGRAM="$1"
+STATE="$(mktemp -d "${TMPDIR:-/tmp}/command-line.XXXXXX")"
+trap 'chmod -R u+w "$STATE"; rm -rf "$STATE"' EXIT
+failures=0
+runs=0
+
+refused() {  # refused STATUS WORDS-IN-THE-LINE ARGUMENTS...
+  local want="$1" words="$2"
+  shift 2
+  runs=$((runs + 1))
+  local out err got
+  out="$(timeout 20 "$PROGRAM" "$@" </dev/null 2>"$STATE/err")"
+  got=$?
+  err="$(cat "$STATE/err")"
+  if [ "$got" -ne "$want" ] || [ -n "$out" ] || [ "$(wc -l <"$STATE/err")" -ne 1 ] ||
+     [[ "$err" != "tavik-fwupdater: "* ]] || [[ "$err" != *"$words"* ]]; then
+    echo "FAIL: $*: exit $got (want $want), stderr: $err, stdout: ${out:0:200}"
+    failures=$((failures + 1))
+  fi
+}
+
+refused 64 "unknown option -x" -x --lab
+refused 64 "unknown option --no-such" --no-such
+refused 64 "unexpected argument \"foo\"" --lab classic-tablet foo -p ""
+refused 64 "-t needs a value" --lab -t
+refused 64 "-p needs a value" -p -t ""
+refused 64 "--log needs a value" --log
+refused 64 "not an interface path" -p "abc"
+refused 64 "not a display" -s "x:y"
+refused 64 "--headless takes no value" --headless=yes
+refused 64 "there is no lab product called nothing" --lab=nothing -p ""
+refused 64 "--lab list names" --lab list -p ""
+refused 64 "do not go with --list" --list -p ""
+mkdir -p "$STATE/locked" && chmod a-w "$STATE/locked"
+if [ "$(id -u)" -ne 0 ]; then
+  refused 1 "--lab-state $STATE/locked/lab" --lab --lab-state "$STATE/locked/lab" --yes -p ""
+fi
+touch "$STATE/file"
+refused 1 "--lab-state $STATE/file/lab" --lab --lab-state "$STATE/file/lab" --yes -p ""
+
+check() {  # check DESCRIPTION COMMAND...: the command must succeed
+  runs=$((runs + 1))
+  local what="$1"
+  shift
+  if ! "$@"; then echo "FAIL: $what"; failures=$((failures + 1)); fi
+}
+check "--lab list names the products" \
+  bash -c '"$0" --lab list | grep -q "^classic-tablet "' "$PROGRAM"
+check "--lab=NAME takes the name" \
+  bash -c '"$0" --list --lab=display-hid --lab-state "$1/l" | grep -q "Lab Pen Display HID"' \
+  "$PROGRAM" "$STATE"
+check "--version ends with a new line" \
+  bash -c '[ "$("$0" --version | tail -c 1 | od -An -c | tr -d " ")" = "\n" ]' "$PROGRAM"
+check "the usage line names interface paths" \
+  bash -c '"$0" --help | head -1 | grep -qF "[-p PATH]"' "$PROGRAM"
+
+echo "$(( runs - failures )) passed, $failures failed"
+[ "$failures" -eq 0 ]
