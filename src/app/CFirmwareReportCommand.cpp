@@ -7,6 +7,10 @@
 #include <vector>
 
 #include "app/CCommandLine.h"
+#include "app/JsonString.h"
+#include "app/TavVersion.h"
+#include "firmware/FirmwareFileCheck.h"
+#include "update/CApplicationDelegate.h"
 #include "common/StringUtilities.h"
 #include "common/TavAssert.h"
 #include "common/TavLog.h"
@@ -66,23 +70,6 @@ uint64_t ByteSum(const std::vector<uint8_t>& data_I) {
   uint64_t sum = 0;
   for (uint8_t byte : data_I) sum += byte;
   return sum;
-}
-
-std::string JsonString(const std::string& text_I) {
-  std::string out = "\"";
-  for (unsigned char c : text_I) {
-    if (c == '"' || c == '\\') {
-      out += '\\';
-      out += static_cast<char>(c);
-    } else if (c < 0x20) {
-      char escaped[8];
-      std::snprintf(escaped, sizeof escaped, "\\u%04x", c);
-      out += escaped;
-    } else {
-      out += static_cast<char>(c);
-    }
-  }
-  return out + "\"";
 }
 
 // The reader's own words: its first error line, or, where it only raised an
@@ -195,14 +182,23 @@ bool CFirmwareReportCommand::ParseInterface(const std::string& name_I, EINTERFAC
 
 int CFirmwareReportCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
   if (!mInterfaceName.empty() && !ParseInterface(mInterfaceName, mInterface)) {
-    std::fprintf(err_IO, "unknown interface %s: use hid, bulk, i2c or ftdi\n",
-                 mInterfaceName.c_str());
-    return 1;
+    std::fprintf(err_IO, "%s: unknown interface %s: use hid, bulk, i2c or ftdi\n",
+                 TAV_PROGRAM_NAME, mInterfaceName.c_str());
+    return ERUN_USAGE;
   }
   CSRec source;
   std::string reason;
-  if (!Load(source, reason)) {
-    std::fprintf(err_IO, "%s\n", reason.c_str());
+  // A FIFO would block the reader and an oversized binary be read whole:
+  // such a file is refused before it is opened.
+  const std::string problem = FirmwareFileCheck::Problem(mFile, mInterface);
+  if (FirmwareFileCheck::KeepsReaderAway(mFile, mInterface) || !Load(source, reason)) {
+    if (!problem.empty()) reason = problem;
+    if (mJson) {
+      std::fprintf(out_IO, "{\"file\":%s,\"error\":%s}\n", JsonString(mFile).c_str(),
+                   JsonString(reason).c_str());
+    } else {
+      std::fprintf(err_IO, "%s: %s: %s\n", TAV_PROGRAM_NAME, mFile.c_str(), reason.c_str());
+    }
     return 1;
   }
   if (mJson) {
@@ -211,7 +207,7 @@ int CFirmwareReportCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
     PrintText(source, out_IO);
   }
   if (!mOutputBinary.empty() && !WriteImage(source, reason)) {
-    std::fprintf(err_IO, "%s\n", reason.c_str());
+    std::fprintf(err_IO, "%s: %s\n", TAV_PROGRAM_NAME, reason.c_str());
     return 1;
   }
   return 0;

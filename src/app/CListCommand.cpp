@@ -3,6 +3,7 @@
 #include <sys/stat.h>
 
 #include "app/CCommandLine.h"
+#include "app/JsonString.h"
 #include "app/CRunSeams.h"
 #include "common/LinuxPaths.h"
 #include "devices/IOUtils.h"
@@ -33,24 +34,6 @@ std::string ReleaseText(uint16_t release_I) {
   char text[16];
   std::snprintf(text, sizeof(text), "%x.%02x", release_I >> 8, release_I & 0xFF);
   return text;
-}
-
-std::string JsonString(const std::string& text_I) {
-  std::string json = "\"";
-  for (const char c : text_I) {
-    const auto byte = static_cast<unsigned char>(c);
-    if (c == '"' || c == '\\') {
-      json += '\\';
-      json += c;
-    } else if (byte < 0x20) {
-      char escape[8];
-      std::snprintf(escape, sizeof(escape), "\\u%04x", byte);
-      json += escape;
-    } else {
-      json += c;
-    }
-  }
-  return json + "\"";
 }
 
 // The release number the registry lists for the device behind an interface.

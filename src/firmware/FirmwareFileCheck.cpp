@@ -26,6 +26,7 @@ std::string Problem(const std::string& path_I, EINTERFACE_TYPE interfaceType_I) 
   if (descriptor < 0) return std::strerror(errno);
   close(descriptor);
 
+  if (info.st_size == 0) return "the file is empty";
   const EDataSourceFormat format = CSRec::FormatFor(path_I, interfaceType_I);
   if (format == EDS_UNKNOWN) {
     const std::string extension = CSRec::ExtensionOf(path_I);

@@ -121,25 +121,30 @@ TEST(InspectCommand, RefusesAFileThatDoesNotLoadInTheReadersWords) {
   SRun run = Inspect({"--inspect", folder.Write("bad.pen", "S1050000010200\n"), "--output-binary",
                       image, "--json"});
   EXPECT_EQ(run.status, 1);
-  EXPECT_EQ(run.err, "LoadSRecFile - FAILED on invalid CRC, line 1\n");
-  EXPECT_EQ(run.out, "");
+  // With --json the error is a JSON object too.
+  EXPECT_EQ(run.err, "");
+  EXPECT_EQ(run.out, "{\"file\":\"" + folder.Path("bad.pen") +
+                         "\",\"error\":\"LoadSRecFile - FAILED on invalid CRC, line 1\"}\n");
   EXPECT_NE(access(image.c_str(), F_OK), 0);
 
   const std::string text = folder.Write("notes.txt", "hello");
   run = Inspect({"--inspect", text});
   EXPECT_EQ(run.status, 1);
-  EXPECT_EQ(run.err, "unrecognized file format for file: " + text + "\n");
+  EXPECT_EQ(run.err, "tavik-fwupdater: " + text +
+                         ": the extension .txt is not one of a firmware file (.pen, .touch, .tav, "
+                         ".hex, .airoflash, .airoflash2, .bin for a scalar)\n");
 
   run = Inspect({"--inspect", folder.Write("empty.bin", "")});
   EXPECT_EQ(run.status, 1);
-  EXPECT_EQ(run.err, "CScalarBinary::Load - ERROR - could not alloc data buf\n");
+  EXPECT_EQ(run.err, "tavik-fwupdater: " + folder.Path("empty.bin") + ": the file is empty\n");
 
   run = Inspect({"--inspect", folder.Write("x.hex", HexRecord(0, 0x9000, {1}) + "\r\n")});
-  EXPECT_EQ(run.err, "CIntelHex::Load: ERROR - start_address exceeds 32768\n");
+  EXPECT_EQ(run.err, "tavik-fwupdater: " + folder.Path("x.hex") +
+                         ": CIntelHex::Load: ERROR - start_address exceeds 32768\n");
 
   run = Inspect({"--inspect", text, "--interface", "usb"});
-  EXPECT_EQ(run.status, 1);
-  EXPECT_EQ(run.err, "unknown interface usb: use hid, bulk, i2c or ftdi\n");
+  EXPECT_EQ(run.status, 64);
+  EXPECT_EQ(run.err, "tavik-fwupdater: unknown interface usb: use hid, bulk, i2c or ftdi\n");
 
   CCommandLine commandLine;
   EXPECT_FALSE(commandLine.Parse({"--json"}));
@@ -160,5 +165,5 @@ TEST(InspectCommand, ExitsWithTheStatusFromTheCommandLine) {
   EXPECT_EQ(CTempFolder::Read(folder.Path("good.err")), "");
   EXPECT_EQ(status(bad, folder.Path("bad.err")), 1);
   EXPECT_EQ(CTempFolder::Read(folder.Path("bad.err")),
-            "LoadSRecFile - FAILED on invalid record length, line 3\n");
+            "tavik-fwupdater: " + bad + ": LoadSRecFile - FAILED on invalid record length, line 3\n");
 }

@@ -11,6 +11,7 @@
 
 #include "common/StringUtilities.h"
 #include "common/TavLog.h"
+#include "host/CLanguageManager.h"
 #include "ui/terminal/CTerminalMainLoop.h"
 
 namespace {
@@ -72,6 +73,19 @@ std::string CutToColumns(const std::string& text_I, int columns_I) {
 std::string WithoutTrailingDots(const std::string& text_I) {
   const size_t end = text_I.find_last_not_of('.');
   return end == std::string::npos ? std::string() : text_I.substr(0, end + 1);
+}
+
+std::string T(const char* key_I) { return TTCLocalizedNSString(key_I); }
+
+// The button's word, or its first letter where the other button does not
+// start with the same one. Compared without case.
+bool IsWordOrInitial(const std::string& answer_I, const std::string& button_I,
+                     const std::string& other_I) {
+  if (button_I.empty()) return false;
+  if (StringUtilities::IEquals(answer_I, button_I)) return true;
+  const std::string initial = StringUtilities::ToLower_Copy(button_I.substr(0, 1));
+  const std::string otherInitial = StringUtilities::ToLower_Copy(other_I.substr(0, 1));
+  return answer_I == initial && initial != otherInitial;
 }
 
 bool IsTerminal(FILE* stream_I) { return stream_I != nullptr && isatty(fileno(stream_I)) == 1; }
@@ -176,10 +190,11 @@ int CTerminalWindowController::ShowAlert(const SAlert& alert_I) {
   Write(row + "\n");
   if (buttons.size() == 1) return 0;
   if (!mInputIsTerminal) {
-    Write("-> " + OneLine(buttons[0]) + " (standard input is not a terminal)\n");
+    Write("-> " + OneLine(buttons[0]) + " " + T("(standard input is not a terminal)") + "\n");
     return 0;
   }
-  const std::string prompt = StringUtilities::Format("Choose 1-%zu [1]: ", buttons.size());
+  const std::string prompt =
+      StringUtilities::Format(T("Choose 1-%zu [1]: ").c_str(), buttons.size());
   for (;;) {
     Write(prompt);
     std::string line;
@@ -199,7 +214,8 @@ int CTerminalWindowController::ShowAlert(const SAlert& alert_I) {
     for (size_t index = 0; index < buttons.size(); ++index) {
       if (StringUtilities::IEquals(line, buttons[index])) return static_cast<int>(index);
     }
-    Write(StringUtilities::Format("Please type a number from 1 to %zu.\n", buttons.size()));
+    Write(StringUtilities::Format(T("Please type a number from 1 to %zu.").c_str(), buttons.size()) +
+          "\n");
   }
 }
 
@@ -207,17 +223,17 @@ bool CTerminalWindowController::AskYesNo(const SAlert& question_I) {
   EndStatusLine();
   WriteAlertText(question_I);
   if (mAssumeYes) {
-    Write("[y/N] y (assumed)\n");
+    Write(T("[y/N]") + " " + T("y (assumed)") + "\n");
     return true;
   }
   if (!mInputIsTerminal) {
-    Write("[y/N] n (standard input is not a terminal)\n");
+    Write(T("[y/N]") + " " + T("n (standard input is not a terminal)") + "\n");
     return false;
   }
   const std::string noButton = question_I.buttons.size() > 0 ? question_I.buttons[0] : "";
   const std::string yesButton = question_I.buttons.size() > 1 ? question_I.buttons[1] : "";
   for (;;) {
-    Write("[y/N] ");
+    Write(T("[y/N]") + " ");
     std::string line;
     const EAnswer answer = ReadAnswer(line);
     if (answer == EAnswer::eAskAgain) continue;
@@ -227,15 +243,14 @@ bool CTerminalWindowController::AskYesNo(const SAlert& question_I) {
     }
     StringUtilities::Trim(line);
     StringUtilities::ToLower(line);
-    if (line == "y" || line == "yes" ||
-        (!yesButton.empty() && StringUtilities::IEquals(line, yesButton))) {
-      return true;
-    }
-    if (line.empty() || line == "n" || line == "no" ||
-        (!noButton.empty() && StringUtilities::IEquals(line, noButton))) {
+    // The answer's own language counts too: "j" and "ja" where the buttons
+    // say "Ja" and "Nein".
+    const bool yes = line == "y" || line == "yes" || IsWordOrInitial(line, yesButton, noButton);
+    if (yes) return true;
+    if (line.empty() || line == "n" || line == "no" || IsWordOrInitial(line, noButton, yesButton)) {
       return false;
     }
-    Write("Please answer y or n.\n");
+    Write(T("Please answer y or n.") + "\n");
   }
 }
 
@@ -343,7 +358,7 @@ void CTerminalWindowController::OnSignal(int signal_I) {
   }
   TavLog::Warning("Interrupt refused: closing is disabled while the update runs\n");
   EndStatusLine();
-  Write("The update cannot be interrupted now. Please wait.\n");
+  Write(T("The update cannot be interrupted now. Please wait.") + "\n");
   if (mStatusGiven && mOutputIsTerminal) DrawStatusLine();
 }
 

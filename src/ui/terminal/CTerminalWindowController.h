@@ -24,8 +24,9 @@
 // is disabled they are refused, so Ctrl-C cannot cut off a running update.
 // Ctrl-\ still ends the process at once, as a last resort.
 //
-// The few words of its own ("[y/N]", the not-interactive notes, the refusal
-// to interrupt) are English; every other text comes from the caller.
+// Its few words of its own ("[y/N]", the not-interactive notes, the refusal
+// to interrupt) come from the catalogs like every other text; a question
+// also takes the first letter of its translated buttons ("j" in German).
 // Status colours have no visible effect, as in the original window.
 
 #include <cstdio>

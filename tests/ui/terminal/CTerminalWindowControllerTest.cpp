@@ -150,7 +150,7 @@ TEST(TerminalWindow, YesNoQuestionsReadAnswersAndDefaultToNo) {
     bool answer;
   } cases[] = {{"y\n", true},  {"yes\n", true}, {" YES \r\n", true},    {"ja\n", true},
                {"n\n", false}, {"no\n", false}, {"Nein\n", false},      {"\n", false},
-               {"", false},    {"y", true},     {"maybe\nyes\n", true}, {"yess\nj\nn\n", false}};
+               {"", false},    {"y", true},     {"maybe\nyes\n", true}, {"yess\nj\n", true}, {"x\nn\n", false}};
   for (const auto& entry : cases) {
     OutputCapture out;
     InputText in(entry.input);
