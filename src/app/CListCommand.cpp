@@ -99,7 +99,7 @@ int CListCommand::Run(const CRunSeams& seams_I, const std::string& configPath_I,
   std::unique_ptr<CLinuxDiscovery> discovery = seams_I.MakeDiscovery();
   discovery->SetConfig(mConfigPath);
   discovery->GenerateDeviceList();
-  mConfigRead = discovery->GetSupportedDeviceInfo().IsValid();
+  mConfigRead = discovery->GetSupportedDeviceInfo().WasRead();
   const std::vector<SProductLine> products =
       Describe(discovery->GetDeviceList(), *seams_I.GetRegistry());
 

@@ -117,11 +117,13 @@ std::shared_ptr<CSettingsMap> BoardObject(const CSettingsMap& product_I, const c
 }  // namespace
 
 bool CSupportedDeviceInfo::ParseConfig() {
+  mRead = false;
   try {
     Clear();
     std::shared_ptr<CSettingsArray> products =
         CSettingsArray::CastToArray(CSettingsObject::ReadFromJSONFile(mConfigPath), true);
     if (!products) return false;
+    mRead = true;
     mSupportedDevices = ParseDevices(products);
     return IsValid();
   } catch (const std::exception&) {

@@ -28,6 +28,8 @@ class CSupportedDeviceInfo {
   bool ParseConfig();
   void Clear() { mSupportedDevices.clear(); }
   bool IsValid() const { return !mSupportedDevices.empty(); }
+  // The last ParseConfig found a list of products, even an empty one ("[]").
+  bool WasRead() const { return mRead; }
 
   DeviceMap ParseDevices(std::shared_ptr<CSettingsArray> array_I);
   CDevice ParseBoards(std::shared_ptr<CSettingsMap> map_I);
@@ -43,6 +45,7 @@ class CSupportedDeviceInfo {
   std::string ToString() const;
 
  private:
+  bool mRead = false;
   DeviceMap mSupportedDevices;
   std::string mConfigPath = "./fw_loader.ini";
 };

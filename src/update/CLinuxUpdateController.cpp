@@ -16,3 +16,7 @@ void CLinuxUpdateController::setConfigPath(const std::string& path_I) {
 std::string CLinuxUpdateController::getConfigPath() const {
   return mDiscovery ? mDiscovery->GetConfig() : std::string();
 }
+
+bool CLinuxUpdateController::configurationRead() const {
+  return mDiscovery && mDiscovery->GetSupportedDeviceInfo().WasRead();
+}

@@ -20,4 +20,6 @@ class CLinuxUpdateController : public CUpdateController {
 
   void setConfigPath(const std::string& path_I);
   std::string getConfigPath() const;
+  // False when the configuration could not be read at the last device list.
+  bool configurationRead() const;
 };

@@ -101,6 +101,12 @@ void FLAppDelegate::applicationDidFinishLaunching() {
       if (mSetup.terminal) notice(T("Could not secure USB for Firmware Updater."));
       terminate(ERUN_FAILED);
     } else if (!mTerminated) {
+      // Without a configuration no product can be known: say which file.
+      if (mSetup.terminal && !mUpdater->GetController().configurationRead()) {
+        notice(StringUtilities::Format(
+            T("The device configuration %s could not be read, so no product is known.").c_str(),
+            mUpdater->GetController().getConfigPath().c_str()));
+      }
       notifyDialog(T("Error: No supported tablet is connected. Please connect a tablet."));
       terminate(ERUN_NO_DEVICE);
     }

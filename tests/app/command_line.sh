@@ -56,6 +56,10 @@ check "--lab=NAME takes the name" \
   "$PROGRAM" "$STATE"
 check "--version ends with a new line" \
   bash -c '[ "$("$0" --version | tail -c 1 | od -An -c | tr -d " ")" = "\n" ]' "$PROGRAM"
+check "log lines in a file carry a timestamp" \
+  bash -c '"$0" --log "$1/run.log" --list --lab --lab-state "$1/l" >/dev/null &&
+           grep -qE "^[0-9]{4}-[0-9]{2}-[0-9]{2} [0-9:]{8}\.[0-9]{3} \[I\]" "$1/run.log"' \
+  "$PROGRAM" "$STATE"
 check "the usage line names interface paths" \
   bash -c '"$0" --help | head -1 | grep -qF "[-p PATH]"' "$PROGRAM"
 

@@ -55,6 +55,12 @@ expect 1 "cut off mid-update" --lab classic-tablet --lab-state "$STATE/v" --yes 
 expect 0 "the next run finishes the cut-off update" --lab classic-tablet --lab-state "$STATE/v" --yes -p ""
 SAYS="No attached board has the interface path 1:2:3:4:5; the pen controller found is updated instead." \
 expect 0 "a path that matches nothing is said once" --lab --lab-state "$STATE/p" --yes -p "1:2:3:4:5"
+SAYS="The device configuration /nonexistent/fw_loader.ini could not be read, so no product is known." \
+expect 2 "a configuration that cannot be read is named" --lab --lab-state "$STATE/e" --yes -p "" -f /nonexistent/fw_loader.ini
+echo "[]" >"$STATE/empty.ini"
+if "$PROGRAM" --list --lab --lab-state "$STATE/e" -f "$STATE/empty.ini" 2>&1 | grep -q "could not be read"; then
+  echo "FAIL: [] is a valid, empty configuration"; failures=$((failures + 1))
+fi
 SAYS="No board to update" \
 expect 64 "a terminal run without a board" --lab --headless --lab-state "$STATE/e" --yes
 # Each "GetDevice" comparison belongs in the log, not on the screen.
