@@ -59,6 +59,7 @@ CListCommand::CListCommand(const CCommandLine& commandLine_I)
     : mConfigPath(ConfigPath(commandLine_I.GetUpdaterArguments())),
       mLab(commandLine_I.GetLab()),
       mLabName(commandLine_I.GetLabName()),
+      mLabState(commandLine_I.GetLabState()),
       mJson(commandLine_I.GetInspectJson()) {}
 
 std::string CListCommand::ConfigPath(const std::vector<std::string>& updaterArguments_I) {
@@ -85,7 +86,7 @@ int CListCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
   }
   std::string error;
   std::unique_ptr<CRunSeams> seams =
-      mLab ? CRunSeams::MakeLab(mLabName, error) : CRunSeams::MakeLinux();
+      mLab ? CRunSeams::MakeLab(mLabName, mLabState, error) : CRunSeams::MakeLinux();
   if (!seams) {
     std::fprintf(err_IO, "%s\n", error.c_str());
     return 1;

@@ -53,6 +53,7 @@ class CListCommand {
   std::string mConfigPath;
   bool mLab = false;
   std::string mLabName;
+  std::string mLabState;  // as the last run left the boards; default when empty
   bool mJson = false;
   bool mConfigRead = false;
 };

@@ -22,6 +22,12 @@ CLabI2CMaster::CLabI2CMaster(const SLabI2CDescription& description_I)
   PowerOn();
 }
 
+std::vector<SLabInterface> CLabI2CMaster::GetInterfaces() const {
+  SLabIdentity identity = mIdentity;
+  identity.release = mLoader.FindImageRelease().value_or(mIdentity.release);
+  return identity.Interfaces();
+}
+
 void CLabI2CMaster::PowerOn() {
   const bool valid = mLoader.IsImageValid();
   mSlaveMode = valid ? ESlaveMode::eMainFw : ESlaveMode::eLoader;

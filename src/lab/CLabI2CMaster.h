@@ -48,7 +48,8 @@ class CLabI2CMaster : public CLabBoard {
   CLabLoader& GetLoader() { return mLoader; }
   const CLabLoader& GetLoader() const { return mLoader; }
 
-  std::vector<SLabInterface> GetInterfaces() const override { return mIdentity.Interfaces(); }
+  // The bridge shows the release of the pen firmware behind it.
+  std::vector<SLabInterface> GetInterfaces() const override;
   void PowerOn() override;
   std::vector<std::string> GetViolations() const override;
 

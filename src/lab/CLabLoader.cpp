@@ -1,5 +1,7 @@
 #include "lab/CLabLoader.h"
 
+#include "lab/LabRelease.h"
+
 #include <algorithm>
 
 namespace {
@@ -320,4 +322,14 @@ void CLabLoader::Load(const CLabStateFile& state_I, const std::string& prefix_I)
   for (size_t i = 0; i < mCpus.size(); ++i) {
     mCpus[i].Load(state_I, prefix_I + ".cpu" + std::to_string(i));
   }
+}
+
+std::optional<uint16_t> CLabLoader::FindImageRelease() const {
+  for (const CLabFlash& cpu : mCpus) {
+    for (uint32_t block = 0; block < cpu.GetBlockCount(); ++block) {
+      const std::vector<uint8_t>& content = cpu.GetBlockContent(block);
+      if (auto release = FindLabRelease(content.data(), content.size())) return release;
+    }
+  }
+  return std::nullopt;
 }

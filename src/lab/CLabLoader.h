@@ -48,6 +48,8 @@ class CLabLoader {
 
   // Every CPU's image is valid.
   bool IsImageValid() const;
+  // The release the image names, in any CPU's flash.
+  std::optional<uint16_t> FindImageRelease() const;
   void Boot(ELabStartReason reason_I);
   void FactoryImage(uint32_t seed_I);
 

@@ -5,7 +5,8 @@ CLabLoaderBoard::CLabLoaderBoard(std::string name_I, SLabIdentity normal_I,
     : CLabBoard(std::move(name_I)),
       mNormal(std::move(normal_I)),
       mLoaderIdentity(std::move(loaderIdentity_I)),
-      mLoader(std::move(engine_I)) {}
+      mLoader(std::move(engine_I)),
+      mRelease(mNormal.release) {}
 
 void CLabLoaderBoard::FactoryReset(uint32_t seed_I) {
   mLoader.FactoryImage(seed_I);
@@ -13,12 +14,21 @@ void CLabLoaderBoard::FactoryReset(uint32_t seed_I) {
 }
 
 std::vector<SLabInterface> CLabLoaderBoard::GetInterfaces() const {
-  return mMode == EMode::eNormal ? mNormal.Interfaces() : mLoaderIdentity.Interfaces();
+  if (mMode != EMode::eNormal) return mLoaderIdentity.Interfaces();
+  SLabIdentity normal = mNormal;
+  normal.release = mRelease;
+  return normal.Interfaces();
+}
+
+void CLabLoaderBoard::StartNormal() {
+  mMode = EMode::eNormal;
+  mRelease = mLoader.FindImageRelease().value_or(mNormal.release);
 }
 
 void CLabLoaderBoard::PowerOn() {
   const bool valid = mLoader.IsImageValid();
-  mMode = valid ? EMode::eNormal : EMode::eLoader;
+  mMode = EMode::eLoader;
+  if (valid) StartNormal();
   mLoader.Boot(valid ? eLabStartPowerOn : eLabStartInvalidImage);
 }
 
@@ -43,11 +53,13 @@ void CLabLoaderBoard::Restart() {
   // Firmware that answers the loader commands itself restarts in place
   // when it stays what it was.
   if (next == mMode && next == EMode::eNormal) {
+    StartNormal();
     mLoader.Boot(eLabStartPowerOn);
     return;
   }
   Reenumerate([this, next, valid]() {
     mMode = next;
+    if (next == EMode::eNormal) StartNormal();
     mLoader.Boot(valid ? eLabStartPowerOn : eLabStartInvalidImage);
   });
 }
@@ -102,5 +114,6 @@ void CLabLoaderBoard::Load(const CLabStateFile& state_I, bool powerCycled_I) {
   // Still plugged in since the last run: the mode it was left in.
   mMode = state_I.GetNumber("mode", 0) == 1 ? EMode::eLoader : EMode::eNormal;
   if (mMode == EMode::eNormal && !mLoader.IsImageValid()) mMode = EMode::eLoader;
+  if (mMode == EMode::eNormal) StartNormal();
   mLoader.Boot(eLabStartPowerOn);
 }

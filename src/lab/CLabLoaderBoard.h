@@ -53,10 +53,13 @@ class CLabLoaderBoard : public CLabBoard {
   // A reset command reached the engine: restart into the mode the image
   // allows.
   void Restart();
+  // Normal mode starts: the release its image names is the one shown.
+  void StartNormal();
 
   SLabIdentity mNormal;
   SLabIdentity mLoaderIdentity;
   CLabLoader mLoader;
   EMode mMode = EMode::eNormal;
+  uint16_t mRelease = 0;  // shown in normal mode
   uint32_t mEEPROMInits = 0;
 };

@@ -1,5 +1,7 @@
 #include "lab/CLabProgrammingBoard.h"
 
+#include "lab/LabRelease.h"
+
 void SLabBoardIds::ApplyTo(SLabProgrammingDescription& description_IO) const {
   if (vendorId != 0) description_IO.vendorId = vendorId;
   if (productId != 0) description_IO.productId = productId;
@@ -38,12 +40,13 @@ std::vector<SLabInterface> CLabProgrammingBoard::GetInterfaces() const {
       mMode == EMode::eNormal ? mDescription.productId : mDescription.loaderProductId;
   identity.link = ELabLink::eHid;
   identity.usages = {mDescription.usage};
-  identity.release = mDescription.release;
+  identity.release = mMode == EMode::eNormal ? mRelease : mDescription.release;
   return identity.Interfaces();
 }
 
 void CLabProgrammingBoard::PowerOn() {
   mMode = IsImageValid() ? EMode::eNormal : EMode::eLoader;
+  mRelease = FindLabRelease(mImage.data(), mImage.size()).value_or(mDescription.release);
   mSession = false;
   mStatus = kStatusReady;
   mLastPhase = 0;
@@ -103,6 +106,8 @@ bool CLabProgrammingBoard::OnSetFeature(const DeviceInfo&, const std::vector<uin
       if (!mRefusedSinceStart) {
         mStoredSum = ImageSum();
         mSumStored = true;
+        // The module restarts in place into the image it now holds.
+        mRelease = FindLabRelease(mImage.data(), mImage.size()).value_or(mDescription.release);
       }
       mSession = false;
       mBusyUntil = now + mDescription.endBusy;

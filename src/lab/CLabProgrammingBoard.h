@@ -99,6 +99,7 @@ class CLabProgrammingBoard : public CLabBoard {
   uint32_t mStoredSum = 0;
   bool mSumStored = false;
   EMode mMode = EMode::eNormal;
+  uint16_t mRelease = 0;  // shown in normal mode, from the image at power-on
   bool mSession = false;
   bool mRefusedSinceStart = false;
   uint8_t mLastPhase = 0;

@@ -455,7 +455,10 @@ bool OFLUpdater::prepareEntry(const std::string& kind_I, const std::string& valu
       const std::string text = StringUtilities::Format(
           TTCLocalizedNSString("Error: %s has no %s to update.").c_str(),
           device->GetDeviceName().c_str(), TTCLocalizedNSString(BoardName(kind_I)).c_str());
-      mResults.Finish(EBOARD_NOT_FOUND, text);
+      mResults.Finish(EBOARD_NOT_FOUND,
+                      StringUtilities::Format(TTCLocalizedNSString("%s has no %s").c_str(),
+                                              device->GetDeviceName().c_str(),
+                                              TTCLocalizedNSString(BoardName(kind_I)).c_str()));
       if (mDelegate != nullptr) {
         OSUtils::DispatchOnMainThread([this, text] { mDelegate->notifyDialog(text); });
       }

@@ -7,6 +7,7 @@
 // blocks of its second CPU, the others are plain images of a few pages. The
 // bytes are a pattern with no 0xFF, so that every word is written.
 
+#include <algorithm>
 #include <cstdint>
 #include <cstdio>
 #include <filesystem>
@@ -26,6 +27,15 @@ Bytes Pattern(size_t size_I, uint32_t seed_I) {
     byte = static_cast<uint8_t>((state >> 24) % 0xFF);
   }
   return data;
+}
+
+// The image names its release as the lab's boards read it: "TAVREL", then
+// the release low byte first, a little way into the image.
+Bytes Released(Bytes data_I, uint16_t release_I) {
+  const uint8_t tag[] = {'T', 'A', 'V', 'R', 'E', 'L', static_cast<uint8_t>(release_I & 0xFF),
+                         static_cast<uint8_t>(release_I >> 8)};
+  std::copy(std::begin(tag), std::end(tag), data_I.begin() + 16);
+  return data_I;
 }
 
 std::string Hex2(unsigned value_I) {
@@ -108,20 +118,27 @@ int main(int argc, char** argv) {
   std::error_code error;
   std::filesystem::create_directories(folder, error);
 
+  // Each a release newer than the board ships with: pens 1.20, the
+  // vendor-class touch 2.10, the other boards and the tunnel's bridge 1.00.
   bool ok = true;
   uint32_t seed = 1;
   for (const char* product : {"classic-tablet", "wireless-tablet", "wireless-tablet-1122",
                               "display-hid", "display-ftdi"}) {
     ok &= Write(folder / (std::string(product) + ".pen"),
-                SRecordText(kPenStart, Pattern(kPenBytes, seed++)));
+                SRecordText(kPenStart, Released(Pattern(kPenBytes, seed++), 0x0130)));
   }
-  ok &= Write(folder / "tunnel-tablet.pen", SRecordText(kTunnelStart, Pattern(kTunnelBytes, seed++)));
-  ok &= Write(folder / "classic-tablet.touch", SRecordText(kTouchStart, Pattern(kTouchBytes, seed++)));
-  ok &= Write(folder / "wireless-tablet.hex", IntelHexText(Pattern(32 * 1024, seed++)));
-  ok &= Write(folder / "display-hid.hex", IntelHexText(Pattern(32 * 1024, seed++)));
-  ok &= Write(folder / "wireless-tablet.airoflash2", AsText(Pattern(40 * 1024, seed++)));
-  ok &= Write(folder / "wireless-tablet-1122.airoflash", AsText(Pattern(40 * 1024, seed++)));
-  ok &= Write(folder / "display-hid.bin", AsText(Pattern(8 * 1024, seed++)));
-  ok &= Write(folder / "display-ftdi.bin", AsText(Pattern(8 * 1024, seed++)));
+  ok &= Write(folder / "tunnel-tablet.pen",
+              SRecordText(kTunnelStart, Released(Pattern(kTunnelBytes, seed++), 0x0110)));
+  ok &= Write(folder / "classic-tablet.touch",
+              SRecordText(kTouchStart, Released(Pattern(kTouchBytes, seed++), 0x0220)));
+  ok &= Write(folder / "wireless-tablet.hex",
+              IntelHexText(Released(Pattern(32 * 1024, seed++), 0x0110)));
+  ok &= Write(folder / "display-hid.hex", IntelHexText(Released(Pattern(32 * 1024, seed++), 0x0110)));
+  ok &= Write(folder / "wireless-tablet.airoflash2",
+              AsText(Released(Pattern(40 * 1024, seed++), 0x0110)));
+  ok &= Write(folder / "wireless-tablet-1122.airoflash",
+              AsText(Released(Pattern(40 * 1024, seed++), 0x0110)));
+  ok &= Write(folder / "display-hid.bin", AsText(Released(Pattern(8 * 1024, seed++), 0x0110)));
+  ok &= Write(folder / "display-ftdi.bin", AsText(Released(Pattern(8 * 1024, seed++), 0x0110)));
   return ok ? 0 : 1;
 }
