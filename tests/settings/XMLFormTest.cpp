@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
-#include <cstdio>
 #include <filesystem>
 #include <stdexcept>
 
@@ -13,13 +12,11 @@
 #include "settings/XmlUtils.h"
 #include "support/LogCapture.h"
 
-namespace {
+namespace fs = std::filesystem;
 
-std::shared_ptr<CSettingsMap> ReadXmlMap(const std::string& xml_I) {
+static std::shared_ptr<CSettingsMap> ReadXmlMap(const std::string& xml_I) {
   return CSettingsMap::CastToMap(CSettingsObject::ReadFromXMLBuffer(xml_I), false);
 }
-
-std::shared_ptr<CSettingsMap> EveryClassTree() { return SettingsTestTrees::EveryClass(); }
 
 TEST(XMLReadTest, HandWrittenDocumentReadsWithOrWithoutTypes) {
   LogCapture capture;
@@ -55,15 +52,11 @@ TEST(XMLReadTest, HandWrittenDocumentReadsWithOrWithoutTypes) {
 
 TEST(XMLReadTest, DuplicatesAndBadValuesFollowTheirRules) {
   LogCapture capture;
-  auto typed =
-      ReadXmlMap("<root type=\"map\"><A type=\"integer\">1</A><A type=\"integer\">2</A></root>");
-  ASSERT_TRUE(typed);
-  EXPECT_EQ(typed->IntegerForKeyWithDefault("A", int64_t{0}), 2);
+  const std::string twice = "<A type=\"integer\">1</A><A type=\"integer\">2</A></root>";
+  EXPECT_EQ(ReadXmlMap("<root type=\"map\">" + twice)->IntegerForKeyWithDefault("A", int64_t{0}),
+            2);
   EXPECT_FALSE(capture.LogContains("duplicate key"));
-
-  auto untyped = ReadXmlMap("<root><A type=\"integer\">1</A><A type=\"integer\">2</A></root>");
-  ASSERT_TRUE(untyped);
-  EXPECT_EQ(untyped->IntegerForKeyWithDefault("A", int64_t{0}), 2);
+  EXPECT_EQ(ReadXmlMap("<root>" + twice)->IntegerForKeyWithDefault("A", int64_t{0}), 2);
   EXPECT_TRUE(capture.LogContains("[W] CSettingsMap::ReadFromXMLNode duplicate key A"));
 
   auto bad = ReadXmlMap(
@@ -99,26 +92,24 @@ TEST(XMLReadTest, FiltersDropNodesForOtherLanguagesAndPlatforms) {
 
 TEST(XMLReadTest, UnusableDocumentsGiveEmptyResults) {
   LogCapture capture;
-  EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer(""), nullptr);
-  EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer("<root><a></root>"), nullptr);
+  for (const char* bad :
+       {"", "<root><a></root>", "<root type=\"integer\">x", "<root type=\"nonsense\"/>",
+        "<plist version=\"1.0\"/>", "<plist version=\"1.0\"><set/></plist>"}) {
+    EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer(bad), nullptr) << bad;
+  }
   EXPECT_TRUE(capture.LogContains("[E] TraceXmlError: "));
-  EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer("<root type=\"integer\">x"), nullptr);
-  EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer("<root type=\"nonsense\"/>"), nullptr);
-
   std::string errorText = "untouched";
   EXPECT_EQ(CSettingsObject::ReadFromXMLFile("/nonexistent-folder/tdc.xml", errorText), nullptr);
   // The load traced and cleared the error before it could be reported here.
   EXPECT_EQ(errorText, "");
-
   // Another root name still loads, after saying so.
-  auto other = ReadXmlMap("<settings><a>1</a></settings>");
-  ASSERT_TRUE(other);
+  EXPECT_TRUE(ReadXmlMap("<settings><a>1</a></settings>"));
   EXPECT_TRUE(capture.AssertionContains("rootName == SETTINGS_NODE_ROOT_ID"));
 }
 
 TEST(XMLReadTest, HostileDocumentsAreRefused) {
   LogCapture capture;
-  auto nested = [](int depth_I) {
+  const auto nested = [](int depth_I) {
     std::string xml = "<root>";
     for (int i = 0; i < depth_I; ++i) xml += "<a>";
     xml += "x";
@@ -136,20 +127,15 @@ TEST(XMLReadTest, HostileDocumentsAreRefused) {
     for (int k = 0; k < 10; ++k) laughs += "&l" + std::to_string(i - 1) + ";";
     laughs += "\">";
   }
-  laughs += "]><root><a>&l29;</a></root>";
   const auto start = std::chrono::steady_clock::now();
-  auto map = ReadXmlMap(laughs);
+  auto map = ReadXmlMap(laughs + "]><root><a>&l29;</a></root>");
   EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(5));
-  if (map) {
-    EXPECT_LT(map->StringForKeyWithDefault("a", "").size(), 1000u);
-  }
-
+  EXPECT_LT(map ? map->StringForKeyWithDefault("a", "").size() : 0u, 1000u);
   auto external = ReadXmlMap(
       "<?xml version=\"1.0\"?><!DOCTYPE root [<!ENTITY e SYSTEM \"file:///etc/passwd\">]>"
       "<root><a>&e;</a></root>");
-  if (external) {
-    EXPECT_EQ(external->StringForKeyWithDefault("a", "").find("root:"), std::string::npos);
-  }
+  EXPECT_EQ(external ? external->StringForKeyWithDefault("a", "").find("root:") : std::string::npos,
+            std::string::npos);
 }
 
 TEST(XMLWriteTest, DocumentsAreIndentedAndNamedAsAsked) {
@@ -173,13 +159,25 @@ TEST(XMLWriteTest, DocumentsAreIndentedAndNamedAsAsked) {
             "<K type=\"kestring\"><![CDATA[x&rsqbracket;y]]></K>\n");
 }
 
-TEST(XMLWriteTest, EveryClassRoundTripsAndTheKnownLossesStay) {
-  auto tree = EveryClassTree();
-  auto back = ReadXmlMap(tree->GetXMLString(""));
-  ASSERT_TRUE(back);
-  EXPECT_TRUE(back->IsEqualTo(tree)) << back->GetTraceString();
-  EXPECT_EQ(back->ObjectForKey<CSettingsKEString>("Secret")->GetValue(), "a]]>b]c");
+TEST(XMLWriteTest, EveryClassRoundTripsThroughBufferFileAndPropertyList) {
+  auto tree = SettingsTestTrees::EveryClass();
+  const std::string path = (fs::temp_directory_path() / "settings-file.xml").string();
+  ASSERT_TRUE(tree->SaveXMLToFile(path));
+  std::string errorText;
+  const std::pair<const char*, std::shared_ptr<CSettingsObject>> readBack[] = {
+      {"buffer", CSettingsObject::ReadFromXMLBuffer(tree->GetXMLString(""))},
+      {"file", CSettingsMap::ReadFromXMLFile(path, errorText)},
+      {"plist", CSettingsObject::ReadFromXMLBuffer(tree->GetPListString(true))}};
+  for (const auto& [form, back] : readBack) {
+    ASSERT_TRUE(back) << form;
+    EXPECT_TRUE(back->IsEqualTo(tree)) << form << ": " << back->GetTraceString();
+  }
+  EXPECT_EQ(errorText, "");
+  EXPECT_FALSE(CSettingsArray::ReadFromXMLFile(path, errorText));
+  fs::remove(path);
+  EXPECT_FALSE(CSettingsMap::New()->SaveXMLToFile("/nonexistent-folder/x.xml"));
 
+  // The known losses stay.
   auto lossy = CSettingsMap::New();
   lossy->SetKeyAndString("padded", "  text  ");
   lossy->SetKeyAndString("blank", "   ");
@@ -199,31 +197,17 @@ TEST(XMLWriteTest, InvalidKeysThrowFromTheStringAndFailTheSave) {
   map->SetKeyAndObject("inner", CSettingsMap::New());
   map->ObjectForKey<CSettingsMap>("inner")->SetKeyAndInteger("1bad", 1);
   EXPECT_THROW(map->GetXMLString(""), std::invalid_argument);
-
-  const std::string path = (std::filesystem::temp_directory_path() / "settings-bad.xml").string();
-  std::remove(path.c_str());
+  const std::string path = (fs::temp_directory_path() / "settings-bad.xml").string();
+  fs::remove(path);
   EXPECT_FALSE(map->SaveXMLToFile(path));
   EXPECT_TRUE(capture.LogContains(
       "[E] CSettingsObject::SaveXMLToFile: XmlUtils::CreateNode passed invalid node name: "
       "\"1bad\""));
-  EXPECT_FALSE(std::filesystem::exists(path));
+  EXPECT_FALSE(fs::exists(path));
 }
 
-TEST(XMLFileTest, SavedFileReadsBack) {
-  const std::string path = (std::filesystem::temp_directory_path() / "settings-file.xml").string();
-  auto tree = EveryClassTree();
-  ASSERT_TRUE(tree->SaveXMLToFile(path));
-  std::string errorText;
-  auto back = CSettingsMap::ReadFromXMLFile(path, errorText);
-  ASSERT_TRUE(back);
-  EXPECT_TRUE(back->IsEqualTo(tree));
-  EXPECT_EQ(errorText, "");
-  EXPECT_FALSE(CSettingsArray::ReadFromXMLFile(path, errorText));
-  std::remove(path.c_str());
-  EXPECT_FALSE(CSettingsMap::New()->SaveXMLToFile("/nonexistent-folder/x.xml"));
-}
-
-TEST(PListWriteTest, PropertyListUsesItsOwnElements) {
+TEST(PListWriteTest, PropertyListUsesItsOwnElementsAndNullHasNone) {
+  LogCapture capture;
   auto map = CSettingsMap::New();
   map->SetKeyAndBool("b", true);
   map->SetKeyAndInteger("i", 3);
@@ -232,6 +216,7 @@ TEST(PListWriteTest, PropertyListUsesItsOwnElements) {
   map->SetKeyAndKEString("k", "p]q");
   map->SetKeyAndObject("d", CSettingsBytes::New({1, 2, 3}));
   map->SetKeyAndObject("a", CSettingsArray::New());
+  map->SetKeyAndObject("n", nullptr);  // leaves its key alone
   EXPECT_EQ(map->GetPListString(false),
             "<plist version=\"1.0\">\n"
             "  <dict>\n"
@@ -245,31 +230,15 @@ TEST(PListWriteTest, PropertyListUsesItsOwnElements) {
             "    <integer>3</integer>\n"
             "    <key>k</key>\n"
             "    <string kestring=\"1\"><![CDATA[p&rsqbracket;q]]></string>\n"
+            "    <key>n</key>\n"
             "    <key>r</key>\n"
             "    <real>0.500000</real>\n"
             "    <key>s</key>\n"
             "    <string>x&amp;y</string>\n"
             "  </dict>\n"
             "</plist>\n");
-  EXPECT_EQ(map->GetPListString(true).rfind("<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n", 0), 0u);
-}
-
-TEST(PListWriteTest, NullHasNoFormAndLeavesItsKeyAlone) {
-  LogCapture capture;
-  auto map = CSettingsMap::New();
-  map->SetKeyAndObject("n", nullptr);
-  const std::string plist = map->GetPListString(false);
-  EXPECT_NE(plist.find("<key>n</key>\n  </dict>"), std::string::npos) << plist;
   EXPECT_TRUE(capture.AssertionContains("Unknown type"));
-}
-
-TEST(PListReadTest, EveryClassRoundTrips) {
-  auto tree = EveryClassTree();
-  auto back =
-      CSettingsMap::CastToMap(CSettingsObject::ReadFromXMLBuffer(tree->GetPListString(true)), true);
-  ASSERT_TRUE(back);
-  EXPECT_TRUE(back->IsEqualTo(tree)) << back->GetTraceString();
-  EXPECT_EQ(back->TypeNameForKeyOrEmpty("Secret"), "kestring");
+  EXPECT_EQ(map->GetPListString(true).rfind("<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n", 0), 0u);
 }
 
 TEST(PListReadTest, ForeignAndDamagedListsReadWhatTheyCan) {
@@ -294,9 +263,4 @@ TEST(PListReadTest, ForeignAndDamagedListsReadWhatTheyCan) {
   EXPECT_TRUE(capture.LogContains("[I] CSettingsMap::ReadFromPListNode got node with name orphan"));
   EXPECT_EQ(map->StringForKeyWithDefault("spaced", ""), "s");
   EXPECT_EQ(map->ObjectCount(), 4u);
-
-  EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer("<plist version=\"1.0\"/>"), nullptr);
-  EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer("<plist version=\"1.0\"><set/></plist>"), nullptr);
 }
-
-}  // namespace
