@@ -7,11 +7,6 @@
 
 using CBlocks = std::vector<SContinuousDataBlock>;
 
-static std::vector<uint8_t> Concat(std::vector<uint8_t> a_I, const std::vector<uint8_t>& b_I) {
-  a_I.insert(a_I.end(), b_I.begin(), b_I.end());
-  return a_I;
-}
-
 TEST(SRecFrontEnd, ChoosesTheReaderFromExtensionAndInterface) {
   // Only "bin" asks the interface.
   const struct {
@@ -100,36 +95,6 @@ TEST(SRecReader, ReadsDataRecordsOfEveryAddressWidth) {
   EXPECT_EQ(source.GetSRecData(), expected);
   EXPECT_EQ(source.GetSRecDataRef(), expected);
   EXPECT_TRUE(source.IsLoaded());
-}
-
-TEST(SRecReader, MergesRecordsAsTheyComeWithTheFirstDataWinning) {
-  CTempFolder folder;
-  CSRec source;
-  const auto load = [&](const std::vector<std::string>& lines_I) {
-    std::string text;
-    for (const std::string& line : lines_I) text += line + "\n";
-    return source.Load(folder.Write("m.pen", text), EHID_INTERFACE);
-  };
-  // Descending addresses: every record goes in front of the one block.
-  std::vector<std::string> down;
-  for (int i = 4; i >= 0; --i) down.push_back(SRecLine('1', i * 16, Bytes(16, uint8_t(i * 16))));
-  ASSERT_TRUE(load(down));
-  EXPECT_EQ(source.GetSRecData(), (CBlocks{{0, Bytes(80)}}));
-
-  // A record that fills the gap between two blocks joins the first of them;
-  // the two blocks then touch and stay two.
-  ASSERT_TRUE(load({SRecLine('1', 0x00, Bytes(16, 0x00)), SRecLine('1', 0x20, Bytes(16, 0x20)),
-                    SRecLine('1', 0x10, Bytes(16, 0x10)), SRecLine('1', 0x1000, Bytes(4, 0x99))}));
-  EXPECT_EQ(source.GetSRecData(),
-            (CBlocks{{0x00, Bytes(32)}, {0x20, Bytes(16, 0x20)}, {0x1000, Bytes(4, 0x99)}}));
-
-  // A record with the address of another, or one starting inside a block
-  // and running past its end, is dropped whole and without a word.
-  LogCapture capture;
-  ASSERT_TRUE(load({SRecLine('3', 0x100, Bytes(16, 0x40)), SRecLine('3', 0x100, Bytes(16, 0x80)),
-                    SRecLine('3', 0x108, Bytes(16, 0xC0)), SRecLine('3', 0x110, Bytes(2, 0x50))}));
-  EXPECT_EQ(source.GetSRecData(), (CBlocks{{0x100, Concat(Bytes(16, 0x40), Bytes(2, 0x50))}}));
-  EXPECT_FALSE(capture.LogContains("[E]"));
 }
 
 TEST(SRecReader, RefusesMalformedFilesWithTheirLineNumber) {

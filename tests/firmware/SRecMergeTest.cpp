@@ -1,4 +1,6 @@
-// The S-record merge against a plain walk over all blocks, on random files.
+// The S-record merge against a plain walk over all blocks, on random files:
+// descending runs, repeated addresses where the first data wins, records
+// starting inside a block, gap fillers that join the block before them.
 
 #include <gtest/gtest.h>
 
