@@ -22,28 +22,19 @@ static bool StaysFalse(const std::atomic<bool>& flag_I) {
   return !flag_I;
 }
 
-// A thread that takes `take_I`, flags it and gives it back.
-template <typename Take, typename Give>
-static std::thread Taker(std::atomic<bool>& taken_O, Take take_I, Give give_I) {
-  return std::thread([&taken_O, take_I, give_I] {
-    EXPECT_EQ(take_I(), 0);
-    taken_O = true;
-    EXPECT_EQ(give_I(), 0);
-  });
-}
-
 TEST(CTavSemaphore, RecursiveOnOneThreadExclusiveAcrossThreads) {
   const auto semaphore = CTavSemaphore::New("mHIDMgrSemaphore");
   ASSERT_NE(dynamic_cast<CLinuxSemaphore*>(semaphore.get()), nullptr);
-  EXPECT_EQ(static_cast<CLinuxSemaphore&>(*semaphore).GetName(), "mHIDMgrSemaphore");
   EXPECT_EQ(semaphore->Init(), 0);
   EXPECT_EQ(semaphore->RequestSemaphore(), 0);
   EXPECT_EQ(semaphore->RequestSemaphore(), 0);  // the same thread again
 
   std::atomic<bool> taken{false};
-  std::thread other = Taker(
-      taken, [&] { return semaphore->RequestSemaphore(); },
-      [&] { return semaphore->ReleaseSemaphore(); });
+  std::thread other([&] {
+    EXPECT_EQ(semaphore->RequestSemaphore(), 0);
+    taken = true;
+    EXPECT_EQ(semaphore->ReleaseSemaphore(), 0);
+  });
   EXPECT_TRUE(StaysFalse(taken));
   EXPECT_EQ(semaphore->ReleaseSemaphore(), 0);
   EXPECT_TRUE(StaysFalse(taken));  // still held once
@@ -68,9 +59,11 @@ TEST(CTavSemaphore, ReleaseWithoutHoldingAssertsAndLeavesTheLockAlone) {
   std::thread([&] { foreignRelease = semaphore->ReleaseSemaphore(); }).join();
   EXPECT_EQ(foreignRelease, 65535);
   std::atomic<bool> taken{false};
-  std::thread waiter = Taker(
-      taken, [&] { return semaphore->RequestSemaphore(); },
-      [&] { return semaphore->ReleaseSemaphore(); });
+  std::thread waiter([&] {
+    semaphore->RequestSemaphore();
+    taken = true;
+    semaphore->ReleaseSemaphore();
+  });
   EXPECT_TRUE(StaysFalse(taken));
   EXPECT_EQ(semaphore->ReleaseSemaphore(), 0);
   EXPECT_TRUE(BecomesTrue(taken));
@@ -82,12 +75,14 @@ TEST(CTavReaderWriterSemaphore, ReadersShareWritersExclude) {
   const auto semaphore = CTavReaderWriterSemaphore::New("settings");
   ASSERT_NE(dynamic_cast<CLinuxReaderWriterSemaphore*>(semaphore.get()), nullptr);
   EXPECT_EQ(semaphore->Init(), 0);
-  const auto read = [&] { return semaphore->RequestReader(); };
-  const auto unread = [&] { return semaphore->ReleaseReader(); };
 
-  EXPECT_EQ(read(), 0);
+  EXPECT_EQ(semaphore->RequestReader(), 0);
   std::atomic<bool> secondReader{false};
-  std::thread reader = Taker(secondReader, read, unread);
+  std::thread reader([&] {
+    EXPECT_EQ(semaphore->RequestReader(), 0);
+    secondReader = true;
+    EXPECT_EQ(semaphore->ReleaseReader(), 0);
+  });
   EXPECT_TRUE(BecomesTrue(secondReader));  // while the first still reads
   reader.join();
 
@@ -99,11 +94,11 @@ TEST(CTavReaderWriterSemaphore, ReadersShareWritersExclude) {
     EXPECT_EQ(semaphore->ReleaseWriter(), 0);
   });
   EXPECT_TRUE(StaysFalse(writing));
-  EXPECT_EQ(unread(), 0);
+  EXPECT_EQ(semaphore->ReleaseReader(), 0);
   EXPECT_TRUE(BecomesTrue(writing));
   // The writer holds it now, so a reader waits until it is done.
-  EXPECT_EQ(read(), 0);
-  EXPECT_EQ(unread(), 0);
+  EXPECT_EQ(semaphore->RequestReader(), 0);
+  EXPECT_EQ(semaphore->ReleaseReader(), 0);
   writer.join();
 }
 

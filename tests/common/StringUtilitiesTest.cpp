@@ -122,19 +122,13 @@ TEST(UTF8, EncodesAtEveryLengthBoundaryAndDecodesBack) {
 TEST(UTF8, RefusesMalformedSequences) {
   EXPECT_TRUE(IsValidUTF8(""));
   EXPECT_TRUE(IsValidUTF8("plain ascii"));
+  // A continuation without a lead, cut sequences, a lead before a
+  // non-continuation, overlong forms of 0, 0x7F, 0x7FF and 0xFFFF, 0x110000
+  // beyond Unicode, a five-byte lead, and a byte no sequence starts with.
   const char* bad[] = {
-      "\x80",              // continuation without a lead
-      "\xC3",              // cut two-byte sequence
-      "\xE2\x82",          // cut three-byte sequence
-      "\xC3\x41",          // lead followed by a non-continuation
-      "\xC0\x80",          // overlong NUL
-      "\xC1\xBF",          // overlong 0x7F
-      "\xE0\x9F\xBF",      // overlong 0x7FF
-      "\xF0\x8F\xBF\xBF",  // overlong 0xFFFF
-      "\xF4\x90\x80\x80",  // 0x110000, beyond Unicode
-      "\xF8\x88\x80\x80\x80",
-      "\xFF",
-  };
+      "\x80",     "\xC3",         "\xE2\x82",         "\xC3\x41",         "\xC0\x80",
+      "\xC1\xBF", "\xE0\x9F\xBF", "\xF0\x8F\xBF\xBF", "\xF4\x90\x80\x80", "\xF8\x88\x80\x80\x80",
+      "\xFF"};
   for (const char* sequence : bad) {
     const std::string text(sequence);
     EXPECT_FALSE(IsValidUTF8(text)) << text.size();
