@@ -217,45 +217,28 @@ TEST(CompressedDocumentTest, RoundTripsThroughTheWrapperMap) {
 
 TEST(CompressedDocumentTest, DamagedWrappersGiveEmptyResults) {
   LogCapture capture;
-  const Bytes inner = CSettingsInteger::New(1)->GetASN1Binary();
-  const Bytes zipped = CompressionUtils::Compress(inner);
-  auto wrap = [](std::shared_ptr<CSettingsObject> bytes_I,
-                 std::shared_ptr<CSettingsObject> size_I) {
-    auto map = CSettingsMap::New();
-    if (bytes_I) map->SetKeyAndObject("bytes", bytes_I);
-    if (size_I) map->SetKeyAndObject("originalSize", size_I);
-    return map->GetASN1Binary();
-  };
-
-  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(
-                wrap(CSettingsBytes::New(zipped), CSettingsInteger::New(0))),
-            nullptr);
-  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(wrap(nullptr, CSettingsInteger::New(9))),
-            nullptr);
-  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(
-                wrap(CSettingsString::New("x"), CSettingsInteger::New(9))),
-            nullptr);
-  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(CSettingsArray::New()->GetASN1Binary()),
-            nullptr);
-  EXPECT_TRUE(capture.LogContains("CSettingsMap::CastToMap got a array"));
-
+  const Bytes zipped = CompressionUtils::Compress(CSettingsInteger::New(1)->GetASN1Binary());
   Bytes damaged = zipped;
   damaged[damaged.size() / 2] ^= 0x5A;
   damaged.resize(damaged.size() - 2);
-  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(
-                wrap(CSettingsBytes::New(damaged), CSettingsInteger::New(9))),
-            nullptr);
-  EXPECT_TRUE(capture.AssertionContains("!expandedBuffer.empty()"));
-
+  const auto wrap = [](std::shared_ptr<CSettingsObject> bytes_I, int64_t size_I) {
+    auto map = CSettingsMap::New();
+    if (bytes_I) map->SetKeyAndObject("bytes", bytes_I);
+    map->SetKeyAndInteger("originalSize", size_I);
+    return map->GetASN1Binary();
+  };
   // A size no zlib data of this length can reach is refused, not allocated.
-  for (int64_t size : {int64_t{1} << 40, int64_t{-1}}) {
-    EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(
-                  wrap(CSettingsBytes::New(zipped), CSettingsInteger::New(size))),
-              nullptr);
+  for (const Bytes& wrapper :
+       {wrap(CSettingsBytes::New(zipped), 0), wrap(nullptr, 9), wrap(CSettingsString::New("x"), 9),
+        CSettingsArray::New()->GetASN1Binary(), wrap(CSettingsBytes::New(damaged), 9),
+        wrap(CSettingsBytes::New(zipped), int64_t{1} << 40),
+        wrap(CSettingsBytes::New(zipped), -1)}) {
+    EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(wrapper), nullptr);
   }
+  EXPECT_TRUE(capture.LogContains("CSettingsMap::CastToMap got a array"));
+  EXPECT_TRUE(capture.AssertionContains("!expandedBuffer.empty()"));
   // A size too small still expands: the buffer grows.
-  auto small = CSettingsObject::ReadFromCompressedBinary(
-      wrap(CSettingsBytes::New(zipped), CSettingsInteger::New(1)));
+  auto small = CSettingsObject::ReadFromCompressedBinary(wrap(CSettingsBytes::New(zipped), 1));
   ASSERT_TRUE(small);
   EXPECT_TRUE(small->IsEqualTo(CSettingsInteger::New(1)));
 }

@@ -8,6 +8,7 @@
 
 #include "settings/CSettingsMap.h"
 #include "settings/CSettingsNULL.h"
+#include "settings/SettingsTestTrees.h"
 #include "support/LogCapture.h"
 
 namespace {
@@ -155,26 +156,15 @@ TEST(JSONWriteTest, WhatTheWriterCannotExpressDoesNotComeBack) {
 }
 
 TEST(JSONFileTest, ConfigurationRoundTripsThroughAFile) {
-  auto board = CSettingsMap::New();
-  board->SetKeyAndString("Interface", "HID");
-  board->SetKeyAndInteger("ProductId", 0x0357);
-  board->SetKeyAndDouble("Delay", 0.25);
-  board->SetKeyAndBool("Reset", false);
-  board->SetKeyAndObject("Key", CSettingsBytes::New({0, 255, 16, 32}));
-  auto boards = CSettingsArray::New();
-  boards->AddObject(board);
-  boards->AddObject(board->DeepCopy());
-  auto config = CSettingsMap::New();
-  config->SetKeyAndObject("Boards", boards);
+  auto config = SettingsTestTrees::Configuration(40);
   config->SetKeyAndString("Name", "Pen display 13");
   config->SetKeyAndObject("Nothing", nullptr);
-
   const std::string path = TempPath("roundtrip.ini");
   ASSERT_TRUE(config->SaveJSONToFile(path));
   auto back = CSettingsMap::CastToMap(CSettingsObject::ReadFromJSONFile(path), true);
   ASSERT_TRUE(back);
   // Compare without the null, which IsEqualTo never matches.
-  EXPECT_EQ(back->ObjectCount(), 3u);
+  EXPECT_EQ(back->ObjectCount(), 4u);
   config->RemoveObjectForKey("Nothing");
   back->RemoveObjectForKey("Nothing");
   EXPECT_TRUE(back->IsEqualTo(config));
