@@ -9,8 +9,6 @@
 #include "common/CSteadyClock.h"
 #include "common/CVirtualClock.h"
 
-namespace {
-
 class ClockInstalled : public ::testing::Test {
  protected:
   void SetUp() override { CClock::Set(mClock); }
@@ -25,30 +23,23 @@ TEST_F(ClockInstalled, LongWaitsCostNoWallTime) {
   EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(2));
 }
 
-TEST_F(ClockInstalled, ScheduledTaskRunsOnAnotherThreadBeforeTheSleepPastItReturns) {
-  std::atomic<bool> ran{false};
-  std::thread::id taskThread;
-  mClock->Schedule(2.5, [&] {
-    taskThread = std::this_thread::get_id();
-    ran = true;
-  });
-  TavSleep(1.0);
-  TavSleep(1.0);
-  EXPECT_FALSE(ran);
-  TavSleep(1.0);
-  EXPECT_TRUE(ran);
-  EXPECT_NE(taskThread, std::this_thread::get_id());
-}
-
-TEST_F(ClockInstalled, TasksRunInDueOrderAndTasksMaySleep) {
+TEST_F(ClockInstalled, TasksRunOnAnotherThreadInDueOrderBeforeTheSleepPastThemReturns) {
   std::vector<int> order;
+  std::thread::id taskThread;
   mClock->Schedule(3, [&] { order.push_back(3); });
   mClock->Schedule(1, [&] {
     order.push_back(1);
+    taskThread = std::this_thread::get_id();
     TavSleep(0.5);  // must not wait for itself
   });
   mClock->Schedule(1, [&] { order.push_back(2); });
-  TavSleep(5);
+  TavSleep(0.5);
+  TavSleep(0.4);
+  EXPECT_TRUE(order.empty());
+  TavSleep(0.1);
+  EXPECT_EQ(order, (std::vector<int>{1, 2}));
+  EXPECT_NE(taskThread, std::this_thread::get_id());
+  TavSleep(4);
   EXPECT_EQ(order, (std::vector<int>{1, 2, 3}));
   EXPECT_DOUBLE_EQ(mClock->Now(), 5.5);
 }
@@ -58,29 +49,22 @@ TEST_F(ClockInstalled, PollUntilStopsAtTheAnswerOrTheTimeout) {
   EXPECT_TRUE(TavPollUntil(10, 1, [&] { return ++calls == 4; }));
   EXPECT_EQ(calls, 4);
   EXPECT_DOUBLE_EQ(mClock->Now(), 3.0);
-
   calls = 0;
   EXPECT_FALSE(TavPollUntil(5, 1, [&] { return ++calls < 0; }));
   EXPECT_EQ(calls, 6);  // asked at 0,1,...,5
 }
 
-TEST(SteadyClock, ScheduleRunsAfterRealDelay) {
-  CSteadyClock clock;
+TEST(SteadyClock, ScheduleRunsAfterRealDelayAndPendingTasksDieWithTheClock) {
   std::atomic<bool> ran{false};
-  const double start = clock.Now();
-  clock.Schedule(0.02, [&] { ran = true; });
-  while (!ran && clock.Now() - start < 2.0) clock.Sleep(0.005);
-  EXPECT_TRUE(ran);
-  EXPECT_GE(clock.Now() - start, 0.02);
-}
-
-TEST(SteadyClock, PendingTasksAreDroppedOnDestruction) {
-  std::atomic<bool> ran{false};
+  std::atomic<bool> dropped{false};
   {
     CSteadyClock clock;
-    clock.Schedule(60, [&] { ran = true; });
+    const double start = clock.Now();
+    clock.Schedule(0.02, [&] { ran = true; });
+    clock.Schedule(60, [&] { dropped = true; });
+    while (!ran && clock.Now() - start < 2.0) clock.Sleep(0.005);
+    EXPECT_TRUE(ran);
+    EXPECT_GE(clock.Now() - start, 0.02);
   }
-  EXPECT_FALSE(ran);
+  EXPECT_FALSE(dropped);
 }
-
-}  // namespace

@@ -2,6 +2,7 @@
 #include <pwd.h>
 #include <unistd.h>
 
+#include <array>
 #include <cstdlib>
 #include <map>
 #include <optional>
@@ -9,35 +10,25 @@
 #include "common/LinuxPaths.h"
 #include "support/LogCapture.h"
 
-namespace {
-
 using namespace LinuxPaths;
 
 // Sets or clears environment variables for one test and puts them back.
 class CEnvironment {
  public:
   ~CEnvironment() {
-    for (const auto& [name, value] : mSaved) {
-      if (value) {
-        setenv(name.c_str(), value->c_str(), 1);
-      } else {
-        unsetenv(name.c_str());
-      }
-    }
+    for (const auto& [name, value] : mSaved) Apply(name, value ? value->c_str() : nullptr);
   }
   void Set(const std::string& name_I, const char* value_I) {
-    if (!mSaved.contains(name_I)) {
-      const char* old = std::getenv(name_I.c_str());
+    const char* old = std::getenv(name_I.c_str());
+    if (!mSaved.contains(name_I))
       mSaved[name_I] = old ? std::optional<std::string>(old) : std::nullopt;
-    }
-    if (value_I) {
-      setenv(name_I.c_str(), value_I, 1);
-    } else {
-      unsetenv(name_I.c_str());
-    }
+    Apply(name_I, value_I);
   }
 
  private:
+  static void Apply(const std::string& name_I, const char* value_I) {
+    value_I ? setenv(name_I.c_str(), value_I, 1) : unsetenv(name_I.c_str());
+  }
   std::map<std::string, std::optional<std::string>> mSaved;
 };
 
@@ -61,18 +52,15 @@ TEST(LinuxPaths, XDGFoldersSetUnsetAndInvalid) {
   env.Set("XDG_STATE_HOME", "relative/state");
   EXPECT_EQ(GetConfigFolderPath(), "/home/tester/.config/tavik");
   EXPECT_EQ(GetStateFolderPath(), "/home/tester/.local/state/tavik");
-}
 
-TEST(LinuxPaths, HomeFallsBackToThePasswordDatabase) {
-  CEnvironment env;
+  // Without a usable HOME the password database knows the folder.
   env.Set("XDG_CONFIG_HOME", nullptr);
   const passwd* entry = getpwuid(getuid());
   ASSERT_NE(entry, nullptr);
-  const std::string home = entry->pw_dir;
   for (const char* unusable : {static_cast<const char*>(nullptr), ""}) {
     env.Set("HOME", unusable);
-    EXPECT_EQ(GetUserFolderPath(), home);
-    EXPECT_EQ(GetConfigFolderPath(), AppendPathComponent(home, ".config/tavik"));
+    EXPECT_EQ(GetUserFolderPath(), entry->pw_dir);
+    EXPECT_EQ(GetConfigFolderPath(), AppendPathComponent(entry->pw_dir, ".config/tavik"));
   }
 }
 
@@ -81,49 +69,39 @@ TEST(LinuxPaths, ProgramFolders) {
   EXPECT_EQ(data.front(), '/');
   EXPECT_EQ(LastPathComponent(data), "tavik-fwupdater");
   EXPECT_EQ(LastPathComponent(DeleteLastPathComponent(data)), "share");
-
   const std::string executableFolder = GetExecutableFolderPath();
   EXPECT_EQ(executableFolder.front(), '/');
   EXPECT_EQ(access(AppendPathComponent(executableFolder, "tests_common").c_str(), X_OK), 0)
       << executableFolder;
 }
 
-TEST(LinuxPaths, ComponentOperations) {
-  EXPECT_EQ(AppendPathComponent("/a", "b"), "/a/b");
-  EXPECT_EQ(AppendPathComponent("/a/", "/b/"), "/a/b");
-  EXPECT_EQ(AppendPathComponent("/", "b"), "/b");
-  EXPECT_EQ(AppendPathComponent("", "b"), "b");
-  EXPECT_EQ(AppendPathComponent("/a//", ""), "/a");
-  EXPECT_EQ(AppendPathComponent("Firmware", "pen.pen"), "Firmware/pen.pen");
-
-  EXPECT_EQ(LastPathComponent("/tmp/scratch.tiff"), "scratch.tiff");
-  EXPECT_EQ(LastPathComponent("/tmp/lock/"), "lock");
-  EXPECT_EQ(LastPathComponent("scratch///"), "scratch");
-  EXPECT_EQ(LastPathComponent("/"), "/");
-  EXPECT_EQ(LastPathComponent(""), "");
-
-  EXPECT_EQ(DeleteLastPathComponent("/tmp/scratch.tiff"), "/tmp");
-  EXPECT_EQ(DeleteLastPathComponent("/tmp/lock/"), "/tmp");
-  EXPECT_EQ(DeleteLastPathComponent("/tmp//lock"), "/tmp");
-  EXPECT_EQ(DeleteLastPathComponent("/tmp"), "/");
-  EXPECT_EQ(DeleteLastPathComponent("/"), "/");
-  EXPECT_EQ(DeleteLastPathComponent("scratch.tiff"), "");
-  EXPECT_EQ(DeleteLastPathComponent(""), "");
-}
-
-TEST(LinuxPaths, ExtensionOperations) {
-  EXPECT_EQ(PathExtension("/tmp/scratch.tiff"), "tiff");
-  EXPECT_EQ(PathExtension("/fw/image.airoflash2"), "airoflash2");
-  EXPECT_EQ(PathExtension("/tmp/a.b.c/"), "c");
-  EXPECT_EQ(PathExtension("/tmp.d/scratch"), "");
-  EXPECT_EQ(PathExtension("/home/u/.profile"), "");
-  EXPECT_EQ(PathExtension("/"), "");
-
-  EXPECT_EQ(DeletePathExtension("/tmp/scratch.tiff"), "/tmp/scratch");
-  EXPECT_EQ(DeletePathExtension("/tmp.d/scratch"), "/tmp.d/scratch");
-  EXPECT_EQ(DeletePathExtension("scratch.bundle/"), "scratch");
-  EXPECT_EQ(DeletePathExtension("/home/u/.profile"), "/home/u/.profile");
-  EXPECT_EQ(DeletePathExtension("/"), "/");
+TEST(LinuxPaths, ComponentAndExtensionOperations) {
+  using Op = std::string (*)(const std::string&);
+  const struct {
+    Op op;
+    const char* name;
+    std::vector<std::pair<const char*, const char*>> cases;
+  } ops[] = {// clang-format off
+      {LastPathComponent, "LastPathComponent",
+       {{"/tmp/scratch.tiff", "scratch.tiff"}, {"/tmp/lock/", "lock"}, {"scratch///", "scratch"},
+        {"/", "/"}, {"", ""}}},
+      {DeleteLastPathComponent, "DeleteLastPathComponent",
+       {{"/tmp/scratch.tiff", "/tmp"}, {"/tmp/lock/", "/tmp"}, {"/tmp//lock", "/tmp"},
+        {"/tmp", "/"}, {"/", "/"}, {"scratch.tiff", ""}, {"", ""}}},
+      {PathExtension, "PathExtension",
+       {{"/tmp/scratch.tiff", "tiff"}, {"/fw/image.airoflash2", "airoflash2"}, {"/tmp/a.b.c/", "c"},
+        {"/tmp.d/scratch", ""}, {"/home/u/.profile", ""}, {"/", ""}}},
+      {DeletePathExtension, "DeletePathExtension",
+       {{"/tmp/scratch.tiff", "/tmp/scratch"}, {"/tmp.d/scratch", "/tmp.d/scratch"},
+        {"scratch.bundle/", "scratch"}, {"/home/u/.profile", "/home/u/.profile"}, {"/", "/"}}}};
+  const std::vector<std::array<const char*, 3>> appends{
+      {"/a", "b", "/a/b"}, {"/a/", "/b/", "/a/b"}, {"/", "b", "/b"}, {"", "b", "b"},
+      {"/a//", "", "/a"}, {"Firmware", "pen.pen", "Firmware/pen.pen"}};
+  // clang-format on
+  for (const auto& op : ops) {
+    for (const auto& [in, out] : op.cases) EXPECT_EQ(op.op(in), out) << op.name << "(" << in << ")";
+  }
+  for (const auto& [a, b, out] : appends) EXPECT_EQ(AppendPathComponent(a, b), out) << a << b;
 
   LogCapture capture;
   EXPECT_EQ(AppendPathExtension("/tmp/scratch", "tiff"), "/tmp/scratch.tiff");
@@ -133,5 +111,3 @@ TEST(LinuxPaths, ExtensionOperations) {
   EXPECT_EQ(capture.Log(),
             (std::vector<std::string>{"[W] cannot append extension 'parm' to nothing"}));
 }
-
-}  // namespace

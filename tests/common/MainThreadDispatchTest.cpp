@@ -10,9 +10,7 @@
 #include "common/OSUtils.h"
 #include "support/LogCapture.h"
 
-namespace {
-
-TEST(DispatchOnMainThread, FromAWorkerRunsOnTheMainLoopAndWaits) {
+TEST(DispatchOnMainThread, FromAWorkerRunsOnTheMainLoopWaitsAndCarriesExceptionsBack) {
   CMainThreadLoop loop;
   ASSERT_TRUE(loop.RegisterMainThread());
   const std::thread::id mainId = std::this_thread::get_id();
@@ -20,6 +18,7 @@ TEST(DispatchOnMainThread, FromAWorkerRunsOnTheMainLoopAndWaits) {
 
   std::thread::id ranOn;
   std::vector<int> order;
+  bool caught = false;
   std::thread worker([&] {
     EXPECT_FALSE(CMainThreadLoop::IsMainThread());
     for (int i = 0; i < 3; ++i) {
@@ -30,55 +29,37 @@ TEST(DispatchOnMainThread, FromAWorkerRunsOnTheMainLoopAndWaits) {
       // Synchronous: the block has run when the call returns.
       EXPECT_EQ(order.size(), static_cast<size_t>(i + 1));
     }
-    OSUtils::DispatchOnMainThread([&] { loop.Quit(); });
-  });
-  loop.Run();
-  worker.join();
-  EXPECT_EQ(ranOn, mainId);
-  EXPECT_EQ(order, (std::vector<int>{0, 1, 2}));
-}
-
-TEST(DispatchOnMainThread, OnTheMainThreadRunsAtOnceAndNests) {
-  CMainThreadLoop loop;
-  ASSERT_TRUE(loop.RegisterMainThread());
-  bool outer = false;
-  bool inner = false;
-  OSUtils::DispatchOnMainThread([&] {
-    outer = true;
-    OSUtils::DispatchOnMainThread([&] { inner = true; });  // would deadlock if queued
-  });
-  EXPECT_TRUE(outer);
-  EXPECT_TRUE(inner);
-  EXPECT_EQ(loop.RunPending(), 0u);  // nothing was queued
-}
-
-TEST(DispatchOnMainThread, WithoutALoopRunsOnTheCallingThread) {
-  EXPECT_FALSE(CMainThreadLoop::IsMainThread());
-  std::thread::id ranOn;
-  std::thread::id workerId;
-  std::thread worker([&] {
-    workerId = std::this_thread::get_id();
-    OSUtils::DispatchOnMainThread([&] { ranOn = std::this_thread::get_id(); });
-  });
-  worker.join();
-  EXPECT_EQ(ranOn, workerId);
-}
-
-TEST(DispatchOnMainThread, ExceptionReachesTheDispatcherAndTheLoopGoesOn) {
-  CMainThreadLoop loop;
-  ASSERT_TRUE(loop.RegisterMainThread());
-  bool caught = false;
-  std::thread worker([&] {
     try {
       OSUtils::DispatchOnMainThread([] { throw std::runtime_error("from main"); });
     } catch (const std::runtime_error& e) {
       caught = std::string(e.what()) == "from main";
     }
-    OSUtils::DispatchOnMainThread([&] { loop.Quit(); });
+    OSUtils::DispatchOnMainThread([&] { loop.Quit(); });  // the loop went on
   });
   loop.Run();
   worker.join();
+  EXPECT_EQ(ranOn, mainId);
+  EXPECT_EQ(order, (std::vector<int>{0, 1, 2}));
   EXPECT_TRUE(caught);
+}
+
+TEST(DispatchOnMainThread, OnTheMainThreadOrWithoutALoopRunsAtOnceInPlace) {
+  EXPECT_FALSE(CMainThreadLoop::IsMainThread());
+  std::thread::id ranOn, workerId;
+  std::thread([&] {
+    workerId = std::this_thread::get_id();
+    OSUtils::DispatchOnMainThread([&] { ranOn = std::this_thread::get_id(); });
+  }).join();
+  EXPECT_EQ(ranOn, workerId);
+
+  CMainThreadLoop loop;
+  ASSERT_TRUE(loop.RegisterMainThread());
+  bool inner = false;
+  OSUtils::DispatchOnMainThread([&] {
+    OSUtils::DispatchOnMainThread([&] { inner = true; });  // would deadlock if queued
+  });
+  EXPECT_TRUE(inner);
+  EXPECT_EQ(loop.RunPending(), 0u);  // nothing was queued
 }
 
 TEST(CMainThreadLoop, WakeHookLetsAForeignLoopDrainTheTasks) {
@@ -98,8 +79,7 @@ TEST(CMainThreadLoop, WakeHookLetsAForeignLoopDrainTheTasks) {
   std::thread worker([&] {
     for (int i = 0; i < 5; ++i) OSUtils::DispatchOnMainThread([&] { ++done; });
   });
-  int drained = 0;
-  while (drained < 5) {
+  for (int drained = 0; drained < 5;) {
     std::unique_lock<std::mutex> guard(lock);
     woken.wait(guard, [&] { return wakes > drained; });
     guard.unlock();
@@ -143,7 +123,6 @@ TEST(CMainThreadLoop, QueueRulesAndSingleRegistration) {
   EXPECT_EQ(ran, (std::vector<int>{1, 2}));
   EXPECT_EQ(loop.RunPending(), 1u);
   EXPECT_EQ(ran, (std::vector<int>{1, 2, 3}));
-
   loop.Quit();
   loop.Run();  // a Quit that came first ends the next Run at once
 
@@ -154,5 +133,3 @@ TEST(CMainThreadLoop, QueueRulesAndSingleRegistration) {
   loop.Unregister();
   EXPECT_TRUE(second.RegisterMainThread());
 }
-
-}  // namespace

@@ -5,8 +5,6 @@
 
 #include "common/OSUtils.h"
 
-namespace {
-
 using FV = FileVersion;
 
 TEST(OSUtils, VersionFromFourByteNumber) {
@@ -22,21 +20,16 @@ TEST(OSUtils, VersionFromFourByteNumber) {
   }
 }
 
-TEST(OSUtils, ProgramAndPackageVersions) {
-  const FV program = OSUtils::GetMainBundleVersion();
-  EXPECT_TRUE(program.IsValid());
-  EXPECT_EQ(program, FV(std::string(TAV_TEST_PROGRAM_VERSION)));
+TEST(OSUtils, ProgramAndPackageVersionsAndTheClock) {
+  EXPECT_EQ(OSUtils::GetMainBundleVersion(), FV(std::string(TAV_TEST_PROGRAM_VERSION)));
+  EXPECT_TRUE(OSUtils::GetMainBundleVersion().IsValid());
   EXPECT_EQ(OSUtils::GetVersionFromBundle("", true), FV());
   EXPECT_EQ(OSUtils::GetVersionFromBundle("2.1.3", true), FV(2, 1, 3, FV::EWebVersion, 0));
   EXPECT_EQ(OSUtils::GetVersionFromBundle("2.1.3b4", false), FV(2, 1, 3, FV::EBetaVersion, 4));
-}
 
-TEST(OSUtils, MicrosecondsFollowTheSteadyClock) {
   const uint64_t before = OSUtils::CurrentTimeInMicroseconds();
   std::this_thread::sleep_for(std::chrono::milliseconds(20));
-  const uint64_t after = OSUtils::CurrentTimeInMicroseconds();
-  EXPECT_GE(after - before, 20000u);
-  EXPECT_LT(after - before, 5000000u);
+  const uint64_t elapsed = OSUtils::CurrentTimeInMicroseconds() - before;
+  EXPECT_GE(elapsed, 20000u);
+  EXPECT_LT(elapsed, 5000000u);
 }
-
-}  // namespace

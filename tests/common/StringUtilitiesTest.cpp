@@ -1,39 +1,40 @@
 #include <gtest/gtest.h>
 
+#include <array>
+
 #include "common/CTavException.h"
 #include "common/StringUtilities.h"
 #include "support/LogCapture.h"
-
-namespace {
 
 using namespace StringUtilities;
 using Strings = std::vector<std::string>;
 using Bytes = std::vector<uint8_t>;
 
 TEST(Tokenize, EmptyTokensTrailingDelimiterAndEmptyText) {
-  EXPECT_EQ(Tokenize("a::b", ":", false), (Strings{"a", "", "b"}));
-  EXPECT_EQ(Tokenize("a::b", ":", true), (Strings{"a", "b"}));
-  // A delimiter at the very end adds nothing; one at the start does.
-  EXPECT_EQ(Tokenize("a:", ":", false), (Strings{"a"}));
-  EXPECT_EQ(Tokenize("a::", ":", false), (Strings{"a", ""}));
-  EXPECT_EQ(Tokenize(":a", ":", false), (Strings{"", "a"}));
-  EXPECT_EQ(Tokenize(":a", ":", true), (Strings{"a"}));
-  EXPECT_TRUE(Tokenize("", ":", false).empty());
-  EXPECT_TRUE(Tokenize(":::", ":", true).empty());
-  // Any character of the set splits; no delimiter in the text gives it whole.
-  EXPECT_EQ(Tokenize("1133:222 3,4", ": ,", true), (Strings{"1133", "222", "3", "4"}));
-  EXPECT_EQ(Tokenize("whole", ":", false), (Strings{"whole"}));
+  // A delimiter at the very end adds nothing; one at the start does. Any
+  // character of the set splits; no delimiter in the text gives it whole.
+  const struct {
+    const char *text, *delimiters;
+    bool skipEmpty;
+    Strings expected;
+  } cases[] = {// clang-format off
+      {"a::b", ":", false, {"a", "", "b"}}, {"a::b", ":", true, {"a", "b"}},
+      {"a:", ":", false, {"a"}}, {"a::", ":", false, {"a", ""}}, {":a", ":", false, {"", "a"}},
+      {":a", ":", true, {"a"}}, {"", ":", false, {}}, {":::", ":", true, {}},
+      {"whole", ":", false, {"whole"}}, {"1133:222 3,4", ": ,", true, {"1133", "222", "3", "4"}}};
+  // clang-format on
+  for (const auto& c : cases)
+    EXPECT_EQ(Tokenize(c.text, c.delimiters, c.skipEmpty), c.expected) << c.text;
   EXPECT_EQ(Tokenize(std::wstring(L"x;;y;"), std::wstring(L";"), false),
             (std::vector<std::wstring>{L"x", L"", L"y"}));
 }
 
-TEST(StringUtilities, CaseTrimAndSearch) {
+TEST(StringUtilities, CaseTrimSearchAndReplace) {
   std::string text = "MiXeD 123 \xC3\x84";
   ToLower(text);
   EXPECT_EQ(text, "mixed 123 \xC3\x84");  // bytes above ASCII stay as they are
   EXPECT_EQ(ToUpper_Copy("ab-Cd"), "AB-CD");
   EXPECT_EQ(ToLower_Copy("HID"), "hid");
-
   EXPECT_EQ(Trim_Copy(" \t\r\n x y \v\f"), "x y");
   EXPECT_EQ(Trim_Copy("   "), "");
   std::string padded = "  pen  ";
@@ -45,59 +46,59 @@ TEST(StringUtilities, CaseTrimAndSearch) {
   EXPECT_FALSE(IEquals("Touch", "Touch "));
   EXPECT_TRUE(IEquals(std::wstring(L"Pen"), std::wstring(L"pEN")));
   EXPECT_FALSE(IEquals(std::wstring(L"Pen"), std::wstring(L"Pan")));
-
   EXPECT_EQ(IFindFirst("Firmware/PEN.pen", "pen"), 9u);
   EXPECT_EQ(IFindFirst("abc", "x"), std::string::npos);
   EXPECT_TRUE(IContains("Display Scalar", "SCALAR"));
   EXPECT_FALSE(Contains("Display Scalar", "SCALAR"));
   EXPECT_TRUE(Contains("Display Scalar", "Scalar"));
-
   EXPECT_TRUE(IStartsWith("COM.tavik.x", "com.TAVIK"));
   EXPECT_FALSE(StartsWith("COM.tavik.x", "com"));
   EXPECT_TRUE(IEndsWith("image.HEX", ".hex"));
   EXPECT_FALSE(EndsWith("image.HEX", ".hex"));
   EXPECT_FALSE(IEndsWith("x", "longer"));
+
+  // Every match is replaced once, and an empty pattern changes nothing.
+  for (auto [in, from, to, out] :
+       {std::array<std::string, 4>{"Pen pen PEN", "pen", "pen-pen", "pen-pen pen-pen pen-pen"},
+        {"abc", "", "x", "abc"},
+        {"aAaA", "aa", "b", "bb"}}) {
+    IReplaceAll(in, from, to);
+    EXPECT_EQ(in, out);
+  }
 }
 
-TEST(StringUtilities, IReplaceAllReplacesEveryMatchOnce) {
-  std::string text = "Pen pen PEN";
-  IReplaceAll(text, "pen", "pen-pen");
-  EXPECT_EQ(text, "pen-pen pen-pen pen-pen");
-  std::string untouched = "abc";
-  IReplaceAll(untouched, "", "x");
-  EXPECT_EQ(untouched, "abc");
-  std::string shrink = "aAaA";
-  IReplaceAll(shrink, "aa", "b");
-  EXPECT_EQ(shrink, "bb");
-}
-
-TEST(StringUtilities, FormatAndCharArrays) {
+TEST(StringUtilities, FormatCharArraysAndIdentifiers) {
   EXPECT_EQ(Format("%s-%04X-%d", "id", 0xBEEFu, -3), "id-BEEF--3");
   EXPECT_EQ(Format("%s", ""), "");
-  const std::string longText(5000, 'z');
-  EXPECT_EQ(Format("<%s>", longText.c_str()).size(), 5002u);
+  EXPECT_EQ(Format("<%s>", std::string(5000, 'z').c_str()).size(), 5002u);
   EXPECT_EQ(StringFromCharArray(nullptr), "");
   EXPECT_EQ(StringFromCharArray("abc"), "abc");
   const std::string now = CurrentSystemTime();
   ASSERT_EQ(now.size(), 19u);
   EXPECT_EQ(now[4], '-');
   EXPECT_EQ(now[13], ':');
+
+  EXPECT_EQ(StringFromWirelessID(0xABC), "TL#000ABC");
+  EXPECT_EQ(StringFromWirelessID(0x12345678), "TL#12345678");
+  EXPECT_EQ(StringFromRemoteID(0x12345678), "R#12-345678");
+  EXPECT_EQ(StringFromRemoteID(0x0000000F), "R#00-00000F");
+  EXPECT_EQ(StringToRemoteID(StringFromRemoteID(0xFEDCBA98)), 0xFEDCBA98u);
+  // The separator is not looked at, and only ten characters read.
+  const std::pair<const char*, uint32_t> remotes[] = {
+      {"R#12-345678", 0x12345678u}, {"R#12x345678", 0x12345678u}, {"R#12-34567", 0u},
+      {"R#12-3456789", 0u},         {"X#12-345678", 0u},          {"", 0u}};
+  for (const auto& [text, id] : remotes) EXPECT_EQ(StringToRemoteID(text), id) << text;
 }
 
-TEST(UTF8, EncodeAtEveryLengthBoundary) {
-  EXPECT_EQ(EncodeUnicodePointToUTF8(0x00), std::string(1, '\0'));
-  EXPECT_EQ(EncodeUnicodePointToUTF8(0x7F), "\x7F");
-  EXPECT_EQ(EncodeUnicodePointToUTF8(0x80), "\xC2\x80");
-  EXPECT_EQ(EncodeUnicodePointToUTF8(0x7FF), "\xDF\xBF");
-  EXPECT_EQ(EncodeUnicodePointToUTF8(0x800), "\xE0\xA0\x80");
-  EXPECT_EQ(EncodeUnicodePointToUTF8(0xFFFF), "\xEF\xBF\xBF");
-  EXPECT_EQ(EncodeUnicodePointToUTF8(0x10000), "\xF0\x90\x80\x80");
-  EXPECT_EQ(EncodeUnicodePointToUTF8(0x10FFFF), "\xF4\x8F\xBF\xBF");
-  EXPECT_EQ(EncodeUnicodePointToUTF8(1114112), "");
-  EXPECT_EQ(EncodeUnicodePointToUTF8(0xFFFFFFFF), "");
-}
+TEST(UTF8, EncodesAtEveryLengthBoundaryAndDecodesBack) {
+  // clang-format off
+  const std::pair<uint32_t, std::string> encodings[] = {
+      {0x00, std::string(1, '\0')}, {0x7F, "\x7F"}, {0x80, "\xC2\x80"}, {0x7FF, "\xDF\xBF"},
+      {0x800, "\xE0\xA0\x80"}, {0xFFFF, "\xEF\xBF\xBF"}, {0x10000, "\xF0\x90\x80\x80"},
+      {0x10FFFF, "\xF4\x8F\xBF\xBF"}, {1114112, ""}, {0xFFFFFFFF, ""}};
+  // clang-format on
+  for (const auto& [point, bytes] : encodings) EXPECT_EQ(EncodeUnicodePointToUTF8(point), bytes);
 
-TEST(UTF8, DecodeTakesBackEveryEncodedPoint) {
   for (uint32_t point : {0x0u, 0x41u, 0x7Fu, 0x80u, 0x7FFu, 0x800u, 0xD800u, 0xFFFDu, 0xFFFFu,
                          0x10000u, 0x1F600u, 0x10FFFFu}) {
     const std::string bytes = EncodeUnicodePointToUTF8(point);
@@ -121,19 +122,13 @@ TEST(UTF8, DecodeTakesBackEveryEncodedPoint) {
 TEST(UTF8, RefusesMalformedSequences) {
   EXPECT_TRUE(IsValidUTF8(""));
   EXPECT_TRUE(IsValidUTF8("plain ascii"));
+  // A continuation without a lead, cut sequences, a lead before a
+  // non-continuation, overlong forms of 0, 0x7F, 0x7FF and 0xFFFF, 0x110000
+  // beyond Unicode, a five-byte lead, and a byte no sequence starts with.
   const char* bad[] = {
-      "\x80",              // continuation without a lead
-      "\xC3",              // cut two-byte sequence
-      "\xE2\x82",          // cut three-byte sequence
-      "\xC3\x41",          // lead followed by a non-continuation
-      "\xC0\x80",          // overlong NUL
-      "\xC1\xBF",          // overlong 0x7F
-      "\xE0\x9F\xBF",      // overlong 0x7FF
-      "\xF0\x8F\xBF\xBF",  // overlong 0xFFFF
-      "\xF4\x90\x80\x80",  // 0x110000, beyond Unicode
-      "\xF8\x88\x80\x80\x80",
-      "\xFF",
-  };
+      "\x80",     "\xC3",         "\xE2\x82",         "\xC3\x41",         "\xC0\x80",
+      "\xC1\xBF", "\xE0\x9F\xBF", "\xF0\x8F\xBF\xBF", "\xF4\x90\x80\x80", "\xF8\x88\x80\x80\x80",
+      "\xFF"};
   for (const char* sequence : bad) {
     const std::string text(sequence);
     EXPECT_FALSE(IsValidUTF8(text)) << text.size();
@@ -149,22 +144,7 @@ TEST(UTF8, RefusesMalformedSequences) {
   EXPECT_FALSE(DecodeUTF8ToUnicodePoint("abc", past, point));
 }
 
-TEST(StringUtilities, WirelessAndRemoteIdentifiers) {
-  EXPECT_EQ(StringFromWirelessID(0xABC), "TL#000ABC");
-  EXPECT_EQ(StringFromWirelessID(0x12345678), "TL#12345678");
-  EXPECT_EQ(StringFromRemoteID(0x12345678), "R#12-345678");
-  EXPECT_EQ(StringFromRemoteID(0x0000000F), "R#00-00000F");
-
-  EXPECT_EQ(StringToRemoteID("R#12-345678"), 0x12345678u);
-  EXPECT_EQ(StringToRemoteID(StringFromRemoteID(0xFEDCBA98)), 0xFEDCBA98u);
-  EXPECT_EQ(StringToRemoteID("R#12x345678"), 0x12345678u);  // separator not looked at
-  EXPECT_EQ(StringToRemoteID("R#12-34567"), 0u);            // ten characters
-  EXPECT_EQ(StringToRemoteID("R#12-3456789"), 0u);
-  EXPECT_EQ(StringToRemoteID("X#12-345678"), 0u);
-  EXPECT_EQ(StringToRemoteID(""), 0u);
-}
-
-TEST(Base64, RoundTripsEveryTailLength) {
+TEST(Base64, RoundTripsEveryTailLengthWithoutPadding) {
   EXPECT_EQ(GetBase64({}), "");
   EXPECT_EQ(GetBase64({0xFF}), "/w");
   EXPECT_EQ(GetBytesFromBase64("/w"), (Bytes{0xFF}));
@@ -172,7 +152,6 @@ TEST(Base64, RoundTripsEveryTailLength) {
   EXPECT_EQ(GetBase64({'M', 'a', 'n'}), "TWFu");
   EXPECT_EQ(GetBase64StrFromString("Many hands"), "TWFueSBoYW5kcw");
   EXPECT_EQ(GetStringFromBase64("TWFueSBoYW5kcw"), "Many hands");
-
   Bytes all(256);
   for (size_t i = 0; i < all.size(); ++i) all[i] = static_cast<uint8_t>(i);
   for (size_t length = 0; length <= all.size(); ++length) {
@@ -184,23 +163,20 @@ TEST(Base64, RoundTripsEveryTailLength) {
   }
 }
 
-TEST(Base64, BadCharacterThrowsOnlyFromTheCharDecoder) {
+TEST(Base64, PaddingOrAnyBadCharacterRefusesTheWholeText) {
   EXPECT_EQ(EncodeBase64Char(0), 'A');
   EXPECT_EQ(EncodeBase64Char(63), '/');
   EXPECT_EQ(EncodeBase64Char(64), '=');
   EXPECT_EQ(DecodeBase64Char('+'), 62);
   try {
     DecodeBase64Char('=');
-    FAIL() << "no exception";
+    ADD_FAILURE() << "no exception";
   } catch (const CTavException& e) {
     EXPECT_EQ(e.GetFile(), nullptr);
     EXPECT_EQ(e.GetLine(), 0);
     EXPECT_EQ(e.GetMessage(), "bad char");
     EXPECT_EQ(e.GetStatus(), 65535);
   }
-}
-
-TEST(Base64, PaddingOrAnyBadCharacterRefusesTheWholeText) {
   LogCapture capture;
   // Padding, a blank, a line break: all refused, even after good groups.
   for (const char* text : {"TWE=", "TWFu/w==", "TWFu TWFu", "TWFu\nTWFu", "TW-u", "TWFu*"}) {
@@ -212,5 +188,3 @@ TEST(Base64, PaddingOrAnyBadCharacterRefusesTheWholeText) {
   EXPECT_EQ(GetBytesFromBase64("TWFuT"), (Bytes{'M', 'a', 'n'}));
   EXPECT_TRUE(GetBytesFromBase64("TWFu=").empty());
 }
-
-}  // namespace

@@ -5,8 +5,6 @@
 #include "common/SystemState.h"
 #include "support/LogCapture.h"
 
-namespace {
-
 class SystemStateTest : public ::testing::Test {
  protected:
   void SetUp() override { SystemState::Clear(); }
@@ -14,18 +12,16 @@ class SystemStateTest : public ::testing::Test {
 };
 
 TEST_F(SystemStateTest, OSTypeTableBothWays) {
-  EXPECT_EQ(SystemState::OSTypeToString(2000), "Unset");
-  EXPECT_EQ(SystemState::OSTypeToString(7), "Unknown");
-  EXPECT_EQ(SystemState::OSTypeToString(-1), "Unknown");
-  EXPECT_EQ(SystemState::OSTypeToString(1160), "macOS 12.0");
-  EXPECT_EQ(SystemState::OSTypeToString(1070), "OSX 10.11");
-  EXPECT_EQ(SystemState::OSTypeToString(3000), "Linux");
-  EXPECT_EQ(SystemState::StringToOSType("Windows 10"), 62);
-  EXPECT_EQ(SystemState::StringToOSType("Windows 7 Starter"), 51);
-  EXPECT_EQ(SystemState::StringToOSType("OSX Infinity"), 1999);
-  EXPECT_EQ(SystemState::StringToOSType("x"), -1);
-  EXPECT_EQ(SystemState::StringToOSType("windows 10"), -1);  // exact text only
-  EXPECT_EQ(SystemState::StringToOSType("Linux"), eOSLinux);
+  // clang-format off
+  const std::pair<int32_t, const char*> texts[] = {
+      {2000, "Unset"}, {7, "Unknown"}, {-1, "Unknown"}, {1160, "macOS 12.0"}, {1070, "OSX 10.11"},
+      {3000, "Linux"}};
+  for (const auto& [value, text] : texts) EXPECT_EQ(SystemState::OSTypeToString(value), text);
+  const std::pair<const char*, int32_t> values[] = {
+      {"Windows 10", 62}, {"Windows 7 Starter", 51}, {"OSX Infinity", 1999}, {"x", -1},
+      {"windows 10", -1} /* exact text only */, {"Linux", eOSLinux}};
+  // clang-format on
+  for (const auto& [text, value] : values) EXPECT_EQ(SystemState::StringToOSType(text), value);
 
   // Every value of the table comes back through its text.
   for (int32_t value :
@@ -58,17 +54,15 @@ TEST_F(SystemStateTest, UnameGivesLinuxAndTheProcessor) {
   EXPECT_TRUE(capture.LogContains("Raw system version Linux 6.1.0-test x86_64\n"));
   EXPECT_TRUE(capture.LogContains("mCPU = ECPUType::eCPULinuxX86_64\n"));
   EXPECT_TRUE(capture.LogContains("mOS set to bb8\n"));
-
   SystemState::SetOSTypeFromUname("Linux", "6.1.0", "aarch64");
   EXPECT_EQ(SystemState::GetCPUType(), eCPULinuxARM64);
   SystemState::SetOSTypeFromUname("Linux", "6.1.0", "riscv64");
   EXPECT_EQ(SystemState::GetCPUType(), eCPULinuxOther);
   EXPECT_TRUE(capture.LogContains("eCPULinuxOther (riscv64)"));
   EXPECT_TRUE(capture.Assertions().empty());
-}
 
-TEST_F(SystemStateTest, ForeignSystemLeavesTheOSUnset) {
-  LogCapture capture;
+  // A foreign system leaves the OS unset.
+  SystemState::Clear();
   SystemState::SetOSTypeFromUname("FreeBSD", "14.0", "amd64");
   EXPECT_TRUE(capture.LogContains("mOS set to 7d0\n"));
   EXPECT_EQ(SystemState::GetOSType(), eOSUnknown);
@@ -76,34 +70,24 @@ TEST_F(SystemStateTest, ForeignSystemLeavesTheOSUnset) {
   EXPECT_EQ(SystemState::GetCPUType(), eCPULinuxX86_64);
 }
 
-TEST_F(SystemStateTest, ThisMachine) {
+TEST_F(SystemStateTest, ThisMachineAndProcess) {
   SystemState::SetOSType();
   utsname names{};
   ASSERT_EQ(uname(&names), 0);
   EXPECT_EQ(SystemState::GetOSType(), eOSLinux);
   const std::string machine = names.machine;
-  if (machine == "x86_64") {
-    EXPECT_EQ(SystemState::GetCPUType(), eCPULinuxX86_64);
-  } else if (machine == "aarch64") {
-    EXPECT_EQ(SystemState::GetCPUType(), eCPULinuxARM64);
+  if (machine == "x86_64" || machine == "aarch64") {
+    EXPECT_EQ(SystemState::GetCPUType(), machine == "x86_64" ? eCPULinuxX86_64 : eCPULinuxARM64);
   }
   EXPECT_TRUE(SystemState::GetSupportsNativeGestures());
-}
-
-TEST_F(SystemStateTest, ScreenAndProcessFacts) {
-  EXPECT_DOUBLE_EQ(SystemState::GetPixelsPerInch(), 96.0);
-  EXPECT_DOUBLE_EQ(SystemState::GetPixelsPerMM() * 25.4, 96.0);
 
   EXPECT_EQ(SystemState::GetProcessInstanceIdentifier(), "." + std::to_string(getpid()));
   const std::string parent = SystemState::GetProcessParentInstanceIdentifier();
   const std::string parentSuffix = "." + std::to_string(getppid());
   ASSERT_GT(parent.size(), parentSuffix.size());  // a name stands before the number
   EXPECT_EQ(parent.substr(parent.size() - parentSuffix.size()), parentSuffix);
-
   // No foreground application can be known here.
   SystemState::ApplicationSwitch();
   EXPECT_EQ(SystemState::GetForegroundAppIdentifier(), "");
   EXPECT_EQ(SystemState::GetForegroundProcessInstanceIdentifier(), "");
 }
-
-}  // namespace

@@ -1,17 +1,12 @@
-#include "common/TavAssert.h"
-
-#include <fcntl.h>
+#include <gtest/gtest.h>
 #include <sys/wait.h>
 #include <unistd.h>
-
-#include <gtest/gtest.h>
 
 #include <fstream>
 #include <sstream>
 
+#include "common/TavAssert.h"
 #include "support/LogCapture.h"
-
-namespace {
 
 TEST(TavAssert, ReportsBaseNameLineAndTextAndReturns) {
   LogCapture capture;
@@ -37,12 +32,9 @@ TEST(TavAssert, RedirectedStandardErrorGetsNothing) {
   int status = 0;
   waitpid(child, &status, 0);
   close(fd);
-  std::ifstream in(path);
   std::stringstream text;
-  text << in.rdbuf();
+  text << std::ifstream(path).rdbuf();
   unlink(path);
   EXPECT_EQ(text.str(), "");
   EXPECT_TRUE(WIFEXITED(status));
 }
-
-}  // namespace

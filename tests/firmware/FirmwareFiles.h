@@ -5,6 +5,7 @@
 #include <stdlib.h>
 
 #include <cstdint>
+#include <cstdio>
 #include <filesystem>
 #include <fstream>
 #include <string>
@@ -26,9 +27,8 @@ class CTempFolder {
 
   std::string Path(const std::string& name_I) const { return mPath + "/" + name_I; }
   std::string Write(const std::string& name_I, const std::string& content_I) const {
-    const std::string path = Path(name_I);
-    std::ofstream(path, std::ios::binary) << content_I;
-    return path;
+    std::ofstream(Path(name_I), std::ios::binary) << content_I;
+    return Path(name_I);
   }
   std::string Write(const std::string& name_I, const std::vector<uint8_t>& content_I) const {
     return Write(name_I, std::string(content_I.begin(), content_I.end()));
@@ -43,50 +43,45 @@ class CTempFolder {
 };
 
 inline std::string HexBytes(const std::vector<uint8_t>& bytes_I) {
-  static const char kDigits[] = "0123456789ABCDEF";
   std::string text;
-  for (uint8_t byte : bytes_I) {
-    text += kDigits[byte >> 4];
-    text += kDigits[byte & 0x0F];
-  }
+  char digits[3];
+  for (uint8_t byte : bytes_I) text.append(digits, std::snprintf(digits, 3, "%02X", byte));
   return text;
+}
+
+// The count (S-record) or length (Intel hex), address and data; the callers
+// add the record type and the checksum.
+inline std::vector<uint8_t> RecordBody(uint8_t count_I, uint32_t address_I, int addressBytes_I,
+                                       const std::vector<uint8_t>& data_I) {
+  std::vector<uint8_t> body{count_I};
+  for (int i = addressBytes_I - 1; i >= 0; --i) body.push_back(uint8_t(address_I >> (8 * i)));
+  body.insert(body.end(), data_I.begin(), data_I.end());
+  return body;
+}
+
+inline uint8_t ByteSum(const std::vector<uint8_t>& bytes_I) {
+  unsigned sum = 0;
+  for (uint8_t byte : bytes_I) sum += byte;
+  return static_cast<uint8_t>(sum);
 }
 
 // One S1, S2 or S3 line (type_I '1', '2' or '3') with its count and checksum.
 inline std::string SRecLine(char type_I, uint32_t address_I, const std::vector<uint8_t>& data_I) {
-  const int addressBytes = type_I == '1' ? 2 : type_I == '2' ? 3 : 4;
-  std::vector<uint8_t> body;
-  body.reserve(data_I.size() + 6);
-  body.push_back(static_cast<uint8_t>(addressBytes + data_I.size() + 1));
-  for (int i = addressBytes - 1; i >= 0; --i) {
-    body.push_back(static_cast<uint8_t>(address_I >> (8 * i)));
-  }
-  body.insert(body.end(), data_I.begin(), data_I.end());
-  unsigned sum = 0;
-  for (uint8_t byte : body) sum += byte;
-  body.push_back(static_cast<uint8_t>(~sum));
-  std::string line(1, 'S');
-  line.push_back(type_I);
-  line.append(HexBytes(body));
-  return line;
+  const int addressBytes = type_I - '0' + 1;
+  std::vector<uint8_t> body =
+      RecordBody(uint8_t(addressBytes + data_I.size() + 1), address_I, addressBytes, data_I);
+  body.push_back(static_cast<uint8_t>(~ByteSum(body)));
+  return std::string("S") + type_I + HexBytes(body);
 }
 
 // One Intel hex record with its checksum, without line end.
 inline std::string HexRecord(uint8_t type_I, uint16_t address_I,
                              const std::vector<uint8_t>& data_I) {
-  std::vector<uint8_t> body;
-  body.reserve(data_I.size() + 5);
-  body.push_back(static_cast<uint8_t>(data_I.size()));
-  body.push_back(static_cast<uint8_t>(address_I >> 8));
-  body.push_back(static_cast<uint8_t>(address_I));
+  std::vector<uint8_t> body = RecordBody(uint8_t(data_I.size()), address_I, 2, {});
   body.push_back(type_I);
   body.insert(body.end(), data_I.begin(), data_I.end());
-  unsigned sum = 0;
-  for (uint8_t byte : body) sum += byte;
-  body.push_back(static_cast<uint8_t>(-sum));
-  std::string record(1, ':');
-  record.append(HexBytes(body));
-  return record;
+  body.push_back(static_cast<uint8_t>(-ByteSum(body)));
+  return ":" + HexBytes(body);
 }
 
 inline std::vector<uint8_t> Bytes(size_t count_I, uint8_t first_I = 0) {

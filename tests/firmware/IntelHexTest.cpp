@@ -1,8 +1,5 @@
 #include <gtest/gtest.h>
 
-#include <string>
-#include <vector>
-
 #include "firmware/CIntelHex.h"
 #include "firmware/FirmwareFiles.h"
 #include "support/LogCapture.h"
@@ -28,6 +25,12 @@ uint32_t SignedSum16(const std::vector<uint8_t>& bytes_I) {
   return static_cast<uint32_t>(sum) & 0xFFFF;
 }
 
+// The record with the low digit of its checksum changed.
+std::string BadSum(std::string record_I) {
+  record_I.back() = record_I.back() == '0' ? '1' : '0';
+  return record_I;
+}
+
 }  // namespace
 
 TEST(IntelHex, LoadsImagesThatStartAt0x8000) {
@@ -39,28 +42,23 @@ TEST(IntelHex, LoadsImagesThatStartAt0x8000) {
   // One record: 512 bytes, the rest erased, the signed 16-bit sum.
   ASSERT_TRUE(hex.Load(folder.Write(
       "one.hex", Lines({HexRecord(4, 0, {0, 0}), HexRecord(0, 0x8000, Bytes(16, 0x78)), kEnd}))));
-  std::vector<uint8_t> expected(512, 0xFF);
-  std::copy_n(Bytes(16, 0x78).begin(), 16, expected.begin());
+  std::vector<uint8_t> expected = Bytes(16, 0x78);
+  expected.resize(512, 0xFF);
   EXPECT_EQ(hex.StartAddress(), 0x8000u);
   EXPECT_EQ(Image(hex), expected);
   EXPECT_EQ(hex.Checksum(), SignedSum16(expected));
 
   // Bare line feeds, lower-case digits, text before the first record, more
   // records after the end record, and a later record over an earlier one.
-  const std::string lower = [] {
-    std::string record = HexRecord(0, 0x8010, {0xAB, 0xCD});
-    for (char& c : record) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
-    return record;
-  }();
+  std::string lower = HexRecord(0, 0x8010, {0xAB, 0xCD});
+  for (char& c : lower) c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
   ASSERT_TRUE(hex.Load(
       folder.Write("many.hex", "made by hand\n" + Lines({HexRecord(0, 0x8000, Bytes(16)), kEnd,
                                                          lower, HexRecord(0, 0x8000, {0x55})},
                                                         "\n"))));
-  expected.assign(512, 0xFF);
   expected = Bytes(16);
   expected[0] = 0x55;
-  expected.push_back(0xAB);
-  expected.push_back(0xCD);
+  expected.insert(expected.end(), {0xAB, 0xCD});
   expected.resize(512, 0xFF);
   EXPECT_EQ(Image(hex), expected);
 
@@ -69,9 +67,7 @@ TEST(IntelHex, LoadsImagesThatStartAt0x8000) {
   std::vector<uint8_t> whole;
   for (uint32_t offset = 0; offset < CIntelHex::kMaxSize; offset += 16) {
     const uint32_t address = 0x8000 + offset;
-    if (address % 0x10000 == 0) {
-      records.push_back(HexRecord(4, 0, {0, static_cast<uint8_t>(address >> 16)}));
-    }
+    if (address % 0x10000 == 0) records.push_back(HexRecord(4, 0, {0, uint8_t(address >> 16)}));
     const std::vector<uint8_t> data = Bytes(16, static_cast<uint8_t>(offset >> 4));
     records.push_back(HexRecord(0, static_cast<uint16_t>(address), data));
     whole.insert(whole.end(), data.begin(), data.end());
@@ -96,57 +92,48 @@ TEST(IntelHex, KeepsItsSizeRulesAndNarrowChecksums) {
   EXPECT_EQ(hex.Size(), 1024u);  // max_address 512
 
   // Types 3, 4 and 5 test only the low four bits of their sum.
-  std::string type4 = HexRecord(4, 0, {0, 0});
-  type4.replace(type4.size() - 2, 1, type4[type4.size() - 2] == '0' ? "1" : "0");
-  std::string type5 = HexRecord(5, 0, {0, 0, 0x80, 0});
-  type5.replace(type5.size() - 2, 1, type5[type5.size() - 2] == '0' ? "1" : "0");
-  EXPECT_TRUE(
-      hex.Load(folder.Write("narrow.hex", Lines({type4, type5, HexRecord(0, 0x8000, {1}), kEnd}))));
+  const auto badHigh = [](std::string record_I) {
+    char& high = record_I[record_I.size() - 2];
+    high = high == '0' ? '1' : '0';
+    return record_I;
+  };
+  EXPECT_TRUE(hex.Load(folder.Write("narrow.hex", Lines({badHigh(HexRecord(4, 0, {0, 0})),
+                                                         badHigh(HexRecord(5, 0, {0, 0, 0x80, 0})),
+                                                         HexRecord(0, 0x8000, {1}), kEnd}))));
   // A type 3 record moves the base although it names an entry point.
   EXPECT_FALSE(hex.Load(folder.Write(
       "start.hex", Lines({HexRecord(3, 0, {0, 0, 0, 1}), HexRecord(0, 0x8000, {1}), kEnd}))));
 }
 
 TEST(IntelHex, RefusesWithTheReasonInItsLog) {
-  struct SCase {
-    std::string text;
-    std::string message;
-  };
   const std::string data = HexRecord(0, 0x8000, Bytes(16));
-  std::string badData = data;
-  badData.back() = badData.back() == '0' ? '1' : '0';
+  const std::string start = "start_address exceeds 32768\n", exceeded = "exceeded 196608\n";
   std::string badEnd = kEnd;
   badEnd.back() = '0';
   std::string badSegment = HexRecord(2, 0, {0, 0});
   badSegment.replace(badSegment.size() - 2, 1, "1");
-  const std::vector<SCase> cases{
-      {Lines({HexRecord(0, 0x8010, Bytes(16)), kEnd}),
-       "CIntelHex::Load: ERROR - start_address exceeds 32768\n"},
-      {Lines({HexRecord(4, 0, {0, 1}), HexRecord(0, 0, Bytes(16)), kEnd}),
-       "CIntelHex::Load: ERROR - start_address exceeds 32768\n"},
-      {Lines({kEnd}), "CIntelHex::Load: ERROR - start_address exceeds 32768\n"},
+  const std::pair<std::string, std::string> cases[] = {
+      {Lines({HexRecord(0, 0x8010, Bytes(16)), kEnd}), start},
+      {Lines({HexRecord(4, 0, {0, 1}), HexRecord(0, 0, Bytes(16)), kEnd}), start},
+      {Lines({kEnd}), start},
       {Lines({data, HexRecord(4, 0, {0, 3}), HexRecord(0, 0x4000, Bytes(16)), kEnd}),
-       "CIntelHex::Load: ERROR - max_address exceeds 180224\n"},
-      {Lines({data, HexRecord(4, 0, {0, 3}), HexRecord(0, 0x7FF8, Bytes(16)), kEnd}),
-       "CIntelHex::Load: ERROR - exceeded 196608\n"},
-      {Lines({data, HexRecord(0, 0x7FF0, Bytes(16)), kEnd}),
-       "CIntelHex::Load: ERROR - exceeded 196608\n"},
-      {data + "\r\n" + kEnd, "CIntelHex::Load: ERROR - read error; expected 56 bytes, read 57 bytes\n"},
-      {Lines({HexRecord(6, 0, {}), kEnd}), "CIntelHex::Load: ERROR - unknown record_type: 6\n"},
-      {Lines({badData, kEnd}), "CIntelHex::Load: ERROR - checksum error in case 0:\n"},
-      {Lines({data, badEnd}), "CIntelHex::Load: ERROR - checksum error in case 1:\n"},
-      {Lines({badSegment, data, kEnd}), "CIntelHex::Load: ERROR - checksum error in case 2:\n"},
-      {Lines({data + "00", kEnd}),
-       "CIntelHex::Load: ERROR - parsing error looking for carriage return\n"},
-      {"", "CIntelHex::Load: ERROR - empty file: "},
-  };
+       "max_address exceeds 180224\n"},
+      {Lines({data, HexRecord(4, 0, {0, 3}), HexRecord(0, 0x7FF8, Bytes(16)), kEnd}), exceeded},
+      {Lines({data, HexRecord(0, 0x7FF0, Bytes(16)), kEnd}), exceeded},
+      {data + "\r\n" + kEnd, "read error; expected 56 bytes, read 57 bytes\n"},
+      {Lines({HexRecord(6, 0, {}), kEnd}), "unknown record_type: 6\n"},
+      {Lines({BadSum(data), kEnd}), "checksum error in case 0:\n"},
+      {Lines({data, badEnd}), "checksum error in case 1:\n"},
+      {Lines({badSegment, data, kEnd}), "checksum error in case 2:\n"},
+      {Lines({data + "00", kEnd}), "parsing error looking for carriage return\n"},
+      {"", "empty file: "}};
   CTempFolder folder;
-  for (const SCase& test : cases) {
-    SCOPED_TRACE(test.text.substr(0, 80));
+  for (const auto& [text, message] : cases) {
+    SCOPED_TRACE(text.substr(0, 80));
     CIntelHex hex;
     LogCapture capture;
-    EXPECT_FALSE(hex.Load(folder.Write("bad.hex", test.text)));
-    EXPECT_TRUE(capture.LogContains("[E] " + test.message));
+    EXPECT_FALSE(hex.Load(folder.Write("bad.hex", text)));
+    EXPECT_TRUE(capture.LogContains("[E] CIntelHex::Load: ERROR - " + message));
     EXPECT_FALSE(hex.IsLoaded());
   }
   CIntelHex hex;
@@ -172,7 +159,6 @@ TEST(IntelHex, KeepsAnEarlierImageUntilALoadSucceeds) {
   EXPECT_TRUE(capture.LogContains("[I] CIntelHex flash data:\n"));
   EXPECT_TRUE(capture.LogContains("[I] 09 "));
   EXPECT_TRUE(capture.LogContains("[I] FF "));
-
   hex.ClearData();
   EXPECT_FALSE(hex.IsLoaded());
   EXPECT_EQ(hex.Size(), 0u);

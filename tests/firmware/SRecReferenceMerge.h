@@ -17,46 +17,33 @@ struct SReferenceMergeResult {
 inline SReferenceMergeResult ReferenceMerge(const std::vector<SContinuousDataBlock>& records_I) {
   std::vector<SContinuousDataBlock> blocks;
   for (const SContinuousDataBlock& record : records_I) {
-    const uint64_t a = record.startAddress;
-    const uint64_t n = record.data.size();
+    const uint64_t a = record.startAddress, n = record.data.size();
     bool taken = false;
     for (SContinuousDataBlock& block : blocks) {
-      const uint64_t b = block.startAddress;
-      const uint64_t m = block.data.size();
-      if (a >= b && a < b + m) {
-        taken = true;
-        break;
-      }
-      bool merged = false;
+      const uint64_t b = block.startAddress, m = block.data.size();
+      taken = a >= b && a < b + m;  // starts inside: dropped
+      if (taken) break;
       if (b + m == a) {
         block.data.insert(block.data.end(), record.data.begin(), record.data.end());
-        merged = true;
+        taken = true;
       }
       if (a + n == b) {
         block.data.insert(block.data.begin(), record.data.begin(), record.data.end());
         block.startAddress = record.startAddress;
-        merged = true;
-      }
-      if (merged) {
         taken = true;
-        break;
       }
+      if (taken) break;
     }
     if (!taken) blocks.push_back(record);
   }
-
-  SReferenceMergeResult result;
-  std::stable_sort(blocks.begin(), blocks.end(),
-                   [](const SContinuousDataBlock& x_I, const SContinuousDataBlock& y_I) {
-                     return x_I.startAddress < y_I.startAddress;
-                   });
+  std::stable_sort(blocks.begin(), blocks.end(), [](const auto& x_I, const auto& y_I) {
+    return x_I.startAddress < y_I.startAddress;
+  });
   for (size_t pair = 1; pair < blocks.size(); ++pair) {
-    if (uint64_t{blocks[pair - 1].startAddress} + blocks[pair - 1].data.size() >
-        blocks[pair].startAddress) {
-      result.overlapPair = static_cast<int>(pair);
-      return result;
+    const SContinuousDataBlock& before = blocks[pair - 1];
+    if (uint64_t{before.startAddress} + before.data.size() > blocks[pair].startAddress) {
+      return {{}, static_cast<int>(pair)};
     }
   }
-  result.blocks = std::move(blocks);
-  return result;
+  return {blocks, 0};
 }

@@ -1,18 +1,13 @@
 #include <gtest/gtest.h>
 
-#include <string>
-
 #include "host/CLanguageManager.h"
 #include "support/LogCapture.h"
-
-namespace {
 
 // A manager whose language number the test chooses.
 class FakeLanguageManager : public CLanguageManager {
  public:
   uint32_t GetCurrentLanguage() override { return mLanguage; }
   std::string GetLocalizedString(const std::string& key_I) override { return key_I; }
-
   uint32_t mLanguage = 0;
 };
 
@@ -24,16 +19,11 @@ TEST(LanguageTable, CodesByNumberKeepTheSharedRowsAndRefuseUnknownNumbers) {
   for (uint32_t row = 0; row < manager.GetLanguageTable().size(); ++row) {
     EXPECT_EQ(manager.GetLanguageTable()[row].number, row);
   }
-
-  const struct {
-    uint32_t language;
-    const char* code;
-  } cases[] = {{0, "en"},  {1, "zh_CN"}, {2, "zh_TW"}, {3, "en"}, {5, "de"},       {10, "pt"},
-               {11, "pt"}, {18, "no"},   {23, "sk"},   {24, ""},  {0xFFFFFFFF, ""}};
-  for (const auto& entry : cases) {
-    manager.mLanguage = entry.language;
-    EXPECT_EQ(manager.GetISOLanguageCode(), entry.code) << "language " << entry.language;
+  const std::pair<uint32_t, const char*> cases[] = {
+      {0, "en"},  {1, "zh_CN"}, {2, "zh_TW"}, {3, "en"}, {5, "de"},       {10, "pt"},
+      {11, "pt"}, {18, "no"},   {23, "sk"},   {24, ""},  {0xFFFFFFFF, ""}};
+  for (const auto& [language, code] : cases) {
+    manager.mLanguage = language;
+    EXPECT_EQ(manager.GetISOLanguageCode(), code) << "language " << language;
   }
 }
-
-}  // namespace

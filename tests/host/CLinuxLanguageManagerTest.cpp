@@ -94,32 +94,18 @@ TEST(LinuxLanguageManager, SharedInstanceFollowsLANGUAGEWithTheShippedCatalogs) 
 }
 
 // Every text the application shows, as it passes them to the catalogs.
+// clang-format off
 const char* const kShownKeys[] = {
-    "Tavik Firmware Update Utility",
-    "You are about to update the firmware.",
-    "While programming do not disconnect or power down your device.",
-    "Do you want to continue?",
-    "No",
-    "Yes",
-    "OK",
-    "Try Again",
-    "Waiting for Loader Mode",
-    "Waiting for Device Mode",
-    "Updating, this may take several minutes",
-    "Programming Successful",
-    "Programming Failed",
+    "Tavik Firmware Update Utility", "You are about to update the firmware.",
+    "While programming do not disconnect or power down your device.", "Do you want to continue?",
+    "No", "Yes", "OK", "Try Again", "Waiting for Loader Mode", "Waiting for Device Mode",
+    "Updating, this may take several minutes", "Programming Successful", "Programming Failed",
     "Firmware was successfully updated.",
     "Error: No supported tablet is connected. Please connect a tablet.",
     "Error: Invalid state resulted in updater termination.",
     "Error: The specified file does not appear to be a valid firmware file.",
-    "200:250",
-    "200:255",
-    "200:257",
-    "Pen",
-    "Touch",
-    "Bluetooth",
-    "Scalar",
-};
+    "200:250", "200:255", "200:257", "Pen", "Touch", "Bluetooth", "Scalar"};
+// clang-format on
 
 TEST(LinuxLanguageManager, EveryShippedLanguageHasEveryShownTextAndItsOwnNumber) {
   LocaleEnvironment environment("en");
@@ -162,25 +148,19 @@ TEST(LinuxLanguageManager, LocaleFolderSearchPrefersTheProgramsSurroundings) {
   fs::create_directories(root / "build" / "locale" / "de" / "LC_MESSAGES");
   EXPECT_EQ(CLinuxLanguageManager::FindLocaleDirectory(program.string(), installed), installed);
 
-  addCatalogs(root / "build" / "locale");
-  EXPECT_EQ(CLinuxLanguageManager::FindLocaleDirectory(program.string(), installed),
-            (root / "build" / "locale").string());
-  addCatalogs(root / "build" / "src" / "locale");
-  EXPECT_EQ(CLinuxLanguageManager::FindLocaleDirectory(program.string(), installed),
-            (root / "build" / "src" / "locale").string());
-  addCatalogs(root / "build" / "src" / "share" / "locale");
-  EXPECT_EQ(CLinuxLanguageManager::FindLocaleDirectory(program.string(), installed),
-            (root / "build" / "src" / "share" / "locale").string());
-  addCatalogs(program / "locale");
-  EXPECT_EQ(CLinuxLanguageManager::FindLocaleDirectory(program.string(), installed),
-            (program / "locale").string());
+  // Each nearer folder wins over the ones found before it.
+  for (const fs::path& locale : {root / "build" / "locale", root / "build" / "src" / "locale",
+                                 root / "build" / "src" / "share" / "locale", program / "locale"}) {
+    addCatalogs(locale);
+    EXPECT_EQ(CLinuxLanguageManager::FindLocaleDirectory(program.string(), installed),
+              locale.string());
+  }
   fs::remove_all(root);
 }
 
 TEST(LinuxLanguageManager, AnExplicitLocaleFolderOverridesTheSearch) {
   LocaleEnvironment environment("en");
   CLinuxLanguageManager::SetLocaleDirectory(kTestCatalogs);
-  EXPECT_EQ(CLinuxLanguageManager::GetLocaleDirectory(), kTestCatalogs);
   CLanguageManager::DisposeInstance();
   EXPECT_EQ(TTCLocalizedNSString("in-both"), "from the application domain");
 
@@ -190,10 +170,6 @@ TEST(LinuxLanguageManager, AnExplicitLocaleFolderOverridesTheSearch) {
   EXPECT_EQ(std::filesystem::path(CLinuxLanguageManager::GetLocaleDirectory()),
             std::filesystem::path(kTestCatalogs).lexically_normal());
 }
-
-}  // namespace
-
-namespace {
 
 TEST(LinuxLanguageManager, NoLocaleOrAnUninstalledOneStillShowsTheEnglishTexts) {
   // Neither the C locale nor a missing one may leave the user with bare keys.

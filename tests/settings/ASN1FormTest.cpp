@@ -31,29 +31,28 @@ Bytes WithMagic(const Bytes& node_I) {
 }
 
 TEST(ASN1EncodingTest, NodesEncodeToTheirFixedTagsAndMinimalLengths) {
-  EXPECT_EQ(NodeBytes(*CSettingsInteger::New(0)), (Bytes{0x02, 0x01, 0x00}));
-  EXPECT_EQ(NodeBytes(*CSettingsInteger::New(0x1234)), (Bytes{0x02, 0x02, 0x12, 0x34}));
-  EXPECT_EQ(NodeBytes(*CSettingsInteger::New(-1)),
-            (Bytes{0x02, 0x08, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF}));
-  EXPECT_EQ(NodeBytes(*CSettingsBool::New(true)), (Bytes{0x01, 0x01, 0xFF}));
-  EXPECT_EQ(NodeBytes(*CSettingsBool::New(false)), (Bytes{0x01, 0x01, 0x00}));
-  EXPECT_EQ(NodeBytes(*CSettingsDouble::New(1.0)),
-            (Bytes{0x41, 0x08, 0x3F, 0xF0, 0, 0, 0, 0, 0, 0}));
-  EXPECT_EQ(NodeBytes(*CSettingsBytes::New({7, 8})), (Bytes{0x04, 0x02, 7, 8}));
-  EXPECT_EQ(NodeBytes(*CSettingsNULL::New()), (Bytes{0x05, 0x00}));
-  EXPECT_EQ(NodeBytes(*CSettingsKEString::New("k")), (Bytes{0x63, 0x01, 'k'}));
-  EXPECT_EQ(NodeBytes(*CSettingsMap::New()), (Bytes{0x60, 0x80, 0x00, 0x00}));
-
-  const Bytes longText = NodeBytes(*CSettingsString::New(std::string(200, 'x')));
-  ASSERT_EQ(longText.size(), 203u);
-  EXPECT_EQ((Bytes{longText[0], longText[1], longText[2]}), (Bytes{0x0C, 0x81, 0xC8}));
-
   auto array = CSettingsArray::New();
   array->AddString("a");
   auto map = CSettingsMap::New();
   map->SetKeyAndObject("L", array);
-  EXPECT_EQ(NodeBytes(*map), (Bytes{0x60, 0x80, 0x0C, 0x01, 'L', 0x62, 0x80, 0x0C, 0x01, 'a', 0x00,
-                                    0x00, 0x00, 0x00}));
+  const std::pair<std::shared_ptr<CSettingsObject>, Bytes> cases[] = {
+      {CSettingsInteger::New(0), {0x02, 0x01, 0x00}},
+      {CSettingsInteger::New(0x1234), {0x02, 0x02, 0x12, 0x34}},
+      {CSettingsInteger::New(-1), {0x02, 0x08, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF}},
+      {CSettingsBool::New(true), {0x01, 0x01, 0xFF}},
+      {CSettingsBool::New(false), {0x01, 0x01, 0x00}},
+      {CSettingsDouble::New(1.0), {0x41, 0x08, 0x3F, 0xF0, 0, 0, 0, 0, 0, 0}},
+      {CSettingsBytes::New({7, 8}), {0x04, 0x02, 7, 8}},
+      {CSettingsNULL::New(), {0x05, 0x00}},
+      {CSettingsKEString::New("k"), {0x63, 0x01, 'k'}},
+      {CSettingsMap::New(), {0x60, 0x80, 0x00, 0x00}},
+      {map, {0x60, 0x80, 0x0C, 0x01, 'L', 0x62, 0x80, 0x0C, 0x01, 'a', 0x00, 0x00, 0x00, 0x00}}};
+  for (const auto& [object, bytes] : cases)
+    EXPECT_EQ(NodeBytes(*object), bytes) << object->GetTraceString();
+
+  const Bytes longText = NodeBytes(*CSettingsString::New(std::string(200, 'x')));
+  ASSERT_EQ(longText.size(), 203u);
+  EXPECT_EQ(Bytes(longText.begin(), longText.begin() + 3), (Bytes{0x0C, 0x81, 0xC8}));
   EXPECT_EQ(CSettingsInteger::New(5)->GetASN1Binary(), WithMagic({0x02, 0x01, 0x05}));
 }
 
@@ -63,41 +62,35 @@ TEST(ASN1EncodingTest, BuildingBlocksFollowTheLengthAndIdentifierRules) {
   EXPECT_EQ(ASN1Coding::MakeLength(128), (Bytes{0x81, 0x80}));
   EXPECT_EQ(ASN1Coding::MakeLength(0x10000), (Bytes{0x83, 0x01, 0x00, 0x00}));
   EXPECT_EQ(ASN1Coding::MakeLength(ASN1Coding::IndefiniteLength), (Bytes{0x80}));
-  EXPECT_EQ(ASN1Coding::MinByteLengthOfInt(0), 1u);
-  EXPECT_EQ(ASN1Coding::MinByteLengthOfInt(0xFF), 1u);
-  EXPECT_EQ(ASN1Coding::MinByteLengthOfInt(0x100), 2u);
-  EXPECT_EQ(ASN1Coding::MinByteLengthOfInt(~0ULL), 8u);
-
+  for (const auto& [value, length] :
+       {std::pair<uint64_t, size_t>{0, 1}, {0xFF, 1}, {0x100, 2}, {~0ULL, 8}}) {
+    EXPECT_EQ(ASN1Coding::MinByteLengthOfInt(value), length) << value;
+  }
   using ASN1Coding::Identifier;
-  EXPECT_EQ(ASN1Coding::MakeIdentifier(
-                Identifier{ASN1Coding::ECLASS_UNIVERSAL, static_cast<ASN1Coding::EDataType>(16)}),
-            0x30);  // a sequence is constructed
-  EXPECT_EQ(ASN1Coding::MakeIdentifier(
-                Identifier{ASN1Coding::ECLASS_UNIVERSAL, static_cast<ASN1Coding::EDataType>(24)}),
-            0x18);
-  EXPECT_EQ(ASN1Coding::MakeIdentifier(
-                Identifier{ASN1Coding::ECLASS_UNIVERSAL, static_cast<ASN1Coding::EDataType>(31)}),
-            0);
+  const auto universal = [](int type_I) {
+    return ASN1Coding::MakeIdentifier(
+        Identifier{ASN1Coding::ECLASS_UNIVERSAL, static_cast<ASN1Coding::EDataType>(type_I)});
+  };
+  EXPECT_EQ(universal(16), 0x30);  // a sequence is constructed
+  EXPECT_EQ(universal(24), 0x18);
+  EXPECT_EQ(universal(31), 0);
   EXPECT_TRUE(capture.AssertionContains("Multi-byte identifiers are not supported"));
 
   // Lengths of the long form read back; the decoders stop at the end of data.
-  size_t pos = 0;
-  EXPECT_EQ(ASN1Coding::DecodeLengthFromArchive(Bytes{0x82, 0x01, 0x00}, pos), 256u);
-  EXPECT_EQ(pos, 3u);
-  pos = 0;
-  EXPECT_THROW(ASN1Coding::DecodeLengthFromArchive(Bytes{0x82, 0x01}, pos), std::out_of_range);
-  pos = 0;
-  EXPECT_THROW(ASN1Coding::DecodeStringFromArchive(Bytes{0x05, 'a'}, pos), std::out_of_range);
-  pos = 0;
-  const Bytes lone{0x00};
-  EXPECT_THROW(ASN1Coding::DecodeEndOfContentsIdentifierFromArchive(lone, pos), std::out_of_range);
-  pos = 0;
-  EXPECT_FALSE(ASN1Coding::DecodeEndOfContentsIdentifierFromArchive(Bytes{0x00, 0x01}, pos));
-  EXPECT_EQ(pos, 0u);
-  pos = 0;
-  EXPECT_EQ(ASN1Coding::DecodeIdentifierFromArchive(Bytes{0x63}, pos, false),
+  size_t length = 0, cut = 0, text = 0, lone = 0, endOfContents = 0, identifier = 0;
+  EXPECT_EQ(ASN1Coding::DecodeLengthFromArchive(Bytes{0x82, 0x01, 0x00}, length), 256u);
+  EXPECT_EQ(length, 3u);
+  EXPECT_THROW(ASN1Coding::DecodeLengthFromArchive(Bytes{0x82, 0x01}, cut), std::out_of_range);
+  EXPECT_THROW(ASN1Coding::DecodeStringFromArchive(Bytes{0x05, 'a'}, text), std::out_of_range);
+  const Bytes loneZero{0x00};
+  EXPECT_THROW(ASN1Coding::DecodeEndOfContentsIdentifierFromArchive(loneZero, lone),
+               std::out_of_range);
+  EXPECT_FALSE(
+      ASN1Coding::DecodeEndOfContentsIdentifierFromArchive(Bytes{0x00, 0x01}, endOfContents));
+  EXPECT_EQ(endOfContents, 0u);
+  EXPECT_EQ(ASN1Coding::DecodeIdentifierFromArchive(Bytes{0x63}, identifier, false),
             (Identifier{ASN1Coding::ECLASS_APPLICATION, ASN1Coding::ETYPE_SETTINGS_KESTRING}));
-  EXPECT_EQ(pos, 0u);
+  EXPECT_EQ(identifier, 0u);
 }
 
 TEST(ASN1DocumentTest, EveryClassRoundTripsAndKEStringsStayKEStrings) {
@@ -224,45 +217,28 @@ TEST(CompressedDocumentTest, RoundTripsThroughTheWrapperMap) {
 
 TEST(CompressedDocumentTest, DamagedWrappersGiveEmptyResults) {
   LogCapture capture;
-  const Bytes inner = CSettingsInteger::New(1)->GetASN1Binary();
-  const Bytes zipped = CompressionUtils::Compress(inner);
-  auto wrap = [](std::shared_ptr<CSettingsObject> bytes_I,
-                 std::shared_ptr<CSettingsObject> size_I) {
-    auto map = CSettingsMap::New();
-    if (bytes_I) map->SetKeyAndObject("bytes", bytes_I);
-    if (size_I) map->SetKeyAndObject("originalSize", size_I);
-    return map->GetASN1Binary();
-  };
-
-  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(
-                wrap(CSettingsBytes::New(zipped), CSettingsInteger::New(0))),
-            nullptr);
-  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(wrap(nullptr, CSettingsInteger::New(9))),
-            nullptr);
-  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(
-                wrap(CSettingsString::New("x"), CSettingsInteger::New(9))),
-            nullptr);
-  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(CSettingsArray::New()->GetASN1Binary()),
-            nullptr);
-  EXPECT_TRUE(capture.LogContains("CSettingsMap::CastToMap got a array"));
-
+  const Bytes zipped = CompressionUtils::Compress(CSettingsInteger::New(1)->GetASN1Binary());
   Bytes damaged = zipped;
   damaged[damaged.size() / 2] ^= 0x5A;
   damaged.resize(damaged.size() - 2);
-  EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(
-                wrap(CSettingsBytes::New(damaged), CSettingsInteger::New(9))),
-            nullptr);
-  EXPECT_TRUE(capture.AssertionContains("!expandedBuffer.empty()"));
-
+  const auto wrap = [](std::shared_ptr<CSettingsObject> bytes_I, int64_t size_I) {
+    auto map = CSettingsMap::New();
+    if (bytes_I) map->SetKeyAndObject("bytes", bytes_I);
+    map->SetKeyAndInteger("originalSize", size_I);
+    return map->GetASN1Binary();
+  };
   // A size no zlib data of this length can reach is refused, not allocated.
-  for (int64_t size : {int64_t{1} << 40, int64_t{-1}}) {
-    EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(
-                  wrap(CSettingsBytes::New(zipped), CSettingsInteger::New(size))),
-              nullptr);
+  for (const Bytes& wrapper :
+       {wrap(CSettingsBytes::New(zipped), 0), wrap(nullptr, 9), wrap(CSettingsString::New("x"), 9),
+        CSettingsArray::New()->GetASN1Binary(), wrap(CSettingsBytes::New(damaged), 9),
+        wrap(CSettingsBytes::New(zipped), int64_t{1} << 40),
+        wrap(CSettingsBytes::New(zipped), -1)}) {
+    EXPECT_EQ(CSettingsObject::ReadFromCompressedBinary(wrapper), nullptr);
   }
+  EXPECT_TRUE(capture.LogContains("CSettingsMap::CastToMap got a array"));
+  EXPECT_TRUE(capture.AssertionContains("!expandedBuffer.empty()"));
   // A size too small still expands: the buffer grows.
-  auto small = CSettingsObject::ReadFromCompressedBinary(
-      wrap(CSettingsBytes::New(zipped), CSettingsInteger::New(1)));
+  auto small = CSettingsObject::ReadFromCompressedBinary(wrap(CSettingsBytes::New(zipped), 1));
   ASSERT_TRUE(small);
   EXPECT_TRUE(small->IsEqualTo(CSettingsInteger::New(1)));
 }

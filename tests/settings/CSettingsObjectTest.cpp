@@ -8,19 +8,18 @@
 #include "settings/CSettingsObject.h"
 #include "support/LogCapture.h"
 
-namespace {
+using Keys = std::vector<std::string>;
 
 TEST(CSettingsMapTest, StoredNullLooksAbsentButIsCounted) {
   LogCapture capture;
   auto map = CSettingsMap::New();
   map->SetKeyAndObject("a", nullptr);
   map->SetKeyAndInteger("b", 2);
-
   EXPECT_FALSE(map->IsKeyPresent("a"));
   EXPECT_EQ(map->ObjectForKey("a"), nullptr);
   EXPECT_EQ(map->TypeNameForKeyOrEmpty("a"), "");
   EXPECT_EQ(map->ObjectCount(), 2u);
-  EXPECT_EQ(map->GetKeys(), (std::vector<std::string>{"a", "b"}));
+  EXPECT_EQ(map->GetKeys(), (Keys{"a", "b"}));
   EXPECT_EQ(map->IntegerForKeyWithDefault("a", int64_t{9}), 9);
 
   auto array = CSettingsArray::New();
@@ -29,12 +28,10 @@ TEST(CSettingsMapTest, StoredNullLooksAbsentButIsCounted) {
   EXPECT_EQ(array->ObjectForIndex(0), nullptr);
   EXPECT_EQ(array->TypeNameForIndexOrEmpty(0), "");
   EXPECT_TRUE(capture.Assertions().empty());
-}
 
-TEST(CSettingsMapTest, KeysWalkInByteOrder) {
-  auto map = CSettingsMap::New();
-  for (const char* key : {"b", "B", "a", "_z", "a1"}) map->SetKeyAndBool(key, true);
-  EXPECT_EQ(map->GetKeys(), (std::vector<std::string>{"B", "_z", "a", "a1", "b"}));
+  // Keys walk in byte order.
+  for (const char* key : {"b", "B", "_z", "a1"}) map->SetKeyAndBool(key, true);
+  EXPECT_EQ(map->GetKeys(), (Keys{"B", "_z", "a", "a1", "b"}));
 }
 
 TEST(CSettingsMapTest, TypedLookupsWarnAndNeverConvert) {
@@ -44,7 +41,6 @@ TEST(CSettingsMapTest, TypedLookupsWarnAndNeverConvert) {
   map->SetKeyAndDouble("d", 3.0);
   map->SetKeyAndKEString("ke", "secret");
   map->SetKeyAndInteger("big", 65537);
-
   EXPECT_EQ(map->IntegerForKeyWithDefault("k", int64_t{7}), 7);
   EXPECT_TRUE(capture.LogContains(
       "[W] CSettingsMap::ObjectForKey got a string and failed to cast to CSettingsInteger"));
@@ -53,32 +49,23 @@ TEST(CSettingsMapTest, TypedLookupsWarnAndNeverConvert) {
   EXPECT_EQ(map->KEStringForKeyWithDefault("ke", "dflt"), "secret");
   EXPECT_EQ(map->DoubleForKeyWithDefault("d", 0.5), 3.0);
   EXPECT_EQ(map->IntegerForKeyWithDefault("missing", int64_t{-4}), -4);
-
   // The narrowed getters keep the low bits of the 64-bit value.
   EXPECT_EQ(map->IntegerForKeyWithDefault<unsigned short>("big", 0), 1);
   EXPECT_EQ(map->IntegerForKeyWithDefault<int>("big", 0), 65537);
   EXPECT_EQ(map->IntegerForKeyWithDefault<unsigned long>("missing", 5ul), 5ul);
-
   auto fallback = CSettingsString::New("fallback");
   EXPECT_EQ(map->ObjectForKeyWithDefault<CSettingsString>("d", fallback), fallback);
   EXPECT_EQ(map->ObjectForKey<CSettingsDouble>("d")->GetValue(), 3.0);
-}
 
-TEST(CSettingsMapTest, InvalidXmlKeyAssertsButIsStored) {
-  LogCapture capture;
-  auto map = CSettingsMap::New();
+  // A key that is no valid XML name asserts but is stored.
   map->SetKeyAndInteger("1bad", 3);
   EXPECT_TRUE(capture.AssertionContains("isValidXMLName"));
-  EXPECT_TRUE(map->IsKeyPresent("1bad"));
   EXPECT_EQ(map->IntegerForKeyWithDefault("1bad", int64_t{0}), 3);
 }
 
-TEST(CSettingsArrayTest, SetObjectAtIndexReplacesAppendsOrIgnores) {
+TEST(CSettingsArrayTest, IndexedAccessReplacesAppendsOrIgnores) {
   auto array = CSettingsArray::New();
-  array->AddInteger(0);
-  array->AddInteger(1);
-  array->AddInteger(2);
-
+  for (int i = 0; i < 3; ++i) array->AddInteger(i);
   array->SetObjectAtIndex(5, CSettingsString::New("x"));
   EXPECT_EQ(array->ObjectCount(), 3u);
   array->SetObjectAtIndex(3, CSettingsString::New("x"));
@@ -88,34 +75,28 @@ TEST(CSettingsArrayTest, SetObjectAtIndexReplacesAppendsOrIgnores) {
   EXPECT_EQ(array->ObjectCount(), 4u);
   EXPECT_EQ(array->ObjectForIndex(1), nullptr);
   EXPECT_EQ(array->GetIndexes(), (std::vector<size_t>{0, 1, 2, 3}));
-
   EXPECT_EQ(array->IntegerForIndexWithDefault(2, -1), 2);
   EXPECT_EQ(array->IntegerForIndexWithDefault(3, -1), -1);  // a string
   EXPECT_EQ(array->IntegerForIndexWithDefault(99, -1), -1);
   EXPECT_TRUE(array->BoolForIndexWithDefault(99, true));
   EXPECT_EQ(array->DoubleForIndexWithDefault(0, 1.5), 1.5);
-}
 
-TEST(CSettingsArrayTest, IsStringPresentSkipsOtherItemsAndHonoursCase) {
-  auto array = CSettingsArray::New();
-  array->AddInteger(5);
+  // IsStringPresent skips other items, a KEString included, and honours case.
   array->AddString("");
   array->AddObject(CSettingsKEString::New("Pen"));
   array->AddString("Touch");
-
-  EXPECT_FALSE(array->IsStringPresent("", true));
-  EXPECT_FALSE(array->IsStringPresent("5", false));
-  EXPECT_FALSE(array->IsStringPresent("Pen", false));  // a KEString is no string
-  EXPECT_TRUE(array->IsStringPresent("Touch", false));
-  EXPECT_FALSE(array->IsStringPresent("touch", false));
-  EXPECT_TRUE(array->IsStringPresent("TOUCH", true));
+  const std::tuple<const char*, bool, bool> lookups[] = {
+      {"", true, false},      {"2", false, false},     {"Pen", false, false},
+      {"Touch", false, true}, {"touch", false, false}, {"TOUCH", true, true}};
+  for (const auto& [text, ignoreCase, present] : lookups) {
+    EXPECT_EQ(array->IsStringPresent(text, ignoreCase), present) << text;
+  }
 }
 
 TEST(CSettingsCastTest, CastsReportAsSpecifiedAndNeverConvert) {
   LogCapture capture;
   auto integer = CSettingsInteger::New(4);
   auto text = CSettingsString::New("4");
-
   EXPECT_EQ(CSettingsMap::CastToMap(nullptr, true), nullptr);
   EXPECT_EQ(CSettingsMap::CastToMap(integer, false), nullptr);
   EXPECT_TRUE(capture.Log().empty());
@@ -125,7 +106,6 @@ TEST(CSettingsCastTest, CastsReportAsSpecifiedAndNeverConvert) {
   EXPECT_EQ(CSettingsArray::CastToArray(text, true), nullptr);
   EXPECT_TRUE(capture.LogContains(
       "[W] CSettingsArray::CastToArray got a string which is not a CSettingsArray"));
-
   EXPECT_EQ(CSettingsInteger::CastToInteger(text), nullptr);
   EXPECT_TRUE(
       capture.LogContains("[I] CSettingsInteger::CastToInteger got source object of type string"));
@@ -158,32 +138,29 @@ TEST(CSettingsObjectTest, EqualityComparesClassValueAndStructure) {
   EXPECT_FALSE(a->IsEqualTo(b));  // different keys
   b->SetKeyAndInteger("list", 1);
   EXPECT_FALSE(a->IsEqualTo(b));  // same keys, different class
-
   auto withNull = CSettingsMap::New();
   withNull->SetKeyAndObject("n", nullptr);
   EXPECT_FALSE(withNull->IsEqualTo(withNull->DeepCopy()));
   EXPECT_TRUE(capture.AssertionContains("mine"));
 }
 
-TEST(CSettingsObjectTest, DeepCopySharesNoNode) {
+TEST(CSettingsObjectTest, DeepCopySharesNoNodeWhileMergeSharesThem) {
   auto inner = CSettingsArray::New();
   inner->AddString("one");
   auto original = CSettingsMap::New();
   original->SetKeyAndObject("inner", inner);
   original->SetKeyAndObject("blob", CSettingsBytes::New({1, 2, 3}));
   original->SetKeyAndObject("nothing", nullptr);
-
   auto copy = CSettingsMap::CastToMap(original->DeepCopy(), true);
   ASSERT_TRUE(copy);
-  EXPECT_EQ(copy->GetKeys(), original->GetKeys());
+  EXPECT_EQ(copy->GetTraceString(), original->GetTraceString());
+  EXPECT_EQ(copy->GetTraceString(),
+            "map[blob:bytes[AQID], inner:array[0:string[one]], nothing:null[]]");
   EXPECT_NE(copy->ObjectForKey("inner"), original->ObjectForKey("inner"));
-  EXPECT_EQ(copy->TypeNameForKeyOrEmpty("blob"), "bytes");
-
   copy->ObjectForKey<CSettingsArray>("inner")->AddString("two");
   EXPECT_EQ(inner->ObjectCount(), 1u);
-}
 
-TEST(CSettingsMapTest, MergeSharesNodesAndTurnsNullsIntoNewNulls) {
+  // A merge turns nulls into new nulls.
   auto shared = CSettingsString::New("shared");
   auto other = CSettingsMap::New();
   other->SetKeyAndObject("s", shared);
@@ -191,20 +168,16 @@ TEST(CSettingsMapTest, MergeSharesNodesAndTurnsNullsIntoNewNulls) {
   auto target = CSettingsMap::New();
   target->SetKeyAndInteger("s", 1);
   target->SetKeyAndInteger("keep", 2);
-
   target->MergeMapObject(nullptr);
   EXPECT_EQ(target->ObjectCount(), 2u);
   target->MergeMapObject(other);
   EXPECT_EQ(target->ObjectForKey("s"), shared);
-  EXPECT_EQ(target->IntegerForKeyWithDefault("keep", int64_t{0}), 2);
-  EXPECT_EQ(target->GetKeys(), (std::vector<std::string>{"keep", "n", "s"}));
-  EXPECT_FALSE(target->IsKeyPresent("n"));
+  EXPECT_EQ(target->GetTraceString(), "map[keep:integer[2], n:null[], s:string[shared]]");
 }
 
 TEST(CSettingsObjectTest, TraceStringsKeepTheEmptyContainerQuirk) {
   EXPECT_EQ(CSettingsMap::New()->GetTraceString(), "ma]");
   EXPECT_EQ(CSettingsArray::New()->GetTraceString(), "arra]");
-
   auto array = CSettingsArray::New();
   array->AddString("x");
   array->AddBool(true);
@@ -221,13 +194,12 @@ TEST(CSettingsObjectTest, TraceStringsKeepTheEmptyContainerQuirk) {
 
 TEST(CSettingsBoolTest, StringToBoolReadsWordsThenNumbers) {
   LogCapture capture;
-  EXPECT_TRUE(CSettingsBool::StringToBool("TRUE", false));
-  EXPECT_FALSE(CSettingsBool::StringToBool("False", true));
-  EXPECT_TRUE(CSettingsBool::StringToBool("1", false));
-  EXPECT_TRUE(CSettingsBool::StringToBool(" -3 ", false));
-  EXPECT_FALSE(CSettingsBool::StringToBool("0", true));
-  EXPECT_TRUE(CSettingsBool::StringToBool("yes", true));
-  EXPECT_FALSE(CSettingsBool::StringToBool("yes", false));
+  const std::tuple<const char*, bool, bool> cases[] = {
+      {"TRUE", false, true}, {"False", true, false}, {"1", false, true},   {" -3 ", false, true},
+      {"0", true, false},    {"yes", true, true},    {"yes", false, false}};
+  for (const auto& [text, fallback, expected] : cases) {
+    EXPECT_EQ(CSettingsBool::StringToBool(text, fallback), expected) << text << fallback;
+  }
 }
 
 TEST(CSettingsFreezeTest, RectanglesFreezeByTheirDerivedEdges) {
@@ -236,7 +208,6 @@ TEST(CSettingsFreezeTest, RectanglesFreezeByTheirDerivedEdges) {
   EXPECT_EQ(rect.height, 21);
   EXPECT_EQ(rect.Right(), 30);
   EXPECT_EQ(rect.Bottom(), 40);
-
   auto frozen = CSettingsObject::FromComplexType(rect);
   EXPECT_EQ(frozen->IntegerForKeyWithDefault("Epsilon", int64_t{-1}), 1);
   EXPECT_EQ(frozen->IntegerForKeyWithDefault("Left", int64_t{-1}), 10);
@@ -249,14 +220,12 @@ TEST(CSettingsFreezeTest, RectanglesFreezeByTheirDerivedEdges) {
   EXPECT_EQ(tiny.Top(), 6);
   EXPECT_EQ(tiny.Right(), 5);
   EXPECT_EQ(tiny.Bottom(), 7);
-
   const SDoubleRect doubleRect = SDoubleRect::FromEdges(0.5, 1.5, 10.5, 4.0, 0.0);
   EXPECT_EQ(doubleRect.width, 10.0);
   EXPECT_EQ(CSettingsObject::FromComplexType(doubleRect)->ToComplexType<SDoubleRect>(), doubleRect);
   const SDoubleRect tinyDouble(SDoublePoint(1.0, 1.0), 0.25, 0.25, 0.5);
   EXPECT_EQ(tinyDouble.Left(), 1.75);
   EXPECT_EQ(tinyDouble.Right(), 1.0);
-
   EXPECT_EQ(CSettingsObject::FromComplexType(SPoint(-3, 4))->ToComplexType<SPoint>(),
             SPoint(-3, 4));
   EXPECT_EQ(
@@ -276,11 +245,10 @@ TEST(CSettingsFreezeTest, ThawingSomethingElseAssertsAndGivesDefaults) {
   partial->SetKeyAndInteger("Right", 4);
   partial->SetKeyAndInteger("Bottom", 3);
   const size_t before = capture.Assertions().size();
-  const SRect rect = partial->ToComplexType<SRect>();
+  EXPECT_EQ(partial->ToComplexType<SRect>(), SRect::FromEdges(2, 0, 4, 3, 0));
   const auto assertions = capture.Assertions();
   ASSERT_EQ(assertions.size(), before + 1);  // "Epsilon" is not asserted
   EXPECT_NE(assertions.back().find("map->IsKeyPresent(\"Top\")"), std::string::npos);
-  EXPECT_EQ(rect, SRect::FromEdges(2, 0, 4, 3, 0));
 }
 
 TEST(CSettingsObjectTest, LanguageAndPlatformFiltersCompareExactly) {
@@ -296,5 +264,3 @@ TEST(CSettingsObjectTest, LanguageAndPlatformFiltersCompareExactly) {
   CSettingsObject::SetPlatformIDFilter("");
   EXPECT_TRUE(CSettingsObject::ValidForCurrentLangAndPlat("EN", "mac"));
 }
-
-}  // namespace

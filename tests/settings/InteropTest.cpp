@@ -90,16 +90,14 @@ TEST(InteropTest, XmlIsWellFormedForXmllint) {
   const fs::path xml = WriteTemp("tree.xml", tree->GetXMLString(""));
   const SToolResult lint = RunTool("xmllint --noout '" + xml.string() + "'");
   EXPECT_EQ(lint.mStatus, 0) << lint.mOutput;
-  const SToolResult escaped =
-      RunTool("xmllint --xpath 'string(/root/Escaped)' '" + xml.string() + "'");
-  EXPECT_EQ(escaped.mOutput, "a<b & \"c\" 'd' ]]> e\n");
-  const SToolResult secret =
-      RunTool("xmllint --xpath 'string(/root/Secret)' '" + xml.string() + "'");
-  EXPECT_EQ(secret.mOutput, "k&rsqbracket;&rsqbracket;>y\n");
-  const SToolResult type =
-      RunTool("xmllint --xpath 'string(/root/Board/ProductId/@type)' '" + xml.string() + "'");
-  EXPECT_EQ(type.mOutput, "integer\n");
-
+  for (const auto& [path, expected] :
+       {std::pair<const char*, const char*>{"/root/Escaped", "a<b & \"c\" 'd' ]]> e\n"},
+        {"/root/Secret", "k&rsqbracket;&rsqbracket;>y\n"},
+        {"/root/Board/ProductId/@type", "integer\n"}}) {
+    EXPECT_EQ(RunTool("xmllint --xpath 'string(" + std::string(path) + ")' '" + xml.string() + "'")
+                  .mOutput,
+              expected);
+  }
   const fs::path plist = WriteTemp("tree.plist", tree->GetPListString(true));
   const SToolResult plistLint = RunTool("xmllint --noout '" + plist.string() + "'");
   EXPECT_EQ(plistLint.mStatus, 0) << plistLint.mOutput;
@@ -107,43 +105,37 @@ TEST(InteropTest, XmlIsWellFormedForXmllint) {
   fs::remove(plist);
 }
 
-TEST(InteropTest, PropertyListLoadsInPlistlib) {
-  if (!ToolAvailable("python3")) GTEST_SKIP() << "python3 is not installed";
-  const fs::path plist = WriteTemp("tree.plist", PortableTree()->GetPListString(true));
-  const fs::path script = WriteTemp("plist.py", std::string(kPythonDump) +
-                                                    "import plistlib\n"
-                                                    "with open(sys.argv[1], 'rb') as f:\n"
-                                                    "    dump(plistlib.load(f))\n");
-  const SToolResult result = RunTool("python3 '" + script.string() + "' '" + plist.string() + "'");
-  EXPECT_EQ(result.mStatus, 0) << result.mOutput;
-  EXPECT_EQ(result.mOutput,
-            "{\"Big\":9223372036854775807,"
-            "\"Board\":{\"Interface\":\"HID\",\"Key\":\"hex:0010ff010203\",\"ProductId\":855},"
-            "\"List\":[true,false,-12,2.5,\"x\"],"
-            "\"Name\":\"Pen display 13 \xC3\xA9\",\"Ratio\":0.125}\n");
-  fs::remove(plist);
-  fs::remove(script);
-}
-
-TEST(InteropTest, JsonLoadsInPythonJson) {
+TEST(InteropTest, PropertyListAndJsonLoadInPython) {
   if (!ToolAvailable("python3")) GTEST_SKIP() << "python3 is not installed";
   auto tree = PortableTree();
+  const fs::path plist = WriteTemp("tree.plist", tree->GetPListString(true));
   tree->SetKeyAndObject("Nothing", nullptr);
   const fs::path json = WriteTemp("tree.json", "");
   ASSERT_TRUE(tree->SaveJSONToFile(json.string()));
-  const fs::path script =
-      WriteTemp("json.py", std::string(kPythonDump) +
-                               "with open(sys.argv[1], encoding='utf-8') as f:\n"
-                               "    dump(json.load(f))\n");
-  const SToolResult result = RunTool("python3 '" + script.string() + "' '" + json.string() + "'");
-  EXPECT_EQ(result.mStatus, 0) << result.mOutput;
-  EXPECT_EQ(result.mOutput,
-            "{\"Big\":9223372036854775807,"
-            "\"Board\":{\"Interface\":\"HID\",\"Key\":{\"SbyteS\":\"ABD/AQID\"},\"ProductId\":855},"
-            "\"List\":[true,false,-12,2.5,\"x\"],"
-            "\"Name\":\"Pen display 13 \xC3\xA9\",\"Nothing\":null,\"Ratio\":0.125}\n");
-  fs::remove(json);
-  fs::remove(script);
+  const struct {
+    fs::path file;
+    const char* load;
+    const char* key;
+    const char* nothing;
+  } forms[] = {
+      {plist, "import plistlib\nwith open(sys.argv[1], 'rb') as f:\n    dump(plistlib.load(f))\n",
+       "\"hex:0010ff010203\"", ""},
+      {json, "with open(sys.argv[1], encoding='utf-8') as f:\n    dump(json.load(f))\n",
+       "{\"SbyteS\":\"ABD/AQID\"}", "\"Nothing\":null,"}};
+  for (const auto& form : forms) {
+    const fs::path script = WriteTemp("load.py", std::string(kPythonDump) + form.load);
+    const SToolResult result =
+        RunTool("python3 '" + script.string() + "' '" + form.file.string() + "'");
+    EXPECT_EQ(result.mStatus, 0) << result.mOutput;
+    EXPECT_EQ(result.mOutput, std::string("{\"Big\":9223372036854775807,"
+                                          "\"Board\":{\"Interface\":\"HID\",\"Key\":") +
+                                  form.key +
+                                  ",\"ProductId\":855},\"List\":[true,false,-12,2.5,\"x\"],"
+                                  "\"Name\":\"Pen display 13 \xC3\xA9\"," +
+                                  form.nothing + "\"Ratio\":0.125}\n");
+    fs::remove(script);
+    fs::remove(form.file);
+  }
 }
 
 TEST(InteropTest, BinaryFormIsValidBer) {

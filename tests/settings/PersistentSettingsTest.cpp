@@ -7,20 +7,19 @@
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
-#include <sstream>
+#include <map>
+#include <optional>
 
 #include "settings/CLinuxPersistentSettings.h"
 #include "support/LogCapture.h"
 
-namespace {
-
 namespace fs = std::filesystem;
+
+namespace {
 
 std::string ReadWholeFile(const fs::path& path_I) {
   std::ifstream in(path_I, std::ios::binary);
-  std::stringstream text;
-  text << in.rdbuf();
-  return text.str();
+  return std::string(std::istreambuf_iterator<char>(in), {});
 }
 
 void WriteFile(const fs::path& path_I, const std::string& text_I) {
@@ -37,18 +36,16 @@ class PersistentSettingsTest : public ::testing::Test {
              std::string(::testing::UnitTest::GetInstance()->current_test_info()->name()));
     fs::remove_all(mRoot);
     fs::create_directories(mRoot / "home");
-    Keep("HOME");
-    Keep("XDG_CONFIG_HOME");
+    for (const char* name : {"HOME", "XDG_CONFIG_HOME"}) {
+      const char* value = std::getenv(name);
+      mSaved[name] = value ? std::optional<std::string>(value) : std::nullopt;
+    }
     setenv("HOME", (mRoot / "home").c_str(), 1);
     setenv("XDG_CONFIG_HOME", (mRoot / "config").c_str(), 1);
   }
   void TearDown() override {
     for (const auto& [name, value] : mSaved) {
-      if (value.second) {
-        setenv(name.c_str(), value.first.c_str(), 1);
-      } else {
-        unsetenv(name.c_str());
-      }
+      value ? setenv(name.c_str(), value->c_str(), 1) : unsetenv(name.c_str());
     }
     fs::remove_all(mRoot);
   }
@@ -56,13 +53,7 @@ class PersistentSettingsTest : public ::testing::Test {
   fs::path LegacyFile() const { return mRoot / "home" / ".tavik" / "tdc.xml"; }
 
   fs::path mRoot;
-
- private:
-  void Keep(const std::string& name_I) {
-    const char* value = std::getenv(name_I.c_str());
-    mSaved[name_I] = {value != nullptr ? value : "", value != nullptr};
-  }
-  std::map<std::string, std::pair<std::string, bool>> mSaved;
+  std::map<std::string, std::optional<std::string>> mSaved;
 };
 
 TEST_F(PersistentSettingsTest, BaseStoreKeepsValuesInItsFileAcrossStarts) {

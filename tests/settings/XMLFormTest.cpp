@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
-#include <cstdio>
 #include <filesystem>
 #include <stdexcept>
 
@@ -13,73 +12,61 @@
 #include "settings/XmlUtils.h"
 #include "support/LogCapture.h"
 
-namespace {
+namespace fs = std::filesystem;
 
-std::shared_ptr<CSettingsMap> ReadXmlMap(const std::string& xml_I) {
+static std::shared_ptr<CSettingsMap> ReadXmlMap(const std::string& xml_I) {
   return CSettingsMap::CastToMap(CSettingsObject::ReadFromXMLBuffer(xml_I), false);
 }
 
-std::shared_ptr<CSettingsMap> EveryClassTree() { return SettingsTestTrees::EveryClass(); }
-
-TEST(XMLReadTest, HandWrittenDocumentReadsWithOrWithoutTypes) {
+TEST(XMLReadTest, DocumentsReadAsTheirTrees) {
   LogCapture capture;
-  auto map = ReadXmlMap(
-      "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
-      "<root type=\"map\">\n"
-      "  <Name type=\"string\">abc</Name>\n"
-      "  <Count type=\"integer\"> 12 </Count>\n"
-      "  <Blob type=\"bytes\">AQID</Blob>\n"
-      "  <List type=\"array\"><ArrayElement type=\"bool\">TRUE</ArrayElement>"
-      "<Other type=\"bool\">false</Other></List>\n"
-      "  <Ratio type=\"double\">2.5</Ratio>\n"
-      "  <Nothing type=\"null\"/>\n"
-      "  <Empty/>\n"
-      "  <M><A> 1 </A></M>\n"
-      "</root>\n");
-  ASSERT_TRUE(map);
-  EXPECT_EQ(map->StringForKeyWithDefault("Name", ""), "abc");
-  EXPECT_EQ(map->IntegerForKeyWithDefault("Count", int64_t{0}), 12);
-  EXPECT_EQ(map->ObjectForKey<CSettingsBytes>("Blob")->GetValue(),
-            (std::vector<unsigned char>{1, 2, 3}));
-  auto list = map->ObjectForKey<CSettingsArray>("List");
-  ASSERT_TRUE(list);
-  EXPECT_EQ(list->ObjectCount(), 1u);  // "Other" is not an array element
-  EXPECT_TRUE(list->BoolForIndexWithDefault(0, false));
-  EXPECT_EQ(map->DoubleForKeyWithDefault("Ratio", 0), 2.5);
-  EXPECT_EQ(map->ObjectCount(), 8u);
-  EXPECT_FALSE(map->IsKeyPresent("Nothing"));
-  EXPECT_EQ(map->StringForKeyWithDefault("Empty", "x"), "");
-  EXPECT_EQ(map->ObjectForKey<CSettingsMap>("M")->StringForKeyWithDefault("A", ""), "1");
-  EXPECT_TRUE(capture.Assertions().empty());
-}
-
-TEST(XMLReadTest, DuplicatesAndBadValuesFollowTheirRules) {
-  LogCapture capture;
-  auto typed =
-      ReadXmlMap("<root type=\"map\"><A type=\"integer\">1</A><A type=\"integer\">2</A></root>");
-  ASSERT_TRUE(typed);
-  EXPECT_EQ(typed->IntegerForKeyWithDefault("A", int64_t{0}), 2);
-  EXPECT_FALSE(capture.LogContains("duplicate key"));
-
-  auto untyped = ReadXmlMap("<root><A type=\"integer\">1</A><A type=\"integer\">2</A></root>");
-  ASSERT_TRUE(untyped);
-  EXPECT_EQ(untyped->IntegerForKeyWithDefault("A", int64_t{0}), 2);
-  EXPECT_TRUE(capture.LogContains("[W] CSettingsMap::ReadFromXMLNode duplicate key A"));
-
-  auto bad = ReadXmlMap(
-      "<root><I type=\"integer\">12abc</I><J type=\"integer\">abc</J>"
-      "<D type=\"double\">x</D><B type=\"bytes\">AQ==</B><U type=\"color\">red</U></root>");
-  ASSERT_TRUE(bad);
-  EXPECT_EQ(bad->IntegerForKeyWithDefault("I", int64_t{-1}), 12);
+  const std::pair<std::string, const char*> cases[] = {
+      // With or without types; "Other" is not an array element.
+      {"<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<root type=\"map\">\n"
+       "  <Name type=\"string\">abc</Name>\n  <Count type=\"integer\"> 12 </Count>\n"
+       "  <Blob type=\"bytes\">AQID</Blob>\n  <List type=\"array\"><ArrayElement type=\"bool\">"
+       "TRUE</ArrayElement><Other type=\"bool\">false</Other></List>\n"
+       "  <Ratio type=\"double\">2.5</Ratio>\n  <Nothing type=\"null\"/>\n  <Empty/>\n"
+       "  <M><A> 1 </A></M>\n</root>\n",
+       "map[Blob:bytes[AQID], Count:integer[12], Empty:string[], List:array[0:bool[true]], "
+       "M:map[A:string[1]], Name:string[abc], Nothing:null[], Ratio:double[2.500000]]"},
+      // Bad values read what they can; padding is no Base64 character here,
+      // so the whole value is lost; an unknown type is dropped.
+      {"<root><I type=\"integer\">12abc</I><J type=\"integer\">abc</J><D type=\"double\">x</D>"
+       "<B type=\"bytes\">AQ==</B><U type=\"color\">red</U></root>",
+       "map[B:bytes[], D:double[0.000000], I:integer[12], J:integer[0]]"},
+      // A foreign and damaged property list: dates read as text, and an
+      // unknown element keeps the key pending for the next value.
+      {"<plist version=\"1.1\"><dict><key>when</key><date>2024-01-02T03:04:05Z</date>"
+       "<key>flag</key><true>ignored</true><key>late</key><mystery/><integer>7</integer>"
+       "<orphan>1</orphan><key> spaced </key><string> s </string></dict></plist>",
+       "map[flag:bool[true], late:integer[7], spaced:string[s], "
+       "when:string[2024-01-02T03:04:05Z]]"}};
+  std::vector<size_t> assertions;
+  for (const auto& [xml, trace] : cases) {
+    auto object = CSettingsObject::ReadFromXMLBuffer(xml);
+    ASSERT_TRUE(object) << xml;
+    EXPECT_EQ(object->GetTraceString(), trace);
+    assertions.push_back(capture.Assertions().size());
+  }
+  EXPECT_EQ(assertions[0], 0u);  // the hand-written document reads cleanly
   EXPECT_TRUE(
       capture.LogContains("[E] CSettingsInteger::ReadFromXMLNode: ERROR: bad integer: 12abc"));
-  EXPECT_EQ(bad->IntegerForKeyWithDefault("J", int64_t{-1}), 0);
-  EXPECT_EQ(bad->DoubleForKeyWithDefault("D", -1), 0.0);
-  // Padding is no Base64 character here: the whole value is lost.
-  EXPECT_TRUE(bad->ObjectForKey<CSettingsBytes>("B")->GetValue().empty());
   EXPECT_TRUE(capture.LogContains("Base64 exception"));
-  EXPECT_FALSE(bad->IsKeyPresent("U"));
   EXPECT_TRUE(capture.AssertionContains("Unknown node type"));
+  EXPECT_TRUE(capture.AssertionContains("version == \"1.0\""));
+  EXPECT_TRUE(capture.LogContains("[I] found date data. Converting to string"));
+  EXPECT_TRUE(capture.AssertionContains("Bad formed Plist data"));
+  EXPECT_TRUE(capture.LogContains("[E] Found unknown tag mystery"));
+  EXPECT_TRUE(capture.LogContains("[I] CSettingsMap::ReadFromPListNode got node with name orphan"));
+
+  // The later of two like keys wins; only an untyped root says so.
+  const std::string twice = "<A type=\"integer\">1</A><A type=\"integer\">2</A></root>";
+  EXPECT_EQ(ReadXmlMap("<root type=\"map\">" + twice)->IntegerForKeyWithDefault("A", int64_t{0}),
+            2);
+  EXPECT_FALSE(capture.LogContains("duplicate key"));
+  EXPECT_EQ(ReadXmlMap("<root>" + twice)->IntegerForKeyWithDefault("A", int64_t{0}), 2);
+  EXPECT_TRUE(capture.LogContains("[W] CSettingsMap::ReadFromXMLNode duplicate key A"));
 }
 
 TEST(XMLReadTest, FiltersDropNodesForOtherLanguagesAndPlatforms) {
@@ -87,38 +74,34 @@ TEST(XMLReadTest, FiltersDropNodesForOtherLanguagesAndPlatforms) {
   CSettingsObject::SetPlatformIDFilter("linux");
   auto map = ReadXmlMap(
       "<root><T lang=\"en\">hello</T><U lang=\"de\">hallo</U><P plat=\"mac\">x</P>"
-      "<Q plat=\"linux\" type=\"integer\">1</Q>"
-      "<L type=\"array\"><ArrayElement lang=\"fr\">a</ArrayElement>"
-      "<ArrayElement>b</ArrayElement></L></root>");
+      "<Q plat=\"linux\" type=\"integer\">1</Q><L type=\"array\"><ArrayElement lang=\"fr\">a"
+      "</ArrayElement><ArrayElement>b</ArrayElement></L></root>");
   CSettingsObject::SetLanguageIDFilter("");
   CSettingsObject::SetPlatformIDFilter("");
   ASSERT_TRUE(map);
-  EXPECT_EQ(map->GetKeys(), (std::vector<std::string>{"L", "Q", "T"}));
-  EXPECT_EQ(map->ObjectForKey<CSettingsArray>("L")->ObjectCount(), 1u);
+  EXPECT_EQ(map->GetTraceString(), "map[L:array[0:string[b]], Q:integer[1], T:string[hello]]");
 }
 
 TEST(XMLReadTest, UnusableDocumentsGiveEmptyResults) {
   LogCapture capture;
-  EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer(""), nullptr);
-  EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer("<root><a></root>"), nullptr);
+  for (const char* bad :
+       {"", "<root><a></root>", "<root type=\"integer\">x", "<root type=\"nonsense\"/>",
+        "<plist version=\"1.0\"/>", "<plist version=\"1.0\"><set/></plist>"}) {
+    EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer(bad), nullptr) << bad;
+  }
   EXPECT_TRUE(capture.LogContains("[E] TraceXmlError: "));
-  EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer("<root type=\"integer\">x"), nullptr);
-  EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer("<root type=\"nonsense\"/>"), nullptr);
-
   std::string errorText = "untouched";
   EXPECT_EQ(CSettingsObject::ReadFromXMLFile("/nonexistent-folder/tdc.xml", errorText), nullptr);
   // The load traced and cleared the error before it could be reported here.
   EXPECT_EQ(errorText, "");
-
   // Another root name still loads, after saying so.
-  auto other = ReadXmlMap("<settings><a>1</a></settings>");
-  ASSERT_TRUE(other);
+  EXPECT_TRUE(ReadXmlMap("<settings><a>1</a></settings>"));
   EXPECT_TRUE(capture.AssertionContains("rootName == SETTINGS_NODE_ROOT_ID"));
 }
 
 TEST(XMLReadTest, HostileDocumentsAreRefused) {
   LogCapture capture;
-  auto nested = [](int depth_I) {
+  const auto nested = [](int depth_I) {
     std::string xml = "<root>";
     for (int i = 0; i < depth_I; ++i) xml += "<a>";
     xml += "x";
@@ -136,20 +119,15 @@ TEST(XMLReadTest, HostileDocumentsAreRefused) {
     for (int k = 0; k < 10; ++k) laughs += "&l" + std::to_string(i - 1) + ";";
     laughs += "\">";
   }
-  laughs += "]><root><a>&l29;</a></root>";
   const auto start = std::chrono::steady_clock::now();
-  auto map = ReadXmlMap(laughs);
+  auto map = ReadXmlMap(laughs + "]><root><a>&l29;</a></root>");
   EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(5));
-  if (map) {
-    EXPECT_LT(map->StringForKeyWithDefault("a", "").size(), 1000u);
-  }
-
+  EXPECT_LT(map ? map->StringForKeyWithDefault("a", "").size() : 0u, 1000u);
   auto external = ReadXmlMap(
       "<?xml version=\"1.0\"?><!DOCTYPE root [<!ENTITY e SYSTEM \"file:///etc/passwd\">]>"
       "<root><a>&e;</a></root>");
-  if (external) {
-    EXPECT_EQ(external->StringForKeyWithDefault("a", "").find("root:"), std::string::npos);
-  }
+  EXPECT_EQ(external ? external->StringForKeyWithDefault("a", "").find("root:") : std::string::npos,
+            std::string::npos);
 }
 
 TEST(XMLWriteTest, DocumentsAreIndentedAndNamedAsAsked) {
@@ -173,13 +151,25 @@ TEST(XMLWriteTest, DocumentsAreIndentedAndNamedAsAsked) {
             "<K type=\"kestring\"><![CDATA[x&rsqbracket;y]]></K>\n");
 }
 
-TEST(XMLWriteTest, EveryClassRoundTripsAndTheKnownLossesStay) {
-  auto tree = EveryClassTree();
-  auto back = ReadXmlMap(tree->GetXMLString(""));
-  ASSERT_TRUE(back);
-  EXPECT_TRUE(back->IsEqualTo(tree)) << back->GetTraceString();
-  EXPECT_EQ(back->ObjectForKey<CSettingsKEString>("Secret")->GetValue(), "a]]>b]c");
+TEST(XMLWriteTest, EveryClassRoundTripsThroughBufferFileAndPropertyList) {
+  auto tree = SettingsTestTrees::EveryClass();
+  const std::string path = (fs::temp_directory_path() / "settings-file.xml").string();
+  ASSERT_TRUE(tree->SaveXMLToFile(path));
+  std::string errorText;
+  const std::pair<const char*, std::shared_ptr<CSettingsObject>> readBack[] = {
+      {"buffer", CSettingsObject::ReadFromXMLBuffer(tree->GetXMLString(""))},
+      {"file", CSettingsMap::ReadFromXMLFile(path, errorText)},
+      {"plist", CSettingsObject::ReadFromXMLBuffer(tree->GetPListString(true))}};
+  for (const auto& [form, back] : readBack) {
+    ASSERT_TRUE(back) << form;
+    EXPECT_TRUE(back->IsEqualTo(tree)) << form << ": " << back->GetTraceString();
+  }
+  EXPECT_EQ(errorText, "");
+  EXPECT_FALSE(CSettingsArray::ReadFromXMLFile(path, errorText));
+  fs::remove(path);
+  EXPECT_FALSE(CSettingsMap::New()->SaveXMLToFile("/nonexistent-folder/x.xml"));
 
+  // The known losses stay.
   auto lossy = CSettingsMap::New();
   lossy->SetKeyAndString("padded", "  text  ");
   lossy->SetKeyAndString("blank", "   ");
@@ -199,31 +189,17 @@ TEST(XMLWriteTest, InvalidKeysThrowFromTheStringAndFailTheSave) {
   map->SetKeyAndObject("inner", CSettingsMap::New());
   map->ObjectForKey<CSettingsMap>("inner")->SetKeyAndInteger("1bad", 1);
   EXPECT_THROW(map->GetXMLString(""), std::invalid_argument);
-
-  const std::string path = (std::filesystem::temp_directory_path() / "settings-bad.xml").string();
-  std::remove(path.c_str());
+  const std::string path = (fs::temp_directory_path() / "settings-bad.xml").string();
+  fs::remove(path);
   EXPECT_FALSE(map->SaveXMLToFile(path));
   EXPECT_TRUE(capture.LogContains(
       "[E] CSettingsObject::SaveXMLToFile: XmlUtils::CreateNode passed invalid node name: "
       "\"1bad\""));
-  EXPECT_FALSE(std::filesystem::exists(path));
+  EXPECT_FALSE(fs::exists(path));
 }
 
-TEST(XMLFileTest, SavedFileReadsBack) {
-  const std::string path = (std::filesystem::temp_directory_path() / "settings-file.xml").string();
-  auto tree = EveryClassTree();
-  ASSERT_TRUE(tree->SaveXMLToFile(path));
-  std::string errorText;
-  auto back = CSettingsMap::ReadFromXMLFile(path, errorText);
-  ASSERT_TRUE(back);
-  EXPECT_TRUE(back->IsEqualTo(tree));
-  EXPECT_EQ(errorText, "");
-  EXPECT_FALSE(CSettingsArray::ReadFromXMLFile(path, errorText));
-  std::remove(path.c_str());
-  EXPECT_FALSE(CSettingsMap::New()->SaveXMLToFile("/nonexistent-folder/x.xml"));
-}
-
-TEST(PListWriteTest, PropertyListUsesItsOwnElements) {
+TEST(PListWriteTest, PropertyListUsesItsOwnElementsAndNullHasNone) {
+  LogCapture capture;
   auto map = CSettingsMap::New();
   map->SetKeyAndBool("b", true);
   map->SetKeyAndInteger("i", 3);
@@ -232,6 +208,7 @@ TEST(PListWriteTest, PropertyListUsesItsOwnElements) {
   map->SetKeyAndKEString("k", "p]q");
   map->SetKeyAndObject("d", CSettingsBytes::New({1, 2, 3}));
   map->SetKeyAndObject("a", CSettingsArray::New());
+  map->SetKeyAndObject("n", nullptr);  // leaves its key alone
   EXPECT_EQ(map->GetPListString(false),
             "<plist version=\"1.0\">\n"
             "  <dict>\n"
@@ -245,58 +222,13 @@ TEST(PListWriteTest, PropertyListUsesItsOwnElements) {
             "    <integer>3</integer>\n"
             "    <key>k</key>\n"
             "    <string kestring=\"1\"><![CDATA[p&rsqbracket;q]]></string>\n"
+            "    <key>n</key>\n"
             "    <key>r</key>\n"
             "    <real>0.500000</real>\n"
             "    <key>s</key>\n"
             "    <string>x&amp;y</string>\n"
             "  </dict>\n"
             "</plist>\n");
+  EXPECT_TRUE(capture.AssertionContains("Unknown type"));
   EXPECT_EQ(map->GetPListString(true).rfind("<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n", 0), 0u);
 }
-
-TEST(PListWriteTest, NullHasNoFormAndLeavesItsKeyAlone) {
-  LogCapture capture;
-  auto map = CSettingsMap::New();
-  map->SetKeyAndObject("n", nullptr);
-  const std::string plist = map->GetPListString(false);
-  EXPECT_NE(plist.find("<key>n</key>\n  </dict>"), std::string::npos) << plist;
-  EXPECT_TRUE(capture.AssertionContains("Unknown type"));
-}
-
-TEST(PListReadTest, EveryClassRoundTrips) {
-  auto tree = EveryClassTree();
-  auto back =
-      CSettingsMap::CastToMap(CSettingsObject::ReadFromXMLBuffer(tree->GetPListString(true)), true);
-  ASSERT_TRUE(back);
-  EXPECT_TRUE(back->IsEqualTo(tree)) << back->GetTraceString();
-  EXPECT_EQ(back->TypeNameForKeyOrEmpty("Secret"), "kestring");
-}
-
-TEST(PListReadTest, ForeignAndDamagedListsReadWhatTheyCan) {
-  LogCapture capture;
-  auto map = ReadXmlMap(
-      "<plist version=\"1.1\"><dict>"
-      "<key>when</key><date>2024-01-02T03:04:05Z</date>"
-      "<key>flag</key><true>ignored</true>"
-      "<key>late</key><mystery/><integer>7</integer>"
-      "<orphan>1</orphan>"
-      "<key> spaced </key><string> s </string>"
-      "</dict></plist>");
-  ASSERT_TRUE(map);
-  EXPECT_TRUE(capture.AssertionContains("version == \"1.0\""));
-  EXPECT_EQ(map->StringForKeyWithDefault("when", ""), "2024-01-02T03:04:05Z");
-  EXPECT_TRUE(capture.LogContains("[I] found date data. Converting to string"));
-  EXPECT_TRUE(map->BoolForKeyWithDefault("flag", false));
-  // The unknown element keeps the key pending for the next value.
-  EXPECT_EQ(map->IntegerForKeyWithDefault("late", int64_t{0}), 7);
-  EXPECT_TRUE(capture.AssertionContains("Bad formed Plist data"));
-  EXPECT_TRUE(capture.LogContains("[E] Found unknown tag mystery"));
-  EXPECT_TRUE(capture.LogContains("[I] CSettingsMap::ReadFromPListNode got node with name orphan"));
-  EXPECT_EQ(map->StringForKeyWithDefault("spaced", ""), "s");
-  EXPECT_EQ(map->ObjectCount(), 4u);
-
-  EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer("<plist version=\"1.0\"/>"), nullptr);
-  EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer("<plist version=\"1.0\"><set/></plist>"), nullptr);
-}
-
-}  // namespace
