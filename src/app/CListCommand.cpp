@@ -1,5 +1,7 @@
 #include "app/CListCommand.h"
 
+#include <algorithm>
+
 #include <sys/stat.h>
 
 #include "app/CCommandLine.h"
@@ -136,8 +138,14 @@ std::vector<CListCommand::SProductLine> CListCommand::Describe(const CDeviceList
   };
 
   std::vector<SProductLine> products;
+  std::vector<CDevice::InterfacePtr> pensListed;
   for (size_t i = 0; i < list_I.GetDeviceCount(); ++i) {
     const std::shared_ptr<CDevice> device = list_I.GetDevice(i);
+    // Discovery keeps a second entry for a pen in its loader, holding the
+    // same interface; it is one product to the user.
+    const CDevice::InterfacePtr pen = device->GetPenInterface();
+    if (pen && std::find(pensListed.begin(), pensListed.end(), pen) != pensListed.end()) continue;
+    if (pen) pensListed.push_back(pen);
     SProductLine product;
     product.name = device->GetDeviceName();
     product.loaderMode = device->GetIsFlashLoader();

@@ -52,7 +52,17 @@ expect 4 "nobody confirms" --lab --lab-state "$STATE/n" -p ""
 SAYS="  pen controller of Lab Wireless Tablet: failed:" \
 expect 1 "a board that fails every read" --lab --headless --lab-state "$STATE/r" --yes --lab-fault fail-read@1000 -p ""
 expect 1 "cut off mid-update" --lab classic-tablet --lab-state "$STATE/v" --yes --lab-fault vanish@200 -p ""
+# A pen left in its loader is one product, with the touch board it has.
+listing="$("$PROGRAM" --list --lab classic-tablet --lab-state "$STATE/v")"
+if ! grep -q "^1 product found" <<<"$listing" || ! grep -q "in loader mode" <<<"$listing"; then
+  echo "FAIL: a pen left in its loader lists as one product"; echo "$listing"
+  failures=$((failures + 1))
+fi
+SAYS="  pen controller of Lab Classic Tablet: updated from version 0.03 to 1.30" \
 expect 0 "the next run finishes the cut-off update" --lab classic-tablet --lab-state "$STATE/v" --yes -p ""
+if ! "$PROGRAM" --list --lab classic-tablet --lab-state "$STATE/v" | grep -qE "^  pen +HID .* 1\.30 "; then
+  echo "FAIL: --list shows the version the update brought"; failures=$((failures + 1))
+fi
 SAYS="No attached board has the interface path 1:2:3:4:5; the pen controller found is updated instead." \
 expect 0 "a path that matches nothing is said once" --lab --lab-state "$STATE/p" --yes -p "1:2:3:4:5"
 SAYS="The device configuration /nonexistent/fw_loader.ini could not be read, so no product is known." \

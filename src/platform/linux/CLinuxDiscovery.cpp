@@ -94,7 +94,11 @@ void CLinuxDiscovery::ProcessDevicePaths(EINTERFACE_TYPE interfaceType_I,
     DevicePtr device = GetNewSupportedDevice(Low16(info.vendorId), Low16(info.productId));
     if (!device || !device->IsValid()) continue;
 
-    if (device->GetIsFlashLoader() && interface->GetInterfaceType() != EI2C_INTERFACE) {
+    // Every USB device is also tried as a vendor-class interface: a loader
+    // counts only on the transport its configuration names, or a HID loader
+    // would come a second time from the USB pass, as a product of its own.
+    if (device->GetIsFlashLoader() && interface->GetInterfaceType() != EI2C_INTERFACE &&
+        interface->GetInterfaceType() == device->GetPenInterfaceType()) {
       interface->SetIsFlashLoader(true);
       mLoaderInterfaces.push_back(interface);
     }
