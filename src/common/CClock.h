@@ -10,6 +10,11 @@
 //   seconds of this clock's time have passed. Used to emulate events that
 //   arrive from another thread (a device re-attaching, for example).
 //   Tasks run one at a time, in due order; a task may call Sleep.
+// - BeginWork() and EndWork() bracket an event that another thread has yet
+//   to take in (an attach queued for the device thread). A virtual clock
+//   lets such work finish before it moves time on, for a short real while
+//   at most, so that a wait of 90 passes cannot run out before an event
+//   that is already on its way. The real clock ignores them.
 
 #include <functional>
 #include <memory>
@@ -20,6 +25,8 @@ class CClock {
   virtual void Sleep(double seconds_I) = 0;
   virtual double Now() const = 0;
   virtual void Schedule(double delay_I, std::function<void()> task_I) = 0;
+  virtual void BeginWork() {}
+  virtual void EndWork() {}
 
   // The process-wide clock. Install one before threads start.
   static std::shared_ptr<CClock> Get();

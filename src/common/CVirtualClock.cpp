@@ -1,6 +1,12 @@
 #include "common/CVirtualClock.h"
 
 #include <algorithm>
+#include <chrono>
+
+namespace {
+// How long in real time a Sleep waits for announced work to be taken in.
+constexpr std::chrono::milliseconds kWorkWait{500};
+}  // namespace
 
 CVirtualClock::CVirtualClock() : mWorker([this] { RunTasks(); }) {}
 
@@ -25,9 +31,23 @@ void CVirtualClock::Sleep(double seconds_I) {
   if (std::this_thread::get_id() == mWorker.get_id()) return;
   mWake.notify_all();
   mIdle.wait(lock, [this] { return mStopping || (!mRunning && !HasDueTask()); });
+  mIdle.wait_for(lock, kWorkWait, [this] { return mStopping || mWorkInFlight == 0; });
   lock.unlock();
   // Give threads woken by the tasks a chance to run before the next poll.
   std::this_thread::yield();
+}
+
+void CVirtualClock::BeginWork() {
+  std::lock_guard<std::mutex> guard(mLock);
+  ++mWorkInFlight;
+}
+
+void CVirtualClock::EndWork() {
+  {
+    std::lock_guard<std::mutex> guard(mLock);
+    if (mWorkInFlight > 0) --mWorkInFlight;
+  }
+  mIdle.notify_all();
 }
 
 double CVirtualClock::Now() const {

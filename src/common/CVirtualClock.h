@@ -5,6 +5,10 @@
 // task has run, so events from "another thread" arrive deterministically
 // between two polls of the sleeper.
 //
+// Work announced by BeginWork holds a Sleep for up to kWorkWaitSeconds of
+// real time; the bound keeps a sleeper that the work itself waits for (a
+// state shown on the main thread) from waiting for ever.
+//
 // Every Sleep moves the clock by its own duration. A task must not block on
 // a thread that is sleeping on this clock, or both wait for ever.
 
@@ -25,6 +29,8 @@ class CVirtualClock : public CClock {
   void Sleep(double seconds_I) override;
   double Now() const override;
   void Schedule(double delay_I, std::function<void()> task_I) override;
+  void BeginWork() override;
+  void EndWork() override;
 
   // Moves time forward as a Sleep from a bystander would.
   void Advance(double seconds_I) { Sleep(seconds_I); }
@@ -42,6 +48,7 @@ class CVirtualClock : public CClock {
   double mNow = 0.0;
   double mTotalSlept = 0.0;
   bool mRunning = false;  // a task is being run right now
+  int mWorkInFlight = 0;
   bool mStopping = false;
   std::thread mWorker;
 };

@@ -3,10 +3,19 @@
 #include <algorithm>
 #include <cstdio>
 
+#include "common/CClock.h"
+
 CLabDeviceRegistry::CLabDeviceRegistry(std::shared_ptr<CLabBus> bus_I) : mBus(std::move(bus_I)) {}
 
 CLabDeviceRegistry::~CLabDeviceRegistry() {
   if (mListener != 0) mBus->RemoveListener(mListener);
+  DropEvents();
+}
+
+void CLabDeviceRegistry::DropEvents() {
+  std::lock_guard<std::mutex> guard(mLock);
+  for (const SEvent& event : mEvents) event.clock->EndWork();
+  mEvents.clear();
 }
 
 std::string CLabDeviceRegistry::NodePathOf(const DeviceInfo& info_I) {
@@ -56,7 +65,9 @@ bool CLabDeviceRegistry::OpenWatch() {
     if (interface_I.link != ELabLink::eHid) return;
     {
       std::lock_guard<std::mutex> guard(mLock);
-      mEvents.push_back({interface_I.info, attached_I});
+      // Until the watcher has taken it in, a virtual clock holds still.
+      mEvents.push_back({interface_I.info, attached_I, CClock::Get()});
+      mEvents.back().clock->BeginWork();
     }
     mWake.notify_all();
   });
@@ -80,6 +91,7 @@ void CLabDeviceRegistry::RunWatch(CRegistryWatcher& watcher_I) {
     } else {
       watcher_I.DeviceRemoved(event.info);
     }
+    event.clock->EndWork();
     lock.lock();
   }
 }
@@ -90,4 +102,6 @@ void CLabDeviceRegistry::StopWatching() {
     mStopRequested = true;
   }
   mWake.notify_all();
+  // Nobody takes them in any more.
+  DropEvents();
 }

@@ -4,13 +4,16 @@
 // HID interface has one usage pair, so every entry and event is that pair.
 // Node paths read "lab:<location in hex>:<usage page>:<usage>"; the lab's
 // HID node opens by DeviceInfo and needs no more. Vendor-class interfaces
-// appear as USB devices only, never in the watch, as on Linux.
+// appear as USB devices only, never in the watch, as on Linux. An event is
+// announced to the clock as work in flight until the watcher has taken it
+// in, so that a virtual clock does not run a wait out before it arrives.
 
 #include <condition_variable>
 #include <deque>
 #include <memory>
 #include <mutex>
 
+#include "common/CClock.h"
 #include "lab/CLabBus.h"
 #include "seams/CDeviceRegistry.h"
 
@@ -30,9 +33,12 @@ class CLabDeviceRegistry : public CDeviceRegistry {
   static std::string NodePathOf(const DeviceInfo& info_I);
 
  private:
+  void DropEvents();
+
   struct SEvent {
     DeviceInfo info;
     bool added;
+    std::shared_ptr<CClock> clock;  // holds still until the event is taken in
   };
 
   std::shared_ptr<CLabBus> mBus;
