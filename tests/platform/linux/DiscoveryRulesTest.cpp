@@ -239,3 +239,33 @@ TEST(DiscoverySearch, CriteriaMatchTheFieldsTheyGiveAndResultsAreKeptOnce) {
   ASSERT_EQ(usb.size(), 1u);
   EXPECT_EQ(usb[0], (DeviceInfo{0x7A5D, 0x100, 0x01100000, 0, 0}));
 }
+
+TEST_F(DiscoveryRules, TheUsbPassKeepsTheGuardAndTakesLoadersOnlyOnTheirOwnTransport) {
+  // The guarded product behind another hub, on a root port, and behind its own.
+  mRegistry->usb = {SUsbEntry{0x7A5D, 0xFA, BehindHub(1), 0, 0x7A5D, 0xF8},
+                    SUsbEntry{0x7A5D, 0xFA, 0x01200000, 0, 0, 0},
+                    SUsbEntry{0x7A5D, 0xFA, 0x01310000, 0, 0x7A5D, 0xF9}};
+  const std::vector<DeviceInfo> found = IOUtils::FindUsbDevices(*mRegistry, 0x7A5D);
+  ASSERT_EQ(found.size(), 1u);
+  EXPECT_EQ(found[0].locationId, 0x01310000u);
+
+  // A HID loader is a USB device too; tried as a vendor-class interface it
+  // must not come back as a second loader product.
+  mRegistry->usb = {SUsbEntry{0x7A5D, 0x302, BehindHub(1), 0, 0, 0},
+                    SUsbEntry{0x7A5D, 0x311, BehindHub(2), 0, 0, 0}};
+  mRegistry->AddHid({0x7A5D, 0x302, BehindHub(1), 1, 0xFF00});
+  const std::vector<DevicePtr> devices = Scan(R"([{"name": "Tablet",
+      "penBoard": {"pid": "301", "usageId": "1", "usagePg": "FF00", "topology": 2},
+      "touchBoard": {"pid": "311", "interface": "BULK", "topology": 2},
+      "loaderBoard": {"pid": "302", "usageId": "1", "usagePg": "FF00", "topology": 2}}])");
+  ASSERT_FALSE(devices.empty());
+  ASSERT_NE(devices[0]->GetTouchInterface(), nullptr);
+  for (const DevicePtr& device : devices) {
+    ASSERT_NE(device->GetPenInterface(), nullptr);
+    EXPECT_EQ(device->GetPenInterface()->GetInterfaceType(), EHID_INTERFACE);
+    if (device->GetTouchInterface()) {
+      EXPECT_EQ(device->GetTouchInterface()->GetPath(), "31325:785:17956864:0:0")
+          << "the loader taken for a touch board";
+    }
+  }
+}
