@@ -17,17 +17,28 @@ struct SOptionRule {
 
 // Every option the program knows, and whether a value follows it.
 constexpr SOptionRule kOptions[] = {
-    {"--help", EValue::eNone},          {"-h", EValue::eNone},
-    {"--version", EValue::eNone},       {"--verbose", EValue::eNone},
-    {"-v", EValue::eNone},              {"--log", EValue::eRequired},
-    {"--inspect", EValue::eRequired},   {"--interface", EValue::eRequired},
-    {"--output-binary", EValue::eRequired}, {"--json", EValue::eNone},
-    {"--list", EValue::eNone},          {"--headless", EValue::eNone},
-    {"--yes", EValue::eNone},           {"--lab-fast", EValue::eNone},
-    {"--lab-fault", EValue::eRequired}, {"--lab-state", EValue::eRequired},
-    {"--lab", EValue::eOptional},       {"-p", EValue::eRequired},
-    {"-t", EValue::eRequired},          {"-b", EValue::eRequired},
-    {"-s", EValue::eRequired},          {"-f", EValue::eRequired},
+    {"--help", EValue::eNone},
+    {"-h", EValue::eNone},
+    {"--version", EValue::eNone},
+    {"--verbose", EValue::eNone},
+    {"-v", EValue::eNone},
+    {"--log", EValue::eRequired},
+    {"--inspect", EValue::eRequired},
+    {"--interface", EValue::eRequired},
+    {"--output-binary", EValue::eRequired},
+    {"--json", EValue::eNone},
+    {"--list", EValue::eNone},
+    {"--headless", EValue::eNone},
+    {"--yes", EValue::eNone},
+    {"--lab-fast", EValue::eNone},
+    {"--lab-fault", EValue::eRequired},
+    {"--lab-state", EValue::eRequired},
+    {"--lab", EValue::eOptional},
+    {"-p", EValue::eRequired},
+    {"-t", EValue::eRequired},
+    {"-b", EValue::eRequired},
+    {"-s", EValue::eRequired},
+    {"-f", EValue::eRequired},
 };
 
 const SOptionRule* FindRule(const std::string& name_I) {
@@ -95,11 +106,12 @@ bool CCommandLine::Parse(const std::vector<std::string>& arguments_I) {
     if (!valueGiven && rule->value == EValue::eRequired) {
       // A board value never starts with "-": that is the next option.
       const bool next = i + 1 < arguments_I.size();
-      if (!next || (IsBoardOption(name) && !arguments_I[i + 1].empty() &&
-                    arguments_I[i + 1][0] == '-')) {
+      if (!next ||
+          (IsBoardOption(name) && !arguments_I[i + 1].empty() && arguments_I[i + 1][0] == '-')) {
         if (IsBoardOption(name)) {
-          return Fail(name + " needs a value: an interface path from --list, or \"\" for the "
-                             "one found");
+          return Fail(name +
+                      " needs a value: an interface path from --list, or \"\" for the "
+                      "one found");
         }
         return Fail(name + " needs a value");
       }

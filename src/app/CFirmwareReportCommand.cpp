@@ -9,8 +9,6 @@
 #include "app/CCommandLine.h"
 #include "app/JsonString.h"
 #include "app/TavVersion.h"
-#include "firmware/FirmwareFileCheck.h"
-#include "update/CApplicationDelegate.h"
 #include "common/StringUtilities.h"
 #include "common/TavAssert.h"
 #include "common/TavLog.h"
@@ -19,6 +17,8 @@
 #include "firmware/CSRec.h"
 #include "firmware/CScalarBinary.h"
 #include "firmware/CScalarRTDISP.h"
+#include "firmware/FirmwareFileCheck.h"
+#include "update/CApplicationDelegate.h"
 
 namespace {
 
@@ -165,7 +165,8 @@ CFirmwareReportCommand::CFirmwareReportCommand(const CCommandLine& commandLine_I
       mJson(commandLine_I.GetInspectJson()),
       mOutputBinary(commandLine_I.GetInspectOutputBinary()) {}
 
-bool CFirmwareReportCommand::ParseInterface(const std::string& name_I, EINTERFACE_TYPE& interface_O) {
+bool CFirmwareReportCommand::ParseInterface(const std::string& name_I,
+                                            EINTERFACE_TYPE& interface_O) {
   const std::string name = StringUtilities::ToLower_Copy(name_I);
   if (name == "hid")
     interface_O = EHID_INTERFACE;
@@ -182,8 +183,8 @@ bool CFirmwareReportCommand::ParseInterface(const std::string& name_I, EINTERFAC
 
 int CFirmwareReportCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
   if (!mInterfaceName.empty() && !ParseInterface(mInterfaceName, mInterface)) {
-    std::fprintf(err_IO, "%s: unknown interface %s: use hid, bulk, i2c or ftdi\n",
-                 TAV_PROGRAM_NAME, mInterfaceName.c_str());
+    std::fprintf(err_IO, "%s: unknown interface %s: use hid, bulk, i2c or ftdi\n", TAV_PROGRAM_NAME,
+                 mInterfaceName.c_str());
     return ERUN_USAGE;
   }
   CSRec source;

@@ -1,12 +1,12 @@
 #include "app/CListCommand.h"
 
-#include <algorithm>
-
 #include <sys/stat.h>
 
+#include <algorithm>
+
 #include "app/CCommandLine.h"
-#include "app/JsonString.h"
 #include "app/CRunSeams.h"
+#include "app/JsonString.h"
 #include "common/LinuxPaths.h"
 #include "devices/IOUtils.h"
 #include "flash/CFLDeviceInterface.h"

@@ -1,10 +1,9 @@
 #include "app/CLogOutputs.h"
 
-#include <memory>
-
 #include <sys/time.h>
 
 #include <ctime>
+#include <memory>
 
 #include "common/TavLog.h"
 
@@ -12,9 +11,9 @@ namespace {
 
 // "2026-11-23 20:59:01.123 ": local time to the millisecond.
 std::string TimeStamp() {
-  timeval now {};
+  timeval now{};
   gettimeofday(&now, nullptr);
-  tm local {};
+  tm local{};
   localtime_r(&now.tv_sec, &local);
   char text[40];
   const size_t length = std::strftime(text, sizeof text, "%Y-%m-%d %H:%M:%S", &local);

@@ -22,9 +22,8 @@ int CUpdaterRun::Run(SRunSeams seams_I, SRunOptions options_I) {
   CTerminalWindowController window;
   window.SetAssumeYes(options_I.assumeYes);
   // Dispatches to the main thread run inside the window's loop.
-  mainLoop.SetWakeHook([&window, &mainLoop] {
-    window.PostToMainLoop([&mainLoop] { mainLoop.RunPending(); });
-  });
+  mainLoop.SetWakeHook(
+      [&window, &mainLoop] { window.PostToMainLoop([&mainLoop] { mainLoop.RunPending(); }); });
 
   app.window = &window;
   app.desktop = seams_I.desktop;

@@ -31,7 +31,8 @@ int main(int argc, char** argv) {
   }
   if (commandLine.GetLabListRequested() && !commandLine.GetList()) {
     if (commandLine.HasBoardOption()) {
-      std::fprintf(stderr, "%s: --lab list names the lab's products; give a product name to update\n",
+      std::fprintf(stderr,
+                   "%s: --lab list names the lab's products; give a product name to update\n",
                    TAV_PROGRAM_NAME);
       return ERUN_USAGE;
     }

@@ -1,6 +1,5 @@
 #include "devices/CDeviceList.h"
 
-
 #include "common/StringUtilities.h"
 #include "common/TavLog.h"
 #include "flash/CFLDeviceInterface.h"

@@ -9,6 +9,7 @@
 
 #include <cstdint>
 #include <functional>
+#include <mutex>
 #include <string>
 #include <utility>
 #include <vector>
@@ -18,8 +19,6 @@
 #include "lab/LabTypes.h"
 #include "seams/CHidNode.h"
 #include "seams/CUsbControl.h"
-
-#include <mutex>
 
 class CLabBus;
 

@@ -1,8 +1,8 @@
 #include "lab/CLabLoader.h"
 
-#include "lab/LabRelease.h"
-
 #include <algorithm>
+
+#include "lab/LabRelease.h"
 
 namespace {
 

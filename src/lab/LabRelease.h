@@ -15,8 +15,8 @@ constexpr uint8_t kLabReleaseMarker[] = {'T', 'A', 'V', 'R', 'E', 'L'};
 
 inline std::optional<uint16_t> FindLabRelease(const uint8_t* data_I, size_t size_I) {
   const uint8_t* end = data_I + size_I;
-  const uint8_t* at = std::search(data_I, end, std::begin(kLabReleaseMarker),
-                                  std::end(kLabReleaseMarker));
+  const uint8_t* at =
+      std::search(data_I, end, std::begin(kLabReleaseMarker), std::end(kLabReleaseMarker));
   if (end - at < static_cast<std::ptrdiff_t>(sizeof kLabReleaseMarker + 2)) return std::nullopt;
   at += sizeof kLabReleaseMarker;
   return static_cast<uint16_t>(at[0] | (at[1] << 8));

@@ -41,7 +41,7 @@ struct SUsbEntry {
   uint32_t productId = 0;
   uint32_t locationId = 0;
   uint16_t version = 0;
-  uint32_t parentUsbVendorId = 0;   // as for SHidEntry
+  uint32_t parentUsbVendorId = 0;  // as for SHidEntry
   uint32_t parentUsbProductId = 0;
 };
 

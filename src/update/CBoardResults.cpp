@@ -1,5 +1,12 @@
 #include "update/CBoardResults.h"
 
+const char* CBoardResults::BoardName(const std::string& kind_I) {
+  if (kind_I == "pen") return "pen controller";
+  if (kind_I == "touch") return "touch controller";
+  if (kind_I == "bluetooth") return "Bluetooth module";
+  return "display scalar";
+}
+
 void CBoardResults::Reset(const std::vector<std::pair<std::string, std::string>>& entries_I) {
   std::lock_guard<std::mutex> guard(mLock);
   mResults.clear();

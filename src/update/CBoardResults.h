@@ -39,6 +39,10 @@ struct SBoardResult {
 
 class CBoardResults {
  public:
+  // The board of a kind as the user reads it, a key of the catalogs:
+  // "pen controller", "touch controller", "Bluetooth module", "display scalar".
+  static const char* BoardName(const std::string& kind_I);
+
   // One entry per update asked for, none reached yet.
   void Reset(const std::vector<std::pair<std::string, std::string>>& entries_I);
   // The entry at `index_I` is under way: later notes are about it.

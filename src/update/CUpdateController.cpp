@@ -38,9 +38,7 @@ void CUpdateController::InterfaceError(const std::string& text_I) {
 
 void CUpdateController::InterfaceProgress(unsigned int percent_I) { CallbackProgress(percent_I); }
 
-void CUpdateController::UnregisterCallback(CUpdateNotifier* /*notifier_I*/) {
-  mNotifier = nullptr;
-}
+void CUpdateController::UnregisterCallback(CUpdateNotifier* /*notifier_I*/) { mNotifier = nullptr; }
 
 CUpdateController::DevicePtr CUpdateController::GetSelectedDevice() const {
   std::lock_guard<std::mutex> guard(mSelectedLock);

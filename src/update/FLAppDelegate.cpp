@@ -3,7 +3,6 @@
 #include <unistd.h>
 
 #include <cmath>
-
 #include <stdexcept>
 
 #include "common/CClock.h"
@@ -41,13 +40,6 @@ const char* OutcomeText(ERunOutcome outcome_I) {
   return "Result: the update failed.";
 }
 
-const char* BoardName(const std::string& kind_I) {
-  if (kind_I == "pen") return "pen controller";
-  if (kind_I == "touch") return "touch controller";
-  if (kind_I == "bluetooth") return "Bluetooth module";
-  return "display scalar";
-}
-
 // A release number as the device gives it: 0x0120 is "1.20".
 std::string VersionText(uint32_t version_I) {
   return StringUtilities::Format("%x.%02x", (version_I >> 8) & 0xFF, version_I & 0xFF);
@@ -79,7 +71,9 @@ void FLAppDelegate::applicationDidFinishLaunching() {
   CheckLaunchSender();
 
   if (mSetup.desktop && !mSetup.desktop->RequestHidAccess()) {
-    SAlert alert{EALERT_STYLE_CRITICAL, T("200:250"), T("200:255") + "\n\n" + T("200:257"),
+    SAlert alert{EALERT_STYLE_CRITICAL,
+                 T("200:250"),
+                 T("200:255") + "\n\n" + T("200:257"),
                  {T("Try Again")}};
     if (mSetup.window != nullptr) mSetup.window->ShowAlert(alert);
     // The button does not try again.
@@ -181,10 +175,11 @@ bool FLAppDelegate::confirmProgram() {
   if (mSetup.window == nullptr) return false;
   // The scalar over the bridge has a confirmation of its own; until that
   // path exists, it is asked the same way.
-  SAlert question{EALERT_STYLE_WARNING, T("Tavik Firmware Update Utility"),
+  SAlert question{EALERT_STYLE_WARNING,
+                  T("Tavik Firmware Update Utility"),
                   T("You are about to update the firmware.") + "\n\n" +
-                      T("While programming do not disconnect or power down your device.") +
-                      "\n\n" + T("Do you want to continue?"),
+                      T("While programming do not disconnect or power down your device.") + "\n\n" +
+                      T("Do you want to continue?"),
                   {T("No"), T("Yes")}};
   return mSetup.window->AskYesNo(question);
 }
@@ -371,7 +366,7 @@ void FLAppDelegate::updatesFinished() {
 void FLAppDelegate::boardStarting(const SBoardResult& board_I) {
   if (!mSetup.terminal || !mSetup.printResult) return;
   std::string line = StringUtilities::Format(T("Updating the %s of %s").c_str(),
-                                             T(BoardName(board_I.kind)).c_str(),
+                                             T(CBoardResults::BoardName(board_I.kind)).c_str(),
                                              board_I.product.c_str());
   if (!board_I.path.empty()) line += " (" + board_I.path + ")";
   if (board_I.versionKnown) {
@@ -396,7 +391,7 @@ void FLAppDelegate::PrintBoardResults() {
   if (!reached) return;
   mUpdater->refreshVersionsAfter();
   for (const SBoardResult& result : mUpdater->boardResults().Get()) {
-    std::string board = T(BoardName(result.kind));
+    std::string board = T(CBoardResults::BoardName(result.kind));
     if (!result.product.empty()) {
       board = StringUtilities::Format(T("%s of %s").c_str(), board.c_str(), result.product.c_str());
     }

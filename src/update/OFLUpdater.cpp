@@ -1,11 +1,12 @@
 #include "update/OFLUpdater.h"
 
+#include <sys/stat.h>
+
 #include <cstdlib>
 #include <fstream>
 #include <mutex>
 #include <sstream>
 #include <stdexcept>
-#include <sys/stat.h>
 
 #include "common/CClock.h"
 #include "common/OSUtils.h"
@@ -311,7 +312,7 @@ void OFLUpdater::setUpdateType(const std::string& word_I) {
   } else if (StringUtilities::IEquals(word_I, "Scalar")) {
     const std::shared_ptr<CDevice> device = mUpdater->GetSelectedDevice();
     type = device && device->GetScalarInterfaceType() == EHID_INTERFACE ? EUPDATE_SCALAR_HID
-                                                                         : EUPDATE_SCALAR_FTDI;
+                                                                        : EUPDATE_SCALAR_FTDI;
   }
   mUpdater->SetUpdateType(type);
 }
@@ -399,15 +400,6 @@ void OFLUpdater::runThreadProgram() {
 
 namespace {
 
-// The board of `kind_I` as the user reads it, and the device's interface
-// for it.
-const char* BoardName(const std::string& kind_I) {
-  if (kind_I == "pen") return "pen controller";
-  if (kind_I == "touch") return "touch controller";
-  if (kind_I == "bluetooth") return "Bluetooth module";
-  return "display scalar";
-}
-
 std::string UpdateNameOf(const CDevice& device_I, const std::string& kind_I) {
   if (kind_I == "pen") return device_I.GetPenUpdate();
   if (kind_I == "touch") return device_I.GetTouchUpdate();
@@ -418,6 +410,7 @@ std::string UpdateNameOf(const CDevice& device_I, const std::string& kind_I) {
 }  // namespace
 
 bool OFLUpdater::prepareEntry(const std::string& kind_I, const std::string& value_I) {
+  const std::string boardWord = TTCLocalizedNSString(CBoardResults::BoardName(kind_I));
   if (!value_I.empty()) {
     bool selected = false;
     for (int attempt = 0; attempt < kSelectTries && !selected; ++attempt) {
@@ -427,75 +420,64 @@ bool OFLUpdater::prepareEntry(const std::string& kind_I, const std::string& valu
     // The selection stays as it was; the board found is updated instead.
     if (!selected && kind_I != "scalar") {
       notice(StringUtilities::Format(
-          TTCLocalizedNSString("No attached board has the interface path %s; the %s found is "
-                               "updated instead.")
+          TTCLocalizedNSString(
+              "No attached board has the interface path %s; the %s found is updated instead.")
               .c_str(),
-          value_I.c_str(), TTCLocalizedNSString(BoardName(kind_I)).c_str()));
+          value_I.c_str(), boardWord.c_str()));
     }
   }
 
   const std::shared_ptr<CDevice> device = mUpdater->GetSelectedDevice();
+  const std::string product = device ? device->GetDeviceName() : std::string();
   const CDevice::InterfacePtr board = mUpdater->GetActiveInterface();
   if (device) {
     // The interface knows its release only once opened; the registry always.
     uint16_t release = 0;
     const bool known = board && mSetup.registry &&
                        IOUtils::FindReleaseNumber(*mSetup.registry, board->GetPath(), release);
-    mResults.SetBoard(device->GetDeviceName(), board ? board->GetPath() : std::string(), known,
-                      release);
+    mResults.SetBoard(product, board ? board->GetPath() : std::string(), known, release);
   }
 
   if (mUpdater->PenAutoUpdateExists() || mUpdater->TouchAutoUpdateExists() ||
       mUpdater->BluetoothAutoUpdateExists() || mUpdater->ScalarAutoUpdateExists()) {
     const std::string folder = JoinPath(FolderOf(mUpdater->getConfigPath()), "Firmware");
     const std::string name = UpdateNameOf(*device, kind_I);
-    // A product without this board: said as such, then the run ends as it
-    // does for a file that is refused.
+    // A product without this board is said to be one, and the run ends as
+    // it does for a file that is refused.
     if (name.empty()) {
-      const std::string text = StringUtilities::Format(
-          TTCLocalizedNSString("Error: %s has no %s to update.").c_str(),
-          device->GetDeviceName().c_str(), TTCLocalizedNSString(BoardName(kind_I)).c_str());
       mResults.Finish(EBOARD_NOT_FOUND,
                       StringUtilities::Format(TTCLocalizedNSString("%s has no %s").c_str(),
-                                              device->GetDeviceName().c_str(),
-                                              TTCLocalizedNSString(BoardName(kind_I)).c_str()));
-      if (mDelegate != nullptr) {
-        OSUtils::DispatchOnMainThread([this, text] { mDelegate->notifyDialog(text); });
-      }
-      Terminate(ERUN_NO_DEVICE);
-      mStopping = true;
+                                              product.c_str(), boardWord.c_str()));
+      endWithDialog(
+          StringUtilities::Format(TTCLocalizedNSString("Error: %s has no %s to update.").c_str(),
+                                  product.c_str(), boardWord.c_str()),
+          ERUN_NO_DEVICE);
       return false;
     }
     const std::string file = JoinPath(folder, name);
     const EINTERFACE_TYPE loadType =
         kind_I == "scalar" ? device->GetScalarInterfaceType() : EHID_INTERFACE;
     mResults.SetFile(file);
-    const bool keepAway = FirmwareFileCheck::KeepsReaderAway(file, loadType);
-    if (keepAway || !mUpdater->SetAutoUpdateFile(kind_I, folder)) {
+    if (FirmwareFileCheck::KeepsReaderAway(file, loadType) ||
+        !mUpdater->SetAutoUpdateFile(kind_I, folder)) {
       std::string problem = FirmwareFileCheck::Problem(file, loadType);
       if (problem.empty()) problem = "its content is not a valid firmware file";
       TavLog::Error("Firmware file %s refused: %s\n", file.c_str(), problem.c_str());
       mResults.Finish(EBOARD_FILE_REFUSED, file + ": " + problem);
-      if (mDelegate != nullptr) {
-        OSUtils::DispatchOnMainThread([this] {
-          mDelegate->notifyDialog(TTCLocalizedNSString(
-              "Error: The specified file does not appear to be a valid firmware file."));
-        });
-      }
-      Terminate(ERUN_REFUSED_FILE);
-      mStopping = true;
+      endWithDialog(TTCLocalizedNSString(
+                        "Error: The specified file does not appear to be a valid firmware file."),
+                    ERUN_REFUSED_FILE);
       return false;
     }
   }
 
   // Configured, but not attached: nothing to switch, nothing to program.
   if (!device || (!board && mUpdater->GetUpdateType() != EUPDATE_SCALAR_FTDI)) {
-    mResults.Finish(EBOARD_NOT_FOUND,
-                    device ? StringUtilities::Format(
-                                 TTCLocalizedNSString("the %s of %s was not found").c_str(),
-                                 TTCLocalizedNSString(BoardName(kind_I)).c_str(),
-                                 device->GetDeviceName().c_str())
-                           : TTCLocalizedNSString("no supported tablet is connected"));
+    mResults.Finish(
+        EBOARD_NOT_FOUND,
+        device ? StringUtilities::Format(TTCLocalizedNSString("the %s of %s was not found").c_str(),
+                                         boardWord.c_str(), product.c_str())
+               : TTCLocalizedNSString("no supported tablet is connected"));
     return false;
   }
   if (mDelegate != nullptr) {
@@ -503,6 +485,14 @@ bool OFLUpdater::prepareEntry(const std::string& kind_I, const std::string& valu
     OSUtils::DispatchOnMainThread([this, starting] { mDelegate->boardStarting(starting); });
   }
   return true;
+}
+
+void OFLUpdater::endWithDialog(const std::string& text_I, ERunOutcome outcome_I) {
+  if (mDelegate != nullptr) {
+    OSUtils::DispatchOnMainThread([this, text_I] { mDelegate->notifyDialog(text_I); });
+  }
+  Terminate(outcome_I);
+  mStopping = true;
 }
 
 void OFLUpdater::notice(const std::string& text_I) {
@@ -528,10 +518,11 @@ void OFLUpdater::refreshVersionsAfter() {
     // The board is back where it was plugged in, whatever id it shows.
     const CDeviceList list = discovery->GetDeviceList();
     for (unsigned int i = 0; const std::shared_ptr<CDevice> device = list.GetDevice(i); ++i) {
-      const CDevice::InterfacePtr board = result.kind == "pen"         ? device->GetPenInterface()
-                                          : result.kind == "touch"     ? device->GetTouchInterface()
-                                          : result.kind == "bluetooth" ? device->GetBluetoothInterface()
-                                                                       : device->GetScalarInterface();
+      const CDevice::InterfacePtr board = result.kind == "pen"     ? device->GetPenInterface()
+                                          : result.kind == "touch" ? device->GetTouchInterface()
+                                          : result.kind == "bluetooth"
+                                              ? device->GetBluetoothInterface()
+                                              : device->GetScalarInterface();
       DeviceInfo now;
       uint16_t release = 0;
       if (board && IOUtils::DeviceInfoFromPath(board->GetPath(), now) &&
@@ -583,10 +574,8 @@ void OFLUpdater::callBackStatus(ECONTROLLER_STATE state_I) {
 }
 
 void OFLUpdater::callBackProgress(unsigned int percent_I) {
-  const double entries =
-      mDeviceUpdates.empty() ? 1.0 : static_cast<double>(mDeviceUpdates.size());
-  const double overall =
-      (static_cast<double>(percent_I) + 100.0 * mUpdateIndex - 100.0) / entries;
+  const double entries = mDeviceUpdates.empty() ? 1.0 : static_cast<double>(mDeviceUpdates.size());
+  const double overall = (static_cast<double>(percent_I) + 100.0 * mUpdateIndex - 100.0) / entries;
   if (mDelegate == nullptr) return;
   OSUtils::DispatchOnMainThread([this, overall] { mDelegate->updateProgressBar(overall); });
 }

@@ -115,6 +115,8 @@ class OFLUpdater : public CRegistryWatcher {
   // False when the entry cannot go on; its outcome is then recorded.
   bool prepareEntry(const std::string& kind_I, const std::string& value_I);
   void notice(const std::string& text_I);
+  // The dialog, then the end of the run; the update loop goes no further.
+  void endWithDialog(const std::string& text_I, ERunOutcome outcome_I);
   static bool MatchesWatchedUsage(const DeviceInfo& info_I);
   void Terminate(ERunOutcome outcome_I);
 

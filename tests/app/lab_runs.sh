@@ -77,5 +77,18 @@ expect 64 "a terminal run without a board" --lab --headless --lab-state "$STATE/
 if "$PROGRAM" --lab --lab-fast --lab-state "$STATE/p" --yes -p "1:2:3:4:5" </dev/null 2>&1 | grep -q GetDevice; then
   echo "FAIL: GetDevice lines on the screen"; failures=$((failures + 1))
 fi
+SAYS="  touch controller of Lab Classic Tablet: updated from version 2.10 to 2.20
+  pen controller of Lab Classic Tablet: updated from version 1.20 to 1.30
+Result: the firmware was updated." \
+expect 0 "classic tablet, touch and pen in one run" --lab classic-tablet --headless --lab-state "$STATE/tp" --yes -t "" -p ""
+
+# A German user answers "j" at the prompt of a terminal.
+runs=$((runs + 1))
+german="$(echo j | LANGUAGE=de LANG=C.UTF-8 timeout 60 script -qec \
+  "'$PROGRAM' --lab --lab-fast --lab-state '$STATE/de' -p ''" /dev/null 2>&1)"
+if [ $? -ne 0 ] || ! grep -q "Ergebnis: die Firmware wurde aktualisiert." <<<"$german" ||
+   ! grep -qF "[j/N]" <<<"$german"; then
+  echo "FAIL: the German prompt takes j"; echo "$german" | tail -5; failures=$((failures + 1))
+fi
 echo "$(( runs - failures )) passed, $failures failed"
 [ "$failures" -eq 0 ]

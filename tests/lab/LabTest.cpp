@@ -444,3 +444,30 @@ TEST(LabOptions, StateFolderAndFastClock) {
 }
 
 }  // namespace
+
+TEST_F(LabBus, AVirtualWaitDoesNotRunOutBeforeAQueuedAttachIsTakenIn) {
+  // A device thread slowed down, as on a loaded machine.
+  struct SSlowWatcher : CRegistryWatcher {
+    std::atomic<bool> seen{false};
+    void DeviceAdded(const DeviceInfo&) override {
+      std::this_thread::sleep_for(std::chrono::milliseconds(50));
+      seen = true;
+    }
+    void DeviceRemoved(const DeviceInfo&) override {}
+  } watcher;
+  CLabDeviceRegistry registry(mBus);
+  ASSERT_TRUE(registry.OpenWatch());
+  std::thread watch([&] { registry.RunWatch(watcher); });
+
+  mBus->Plug(std::make_shared<CLabPenController>());
+  // The update thread's wait: 90 passes of one second of the clock's time.
+  int passes = 0;
+  while (!watcher.seen && passes < 90) {
+    TavSleep(1.0);
+    ++passes;
+  }
+  EXPECT_TRUE(watcher.seen);
+  EXPECT_LT(passes, 90);
+  registry.StopWatching();
+  watch.join();
+}

@@ -62,8 +62,9 @@ TEST_F(Failure, BlockCountMismatchIsAnInterfaceError) {
   mLoader->mReportedBlocks = 32;
   ASSERT_TRUE(mController->SetUpdateFile(WriteFile("image.pen")));
   EXPECT_FALSE(mController->UpdateDevice());
-  EXPECT_EQ(mNotifier.Only("error:").front(),
-            Error(EERROR_INTERFACE, "InitCheckForSRecData: Sector/Block mismatch! Expected 64 got 32\n"));
+  EXPECT_EQ(
+      mNotifier.Only("error:").front(),
+      Error(EERROR_INTERFACE, "InitCheckForSRecData: Sector/Block mismatch! Expected 64 got 32\n"));
   EXPECT_FALSE(mJournal.Contains("loader.ProgramBoard"));
 }
 
@@ -72,8 +73,9 @@ TEST_F(Failure, ZeroExpectedBlocksAlwaysMismatch) {
   mNormalDevice->SetPenFlashSectors(0);
   ASSERT_TRUE(mController->SetUpdateFile(WriteFile("image.pen")));
   EXPECT_FALSE(mController->UpdateDevice());
-  EXPECT_EQ(mNotifier.Only("error:").front(),
-            Error(EERROR_INTERFACE, "InitCheckForSRecData: Sector/Block mismatch! Expected 0 got 64\n"));
+  EXPECT_EQ(
+      mNotifier.Only("error:").front(),
+      Error(EERROR_INTERFACE, "InitCheckForSRecData: Sector/Block mismatch! Expected 0 got 64\n"));
 }
 
 TEST_F(Failure, InitFailureIsAnInterfaceErrorThenAProgramFailure) {
@@ -94,7 +96,8 @@ TEST_F(Failure, I2CFailureToEnterTheLoaderEndsTheAttemptThroughTheErrorCallback)
   ASSERT_TRUE(mController->SetUpdateFile(WriteFile("image.pen")));
   EXPECT_FALSE(mController->UpdateDevice());
   EXPECT_EQ(mNotifier.Only("error:"),
-            std::vector<std::string>{Error(EERROR_PROGRAM, "I2C Device failed to switch to Loader mode")});
+            std::vector<std::string>{
+                Error(EERROR_PROGRAM, "I2C Device failed to switch to Loader mode")});
   EXPECT_EQ(mController->GetState(), ESTATE_WAIT_LOADER);
   // Opened once for the switch; never again as a loader.
   EXPECT_EQ(mJournal.IndexOf("i2c.Open"), mJournal.IndexOf("i2c.SwitchToBLMode") - 1);
@@ -152,9 +155,10 @@ TEST_F(Failure, MissingInterfaceOrFileStopsBeforeTheDeviceIsTouched) {
   mBus->Set({MakeDevice(loader, true)});
   ASSERT_TRUE(mController->UpdateDeviceList());
   EXPECT_FALSE(mController->UpdateDevice());
-  EXPECT_EQ(mNotifier.Only("error:"),
-            (std::vector<std::string>{Error(EERROR_INTERFACE, "InitCheck: unrecognized data format"),
-                                      Error(EERROR_PROGRAM, "General Program Failure")}));
+  EXPECT_EQ(
+      mNotifier.Only("error:"),
+      (std::vector<std::string>{Error(EERROR_INTERFACE, "InitCheck: unrecognized data format"),
+                                Error(EERROR_PROGRAM, "General Program Failure")}));
   EXPECT_FALSE(mJournal.Contains("loader.ProgramBoard"));
   EXPECT_TRUE(mJournal.Contains("loader.SwitchFromBLMode(false)"));
 }

@@ -36,14 +36,21 @@ TEST_F(Flow, PenReEnumeratesIntoItsLoaderAndBack) {
   // The order on the wire: open and switch, open the loader, init, program, leave
   // with save, then carry the loader's sums to the new normal interface.
   const std::vector<std::string> journal = mJournal.Entries();
-  const std::vector<std::string> expectedOrder = {
-      "pen.RegisterCallback",    "pen.Open",                 "pen.SwitchToBLMode",
-      "loader.Open",
-      "loader.RegisterCallback", "loader.SetProtocolType(0)", "loader.Init(64 bytes)",
-      "loader.ProgramBoard",     "loader.RegisterCallback",  "loader.SwitchFromBLMode(true)",
-      "penAgain.Open",           "penAgain.RegisterCallback",
-      "penAgain.UpdateChecksums(4369,8738,13107)", "penAgain.UnregisterCallback",
-      "penAgain.Close"};
+  const std::vector<std::string> expectedOrder = {"pen.RegisterCallback",
+                                                  "pen.Open",
+                                                  "pen.SwitchToBLMode",
+                                                  "loader.Open",
+                                                  "loader.RegisterCallback",
+                                                  "loader.SetProtocolType(0)",
+                                                  "loader.Init(64 bytes)",
+                                                  "loader.ProgramBoard",
+                                                  "loader.RegisterCallback",
+                                                  "loader.SwitchFromBLMode(true)",
+                                                  "penAgain.Open",
+                                                  "penAgain.RegisterCallback",
+                                                  "penAgain.UpdateChecksums(4369,8738,13107)",
+                                                  "penAgain.UnregisterCallback",
+                                                  "penAgain.Close"};
   EXPECT_EQ(journal, expectedOrder);
 
   // Progress from the interface passes through; the run ends at 100.
@@ -113,8 +120,7 @@ TEST_F(Flow, SaveFlagOnLeavingFollowsBoardAndPenProduct) {
     EXPECT_TRUE(mController->UpdateDevice());
     EXPECT_TRUE(mNotifier.Logged("Switching Touch to Loader mode... "));
     const bool save = penProduct != 0x100u;
-    EXPECT_TRUE(mJournal.Contains(name + ".SwitchFromBLMode(" +
-                                  (save ? "true" : "false") + ")"))
+    EXPECT_TRUE(mJournal.Contains(name + ".SwitchFromBLMode(" + (save ? "true" : "false") + ")"))
         << penProduct;
   }
 }

@@ -1,14 +1,11 @@
 // The application object: launch rules, the state table, the moving text,
 // the driver's stop and start, and every way out.
-#include "update/FLAppDelegate.h"
-
 #include <gtest/gtest.h>
 #include <unistd.h>
 
+#include <atomic>
 #include <filesystem>
 #include <fstream>
-
-#include <atomic>
 #include <thread>
 
 #include "common/CMainThreadLoop.h"
@@ -17,6 +14,7 @@
 #include "host/CLinuxLanguageManager.h"
 #include "support/LogCapture.h"
 #include "update/AppDoubles.h"
+#include "update/FLAppDelegate.h"
 #include "update/OFLUpdater.h"
 
 namespace controller_test {
@@ -250,8 +248,9 @@ TEST_F(Application, TerminalStatusesTellEachOutcome) {
     mBus->Set({});
     RunToTheEnd(Make({"-p", ""}));
     EXPECT_EQ(mExitStatus, ERUN_NO_DEVICE);
-    EXPECT_TRUE(mWindow.Called("alert:" + T("Tavik Firmware Update Utility") + "|" +
-                               T("Error: No supported tablet is connected. Please connect a tablet.")));
+    EXPECT_TRUE(
+        mWindow.Called("alert:" + T("Tavik Firmware Update Utility") + "|" +
+                       T("Error: No supported tablet is connected. Please connect a tablet.")));
     OFLUpdater::DisposeInstance();
   }
   {
@@ -260,11 +259,12 @@ TEST_F(Application, TerminalStatusesTellEachOutcome) {
     fs::remove(mFolder / "cfg" / "Firmware" / "pen.pen");
     RunToTheEnd(Make({"-p", ""}));
     EXPECT_EQ(mExitStatus, ERUN_REFUSED_FILE);
-    EXPECT_NE(std::find(mReport.begin(), mReport.end(),
-                        "  " + T("pen controller") + " of Lab Tablet: " + T("firmware file refused") +
-                            ": " + (mFolder / "cfg" / "Firmware" / "pen.pen").string() +
-                            ": No such file or directory"),
-              mReport.end());
+    EXPECT_NE(
+        std::find(mReport.begin(), mReport.end(),
+                  "  " + T("pen controller") + " of Lab Tablet: " + T("firmware file refused") +
+                      ": " + (mFolder / "cfg" / "Firmware" / "pen.pen").string() +
+                      ": No such file or directory"),
+        mReport.end());
     OFLUpdater::DisposeInstance();
   }
   {
@@ -273,7 +273,8 @@ TEST_F(Application, TerminalStatusesTellEachOutcome) {
     RunToTheEnd(Make({"-b", ""}));
     EXPECT_EQ(mExitStatus, ERUN_NO_DEVICE);
     EXPECT_TRUE(mWindow.Called("alert:" + T("Tavik Firmware Update Utility") +
-                               "|Error: Lab Tablet has no " + T("Bluetooth module") + " to update."));
+                               "|Error: Lab Tablet has no " + T("Bluetooth module") +
+                               " to update."));
   }
 }
 
@@ -304,8 +305,9 @@ TEST_F(Application, TerminalRunWhoseLoaderNeverReturnsEndsAsAFailure) {
   RunToTheEnd(Make({"-p", ""}));
   EXPECT_FALSE(mJournal.Contains("pen.ProgramBoard"));
   EXPECT_EQ(mExitStatus, ERUN_FAILED);
-  EXPECT_EQ(mReport.end()[-2],
-            "  pen controller of Lab Tablet: failed: the board did not reach its loader mode in time");
+  EXPECT_EQ(
+      mReport.end()[-2],
+      "  pen controller of Lab Tablet: failed: the board did not reach its loader mode in time");
 }
 
 TEST_F(Application, WithoutABoardATerminalRunEndsAtOnceAndAWindowRunWaits) {
@@ -323,7 +325,7 @@ TEST_F(Application, WithoutABoardATerminalRunEndsAtOnceAndAWindowRunWaits) {
   EXPECT_EQ(window.state(), ESTATE_PROGRAM);
   EXPECT_FALSE(window.HasTerminated());
   EXPECT_TRUE(mWindow.Called("close:0"));  // the window cannot be closed either
-  window.terminate(ERUN_DECLINED);          // from outside
+  window.terminate(ERUN_DECLINED);         // from outside
   EXPECT_EQ(mExitStatus, 0);
 }
 
@@ -350,10 +352,10 @@ TEST_F(Application, StateTableDrivesTheWindowInOrder) {
   app.doStateMachine(ESTATE_WAIT_DEVICE);
   const std::vector<std::string> all = mWindow.Calls();
   const std::vector<std::string> calls(all.begin() + static_cast<long>(before), all.end());
-  EXPECT_EQ(calls, (std::vector<std::string>{
-                       "color:0", "ui:1", "button:0", "close:1",           // none
-                       "ui:1", "close:1", "button:1",                      // ready
-                       "ui:0", "close:0", "text:" + T("Waiting for Device Mode"), "color:1"}));
+  EXPECT_EQ(calls, (std::vector<std::string>{"color:0", "ui:1", "button:0", "close:1",  // none
+                                             "ui:1", "close:1", "button:1",             // ready
+                                             "ui:0", "close:0",
+                                             "text:" + T("Waiting for Device Mode"), "color:1"}));
 
   app.doStateMachine(static_cast<ECONTROLLER_STATE>(8));
   EXPECT_EQ(app.state(), 8);
@@ -419,7 +421,8 @@ TEST_F(Application, DriverStopsThroughTheServiceWhenThereIsOne) {
   EXPECT_DOUBLE_EQ(mClock->GetTotalSlept() - before, 6.0);
   ASSERT_EQ(client->mStops.size(), 2u);
   EXPECT_EQ(client->mStops[0].size(), 2u);  // LaunchAgents and User
-  EXPECT_EQ(client->mStops[0].at("LaunchAgents"), std::vector<std::string>{"com.tavik.taviktablet"});
+  EXPECT_EQ(client->mStops[0].at("LaunchAgents"),
+            std::vector<std::string>{"com.tavik.taviktablet"});
   EXPECT_EQ(client->mStops[0].at("User"), std::vector<std::string>{std::to_string(getuid())});
   EXPECT_EQ(client->mStops[1].size(), 3u);
   EXPECT_EQ(client->mStops[1].at("BundleID"),

@@ -1,7 +1,5 @@
 // The updater driver: arguments, set-up, the device and update threads, and
 // how status and progress reach the application.
-#include "update/OFLUpdater.h"
-
 #include <gtest/gtest.h>
 #include <unistd.h>
 
@@ -11,6 +9,7 @@
 #include "common/CVirtualClock.h"
 #include "devices/IOUtils.h"
 #include "support/LogCapture.h"
+#include "update/OFLUpdater.h"
 #include "update/UpdaterDoubles.h"
 
 namespace controller_test {
@@ -92,8 +91,9 @@ class Updater : public ::testing::Test {
 
 TEST_F(Updater, ParseArgumentsKeepsOrderAndTakesTheNextElementBlindly) {
   using Entries = std::vector<OFLUpdater::UpdateEntry>;
-  EXPECT_EQ(OFLUpdater::parseArguments({"prog", "-p", "", "-f", "cfg", "-t", "1:2:3:4:5", "-p", "x"}),
-            (Entries{{"pen", ""}, {"touch", "1:2:3:4:5"}, {"pen", "x"}}));
+  EXPECT_EQ(
+      OFLUpdater::parseArguments({"prog", "-p", "", "-f", "cfg", "-t", "1:2:3:4:5", "-p", "x"}),
+      (Entries{{"pen", ""}, {"touch", "1:2:3:4:5"}, {"pen", "x"}}));
   // The value of an option is not looked at: it may be another option,
   // which the walk then reads as an option too. Stray words are skipped.
   EXPECT_EQ(OFLUpdater::parseArguments({"prog", "-b", "-s", "stray", "word", "-s", "1:2:SN:255"}),
@@ -130,7 +130,8 @@ TEST_F(Updater, ConfigPathPrefersTheOptionThenBesideTheProgramThenTheInstallatio
   std::ofstream(mFolder / "bin" / "fw_loader.ini") << "{}";
   EXPECT_EQ(updater->configPath(), (mFolder / "bin" / "fw_loader.ini").string());
   // Worked out once, at creation.
-  EXPECT_EQ(updater->GetController().getConfigPath(), (mFolder / "share" / "fw_loader.ini").string());
+  EXPECT_EQ(updater->GetController().getConfigPath(),
+            (mFolder / "share" / "fw_loader.ini").string());
   OFLUpdater::DisposeInstance();
 
   // Launched by another program, the preferences file names the boards and

@@ -32,7 +32,13 @@ Bytes Pattern(size_t size_I, uint32_t seed_I) {
 // The image names its release as the lab's boards read it: "TAVREL", then
 // the release low byte first, a little way into the image.
 Bytes Released(Bytes data_I, uint16_t release_I) {
-  const uint8_t tag[] = {'T', 'A', 'V', 'R', 'E', 'L', static_cast<uint8_t>(release_I & 0xFF),
+  const uint8_t tag[] = {'T',
+                         'A',
+                         'V',
+                         'R',
+                         'E',
+                         'L',
+                         static_cast<uint8_t>(release_I & 0xFF),
                          static_cast<uint8_t>(release_I >> 8)};
   std::copy(std::begin(tag), std::end(tag), data_I.begin() + 16);
   return data_I;
@@ -76,8 +82,8 @@ std::string IntelHexText(const Bytes& data_I) {
     const size_t count = std::min<size_t>(16, data_I.size() - at);
     const uint32_t address = 0x8000 + static_cast<uint32_t>(at);
     unsigned sum = static_cast<unsigned>(count) + (address >> 8) + address;
-    std::string line = ":" + Hex2(static_cast<unsigned>(count)) + Hex2(address >> 8) +
-                       Hex2(address) + "00";
+    std::string line =
+        ":" + Hex2(static_cast<unsigned>(count)) + Hex2(address >> 8) + Hex2(address) + "00";
     for (size_t k = 0; k < count; ++k) {
       line += Hex2(data_I[at + k]);
       sum += data_I[at + k];
@@ -133,7 +139,8 @@ int main(int argc, char** argv) {
               SRecordText(kTouchStart, Released(Pattern(kTouchBytes, seed++), 0x0220)));
   ok &= Write(folder / "wireless-tablet.hex",
               IntelHexText(Released(Pattern(32 * 1024, seed++), 0x0110)));
-  ok &= Write(folder / "display-hid.hex", IntelHexText(Released(Pattern(32 * 1024, seed++), 0x0110)));
+  ok &=
+      Write(folder / "display-hid.hex", IntelHexText(Released(Pattern(32 * 1024, seed++), 0x0110)));
   ok &= Write(folder / "wireless-tablet.airoflash2",
               AsText(Released(Pattern(40 * 1024, seed++), 0x0110)));
   ok &= Write(folder / "wireless-tablet-1122.airoflash",

@@ -214,8 +214,9 @@ int CTerminalWindowController::ShowAlert(const SAlert& alert_I) {
     for (size_t index = 0; index < buttons.size(); ++index) {
       if (StringUtilities::IEquals(line, buttons[index])) return static_cast<int>(index);
     }
-    Write(StringUtilities::Format(T("Please type a number from 1 to %zu.").c_str(), buttons.size()) +
-          "\n");
+    Write(
+        StringUtilities::Format(T("Please type a number from 1 to %zu.").c_str(), buttons.size()) +
+        "\n");
   }
 }
 

@@ -148,9 +148,10 @@ TEST(TerminalWindow, YesNoQuestionsReadAnswersAndDefaultToNo) {
   const struct {
     const char* input;
     bool answer;
-  } cases[] = {{"y\n", true},  {"yes\n", true}, {" YES \r\n", true},    {"ja\n", true},
-               {"n\n", false}, {"no\n", false}, {"Nein\n", false},      {"\n", false},
-               {"", false},    {"y", true},     {"maybe\nyes\n", true}, {"yess\nj\n", true}, {"x\nn\n", false}};
+  } cases[] = {{"y\n", true},    {"yes\n", true}, {" YES \r\n", true},    {"ja\n", true},
+               {"n\n", false},   {"no\n", false}, {"Nein\n", false},      {"\n", false},
+               {"", false},      {"y", true},     {"maybe\nyes\n", true}, {"yess\nj\n", true},
+               {"x\nn\n", false}};
   for (const auto& entry : cases) {
     OutputCapture out;
     InputText in(entry.input);
