@@ -15,8 +15,6 @@ namespace {
 
 namespace fs = std::filesystem;
 
-constexpr const char* kTypeWarning = "CSettingsMap::ObjectForKey got a";
-
 std::shared_ptr<CSettingsArray> Products(const std::string& json_I) {
   auto array = CSettingsArray::CastToArray(CSettingsObject::ReadFromJSONBuffer(json_I), false);
   EXPECT_NE(array, nullptr) << json_I;
@@ -131,14 +129,12 @@ TEST(CSupportedDeviceInfoTest, ValuesOfTheWrongJsonTypeWarnAndFallBackToTheBoard
   EXPECT_FALSE(device.GetIsQuantaScalarBoard());
   // A board key holding no object is a board left out.
   EXPECT_FALSE(device.GetTouchSupported());
-  EXPECT_TRUE(log.LogContains(std::string(kTypeWarning) + " integer and failed to cast to "
-                                                          "CSettingsString"));
-  EXPECT_TRUE(log.LogContains(std::string(kTypeWarning) + " string and failed to cast to "
-                                                          "CSettingsInteger"));
-  EXPECT_TRUE(log.LogContains(std::string(kTypeWarning) + " string and failed to cast to "
-                                                          "CSettingsBool"));
-  EXPECT_TRUE(log.LogContains(std::string(kTypeWarning) + " string and failed to cast to "
-                                                          "CSettingsMap"));
+  for (const char* warning : {" integer and failed to cast to CSettingsString",
+                              " string and failed to cast to CSettingsInteger",
+                              " string and failed to cast to CSettingsBool",
+                              " string and failed to cast to CSettingsMap"}) {
+    EXPECT_TRUE(log.LogContains(std::string("CSettingsMap::ObjectForKey got a") + warning));
+  }
 }
 
 TEST(CSupportedDeviceInfoTest, EveryBoardTakesTheIntoBootloaderFlagOfThePenBoard) {
@@ -243,35 +239,32 @@ TEST(CSupportedDeviceInfoTest, LaterElementsWinCollisionsAndScalarSectorsNeverRe
   EXPECT_TRUE(info.ParseDevices(nullptr).empty());
 }
 
-TEST(CSupportedDeviceInfoTest, HexTextsFollowTheStreamRules) {
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("7A5D", 1), 0x7A5Du);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("0x7a5d", 1), 0x7A5Du);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("0X7A5D", 1), 0x7A5Du);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam(" 1f", 1), 0x1Fu);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("12zz", 1), 0x12u);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("FFFFFFFF", 1), 0xFFFFFFFFu);
-  // No leading digit reads as 0; nothing at all, or blanks alone, keep the default.
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("zz", 1), 0u);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("", 0x5B27), 0x5B27u);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("   ", 0x5B27), 0x5B27u);
+TEST(CSupportedDeviceInfoTest, HexTextsFollowTheStreamRulesAndInterfaceWordsAreExact) {
+  const std::pair<const char*, uint32_t> hex[] = {
+      {"7A5D", 0x7A5D}, {"0x7a5d", 0x7A5D},       {"0X7A5D", 0x7A5D}, {" 1f", 0x1F},
+      {"12zz", 0x12},   {"FFFFFFFF", 0xFFFFFFFF}, {"zz", 0},  // no leading digit reads as 0
+      {"", 0x5B27},     {"   ", 0x5B27}};                     // nothing at all keeps the default
+  for (const auto& [text, value] : hex) {
+    EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam(text, 0x5B27), value) << '"' << text << '"';
+  }
+  const struct {
+    const char* text;
+    EINTERFACE_TYPE fallback, expected;
+  } words[] = {
+      {"HID", EFTDI_INTERFACE, EHID_INTERFACE},    {"BULK", EHID_INTERFACE, EBULK_INTERFACE},
+      {"I2C", EHID_INTERFACE, EI2C_INTERFACE},     {"FTDI", EHID_INTERFACE, EFTDI_INTERFACE},
+      {"", EFTDI_INTERFACE, EFTDI_INTERFACE},      {"hid", EHID_INTERFACE, EINVALID_INTERFACE},
+      {"HID ", EHID_INTERFACE, EINVALID_INTERFACE}};
+  for (const auto& word : words) {
+    EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam(word.text, word.fallback), word.expected)
+        << '"' << word.text << '"';
+  }
 
-  CDevice device =
-      Product(R"({"name": "A", "penBoard": {"vid": "zz"}, "scalarBoard": {"vid": ""}})");
+  CDevice device = Product(R"({"name": "A", "penBoard": {"vid": "zz", "interface": "hid"},
+                               "scalarBoard": {"vid": ""}})");
   EXPECT_EQ(device.GetPenVendorId(), 0u);
+  EXPECT_EQ(device.GetPenInterfaceType(), EINVALID_INTERFACE);
   EXPECT_EQ(device.GetScalarVendorId(), 0x5B27u);
-}
-
-TEST(CSupportedDeviceInfoTest, InterfaceWordsAreExactAndUnknownWordsAreInvalid) {
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("HID", EFTDI_INTERFACE), EHID_INTERFACE);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("BULK", EHID_INTERFACE), EBULK_INTERFACE);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("I2C", EHID_INTERFACE), EI2C_INTERFACE);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("FTDI", EHID_INTERFACE), EFTDI_INTERFACE);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("", EFTDI_INTERFACE), EFTDI_INTERFACE);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("hid", EHID_INTERFACE), EINVALID_INTERFACE);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("HID ", EHID_INTERFACE),
-            EINVALID_INTERFACE);
-  EXPECT_EQ(Product(R"({"name": "A", "penBoard": {"interface": "hid"}})").GetPenInterfaceType(),
-            EINVALID_INTERFACE);
 }
 
 TEST(CSupportedDeviceInfoTest, LookupsCompareOnlyTheSumAndListEveryKeyInOrder) {

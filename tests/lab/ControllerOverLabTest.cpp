@@ -5,12 +5,10 @@
 
 #include <gtest/gtest.h>
 
-#include <cstdio>
-#include <filesystem>
-#include <fstream>
 #include <mutex>
 
 #include "devices/CDiscovery.h"
+#include "firmware/FirmwareFiles.h"
 #include "lab/CLabHidNode.h"
 #include "lab/CLabPenController.h"
 #include "platform/linux/CLinuxHIDFLDeviceInterface.h"
@@ -81,21 +79,10 @@ class Recorder : public CUpdateNotifier {
 // S3 records of 32 bytes each.
 std::string SRecordText(const SContinuousDataBlock& block_I) {
   std::string text = "S00600004844521B\n";
-  char field[16];
   for (size_t at = 0; at < block_I.data.size(); at += 32) {
-    const size_t count = std::min<size_t>(32, block_I.data.size() - at);
-    const uint32_t address = block_I.startAddress + static_cast<uint32_t>(at);
-    uint32_t sum = static_cast<uint32_t>(count + 5);
-    std::snprintf(field, sizeof(field), "S3%02X%08X", static_cast<unsigned>(count + 5), address);
-    text += field;
-    for (int shift = 0; shift < 32; shift += 8) sum += (address >> shift) & 0xFF;
-    for (size_t k = 0; k < count; ++k) {
-      std::snprintf(field, sizeof(field), "%02X", block_I.data[at + k]);
-      text += field;
-      sum += block_I.data[at + k];
-    }
-    std::snprintf(field, sizeof(field), "%02X\n", static_cast<unsigned>(~sum & 0xFF));
-    text += field;
+    const std::vector<uint8_t> chunk(block_I.data.begin() + at,
+                                     block_I.data.begin() + std::min(at + 32, block_I.data.size()));
+    text += SRecLine('3', block_I.startAddress + static_cast<uint32_t>(at), chunk) + "\n";
   }
   return text + "S70500000000FA\n";
 }
@@ -107,10 +94,8 @@ TEST_F(ControllerOverLab, APenUpdateFromFileToNormalMode) {
   mBus->Plug(pen);
   const CLabFlash before = pen->GetLoader().GetCpu(0);
   const SContinuousDataBlock image = LabImages::Record(0x08002000, 0x3000, 61);
-  const std::string path = (std::filesystem::temp_directory_path() /
-                            ("tavik-lab-" + std::to_string(::getpid()) + ".pen"))
-                               .string();
-  std::ofstream(path) << SRecordText(image);
+  CTempFolder folder;
+  const std::string path = folder.Write("lab.pen", SRecordText(image));
 
   CLinuxUpdateController controller(std::make_unique<LabDiscovery>(mBus));
   Recorder recorder;
@@ -129,7 +114,6 @@ TEST_F(ControllerOverLab, APenUpdateFromFileToNormalMode) {
   ASSERT_TRUE(controller.SetUpdateFile(path));
   const bool updated = controller.UpdateDevice();
   mBus->RemoveListener(listener);
-  std::filesystem::remove(path);
 
   ASSERT_TRUE(updated) << (recorder.errors.empty() ? "" : recorder.errors.back());
   EXPECT_EQ(controller.GetState(), ESTATE_SUCCESS);
