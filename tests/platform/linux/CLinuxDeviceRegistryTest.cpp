@@ -29,13 +29,7 @@ const std::vector<uint8_t> kVendorOnly = {0x06, 0x00, 0xFF, 0x09, 0x01, 0xA1, 0x
 
 DeviceInfo Info(uint32_t vendor_I, uint32_t product_I, uint32_t location_I, uint32_t usage_I,
                 uint32_t page_I) {
-  DeviceInfo info;
-  info.vendorId = vendor_I;
-  info.productId = product_I;
-  info.locationId = location_I;
-  info.usage = usage_I;
-  info.usagePage = page_I;
-  return info;
+  return DeviceInfo{vendor_I, product_I, location_I, usage_I, page_I};
 }
 
 class CLinuxDeviceRegistryTest : public ::testing::Test {
@@ -106,16 +100,19 @@ class CWatchThread {
 }  // namespace
 
 TEST(CLinuxDeviceRegistryLocationTest, PacksBusAndPortsIntoOneWord) {
-  EXPECT_EQ(CLinuxDeviceRegistry::LocationIdFromTopology(1, "2.3"), 0x01230000u);
-  EXPECT_EQ(CLinuxDeviceRegistry::LocationIdFromTopology(3, "2"), 0x03200000u);
-  EXPECT_EQ(CLinuxDeviceRegistry::LocationIdFromTopology(2, "1.4.2.3.1.5"), 0x02142315u);
-  // The same ports on another bus, or one port more, is another place.
-  EXPECT_NE(CLinuxDeviceRegistry::LocationIdFromTopology(1, "2"),
-            CLinuxDeviceRegistry::LocationIdFromTopology(1, "2.1"));
-  EXPECT_NE(CLinuxDeviceRegistry::LocationIdFromTopology(1, "2.3"),
-            CLinuxDeviceRegistry::LocationIdFromTopology(2, "2.3"));
-  // Ports past the sixth do not spill into the bus number.
-  EXPECT_EQ(CLinuxDeviceRegistry::LocationIdFromTopology(1, "1.1.1.1.1.1.7"), 0x01111111u);
+  // The same ports on another bus, or one port more, is another place; ports
+  // past the sixth do not spill into the bus number.
+  const struct {
+    unsigned bus;
+    const char* devpath;
+    uint32_t location;
+  } cases[] = {{1, "2.3", 0x01230000}, {3, "2", 0x03200000},   {2, "1.4.2.3.1.5", 0x02142315},
+               {1, "2.1", 0x01210000}, {2, "2.3", 0x02230000}, {1, "1.1.1.1.1.1.7", 0x01111111}};
+  for (const auto& entry : cases) {
+    EXPECT_EQ(CLinuxDeviceRegistry::LocationIdFromTopology(entry.bus, entry.devpath),
+              entry.location)
+        << entry.bus << "-" << entry.devpath;
+  }
 }
 
 TEST_F(CLinuxDeviceRegistryTest, ListsOneEntryPerTopLevelPairWithIdentityAndNode) {

@@ -129,6 +129,8 @@ TEST_F(Umockdev, TouchControllerSwitchedOverLibusbAndUpdatedOnItsLoader) {
   Bytes unknownRequest{0x41, 0x77, 0, 0, 0};
   EXPECT_FALSE(bulk.Write(unknownRequest)) << "a stalled control request";
   ASSERT_TRUE(bulk.SwitchToBLMode());
+  TavSleep(1.0);
+  EXPECT_FALSE(bulk.IsAlive()) << "the USB device it had is gone";
   bulk.Close();
 
   const CLabFlash before = touch->GetLoader().GetCpu(1);
@@ -198,6 +200,8 @@ TEST_F(Umockdev, DiscoveryFindsLabProductsBehindTheirHubsThroughLibudev) {
   const auto best = discovery.GetBestDevice();
   ASSERT_NE(best, nullptr);
   EXPECT_TRUE(best->GetIsFlashLoader());
+  EXPECT_EQ(best->GetDeviceName(), "Lab Classic Tablet");
+  EXPECT_EQ(best->GetPenUpdate(), "classic-tablet.pen");
   EXPECT_EQ(best->GetPenInterface()->GetPath(), "31325:770:17891328:1:65280");
   EXPECT_EQ(best->GetTouchInterface()->GetPath(), "31325:785:17956864:0:0");
   EXPECT_NE(discovery.FindDevice(other->GetBluetoothInterface()->GetPath()), nullptr);
