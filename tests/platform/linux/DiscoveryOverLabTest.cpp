@@ -4,8 +4,6 @@
 
 #include <gtest/gtest.h>
 
-#include <map>
-
 #include "devices/IOUtils.h"
 #include "flash/CFLDeviceInterface.h"
 #include "lab/CLabDeviceRegistry.h"
@@ -57,7 +55,7 @@ class DiscoveryOverLab : public LabFixture {};
 
 }  // namespace
 
-TEST_F(DiscoveryOverLab, EveryProductIsOneDeviceWithItsBoardsInTheirRoles) {
+TEST_F(DiscoveryOverLab, ProductsSideBySideAreOneDeviceEachWithTheirOwnBoardsInTheirRoles) {
   struct SExpected {
     const char* name;
     EINTERFACE_TYPE pen;
@@ -82,19 +80,25 @@ TEST_F(DiscoveryOverLab, EveryProductIsOneDeviceWithItsBoardsInTheirRoles) {
   };
   ASSERT_EQ(CLabProducts::All().size(), std::size(expected));
 
-  for (const SExpected& product : expected) {
+  // All side by side, each behind a hub of its own.
+  std::vector<std::vector<std::shared_ptr<CLabBoard>>> boards;
+  for (unsigned i = 0; i < std::size(expected); ++i) {
+    boards.push_back(CLabProducts::Plug(*mBus, expected[i].name, i + 1));
+  }
+  auto discovery = LabDiscovery(mBus);
+  const std::vector<DevicePtr> devices = Scan(*discovery);
+  ASSERT_EQ(devices.size(), std::size(expected));
+  EXPECT_EQ(discovery->GetBestDevice(), devices[0]) << "none is in its loader";
+  for (size_t k = 0; k < std::size(expected); ++k) {
+    const SExpected& product = expected[k];
     SCOPED_TRACE(product.name);
-    auto bus = CLabBus::Create();
-    const auto boards = CLabProducts::Plug(*bus, product.name, 3);
-    ASSERT_FALSE(boards.empty());
-    auto discovery = LabDiscovery(bus);
-    const std::vector<DevicePtr> devices = Scan(*discovery);
-    ASSERT_EQ(devices.size(), 1u);
-    const DevicePtr& device = devices[0];
+    const std::string penPath = PathOf(*boards[k][0], product.penIndex);
+    const DevicePtr device = discovery->FindDevice(penPath);
+    ASSERT_NE(device, nullptr);
     EXPECT_FALSE(device->GetIsFlashLoader());
     EXPECT_EQ(device->CanGoIntoBootloaderMode(), product.intoLoader);
     EXPECT_EQ(TypeOf(device->GetPenInterface()), product.pen);
-    EXPECT_EQ(PathOf(device->GetPenInterface()), PathOf(*boards[0], product.penIndex));
+    EXPECT_EQ(PathOf(device->GetPenInterface()), penPath);
     EXPECT_EQ(TypeOf(device->GetTouchInterface()), product.touch);
     EXPECT_EQ(TypeOf(device->GetBluetoothInterface()), product.bluetooth);
     EXPECT_EQ(TypeOf(device->GetScalarInterface()), product.scalar);
@@ -106,44 +110,15 @@ TEST_F(DiscoveryOverLab, EveryProductIsOneDeviceWithItsBoardsInTheirRoles) {
       if (!interface) continue;
       ++attached;
       bool ours = false;
-      for (const auto& board : boards) {
+      for (const auto& board : boards[k]) {
         for (size_t i = 0; i < board->GetInterfaces().size(); ++i) {
           ours = ours || PathOf(*board, i) == interface->GetPath();
         }
       }
       EXPECT_TRUE(ours) << interface->GetPath();
     }
-    EXPECT_EQ(attached, boards.size());
+    EXPECT_EQ(attached, boards[k].size());
   }
-}
-
-TEST_F(DiscoveryOverLab, ProductsSideBySideKeepTheirOwnBoards) {
-  const std::vector<std::string> names{"wireless-tablet", "display-hid", "classic-tablet"};
-  std::map<std::string, std::vector<std::shared_ptr<CLabBoard>>> boards;
-  for (size_t i = 0; i < names.size(); ++i) {
-    boards[names[i]] = CLabProducts::Plug(*mBus, names[i], static_cast<unsigned>(i + 1));
-  }
-  auto discovery = LabDiscovery(mBus);
-  const std::vector<DevicePtr> devices = Scan(*discovery);
-  ASSERT_EQ(devices.size(), 3u);
-  std::map<std::string, DevicePtr> byName;
-  for (const DevicePtr& device : devices) byName[device->GetDeviceName()] = device;
-  ASSERT_EQ(byName.size(), 3u);
-
-  const DevicePtr wireless = byName.at("Lab Wireless Tablet");
-  EXPECT_EQ(PathOf(wireless->GetTouchInterface()), PathOf(*boards["wireless-tablet"][1], 0));
-  EXPECT_EQ(PathOf(wireless->GetBluetoothInterface()), PathOf(*boards["wireless-tablet"][2], 0));
-  const DevicePtr display = byName.at("Lab Pen Display HID");
-  EXPECT_EQ(PathOf(display->GetTouchInterface()), PathOf(*boards["display-hid"][1], 0));
-  EXPECT_EQ(PathOf(display->GetScalarInterface()), PathOf(*boards["display-hid"][2], 0));
-  EXPECT_EQ(PathOf(byName.at("Lab Classic Tablet")->GetTouchInterface()),
-            PathOf(*boards["classic-tablet"][1], 0));
-
-  // The searches of the list find a product by any of its boards.
-  EXPECT_EQ(discovery->FindDevice(wireless->GetBluetoothInterface()->GetPath()), wireless);
-  EXPECT_EQ(discovery->FindDevice(0x7A5D, 0x0631), display);
-  EXPECT_EQ(discovery->GetExistingDevice(0x7A5D, 0x0411), wireless);
-  EXPECT_EQ(discovery->GetBestDevice(), devices[0]) << "none is in its loader";
 }
 
 TEST_F(DiscoveryOverLab, ATouchControllerInItsLoaderJoinsThePenOfItsProduct) {

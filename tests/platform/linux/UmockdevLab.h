@@ -26,21 +26,14 @@
 #include <vector>
 
 #include "lab/CLabBus.h"
+#include "platform/linux/CEmulatedUsbBus.h"
 
-class UmockdevLab {
+class UmockdevLab : private CEmulatedUsbBus {
  public:
-  explicit UmockdevLab(std::shared_ptr<CLabBus> bus_I)
-      : mBus(std::move(bus_I)), mTestbed(umockdev_testbed_new()) {
-    Sync();
-  }
-
+  explicit UmockdevLab(std::shared_ptr<CLabBus> bus_I) : mBus(std::move(bus_I)) { Sync(); }
   ~UmockdevLab() {
     while (!mDevices.empty()) RemoveDevice(mDevices.front());
-    g_object_unref(mTestbed);
   }
-
-  UmockdevLab(const UmockdevLab&) = delete;
-  UmockdevLab& operator=(const UmockdevLab&) = delete;
 
   // Brings the emulated devices in line with what the bus lists.
   void Sync() {
@@ -104,24 +97,6 @@ class UmockdevLab {
     bytes_IO.push_back(static_cast<uint8_t>(value_I >> 8));
   }
 
-  static std::string Hex(const std::vector<uint8_t>& bytes_I) {
-    std::string text;
-    char pair[3];
-    for (uint8_t byte : bytes_I) {
-      std::snprintf(pair, sizeof(pair), "%02x", byte);
-      text += pair;
-    }
-    return text;
-  }
-
-  void Add(const std::string& text_I) {
-    GError* error = nullptr;
-    if (!umockdev_testbed_add_from_string(mTestbed, text_I.c_str(), &error)) {
-      std::fprintf(stderr, "umockdev: %s\n", error != nullptr ? error->message : "?");
-      if (error != nullptr) g_error_free(error);
-    }
-  }
-
   SNode* Attach(SDevice& device_I, const SLabInterface& interface_I, const std::string& devnode_I,
                 bool usbfs_I) {
     auto node = std::make_unique<SNode>();
@@ -132,7 +107,7 @@ class UmockdevLab {
     node->handler = umockdev_ioctl_base_new();
     g_signal_connect(node->handler, "handle-ioctl", G_CALLBACK(&UmockdevLab::HandleIoctl),
                      node.get());
-    umockdev_testbed_attach_ioctl(mTestbed, devnode_I.c_str(), node->handler, nullptr);
+    umockdev_testbed_attach_ioctl(GetTestbed(), devnode_I.c_str(), node->handler, nullptr);
     device_I.nodes.push_back(std::move(node));
     return device_I.nodes.back().get();
   }
@@ -252,12 +227,10 @@ class UmockdevLab {
   void RemoveDevice(std::shared_ptr<SDevice> device_I) {
     // Leaf first, each with its remove event.
     for (auto path = device_I->syspaths.rbegin(); path != device_I->syspaths.rend(); ++path) {
-      const std::string syspath = "/sys" + *path;
-      umockdev_testbed_uevent(mTestbed, syspath.c_str(), "remove");
-      umockdev_testbed_remove_device(mTestbed, syspath.c_str());
+      Remove(*path);
     }
     for (auto& node : device_I->nodes) {
-      umockdev_testbed_detach_ioctl(mTestbed, node->devnode.c_str(), nullptr);
+      umockdev_testbed_detach_ioctl(GetTestbed(), node->devnode.c_str(), nullptr);
       if (node->bound) mBus->Release(node->binding);
       {
         std::lock_guard<std::mutex> guard(node->lock);
@@ -424,7 +397,6 @@ class UmockdevLab {
   }
 
   std::shared_ptr<CLabBus> mBus;
-  UMockdevTestbed* mTestbed;
   std::vector<std::shared_ptr<SDevice>> mDevices;
   std::vector<std::string> mHubs;
   unsigned mNextDevnum = 2;
