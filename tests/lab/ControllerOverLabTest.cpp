@@ -1,5 +1,5 @@
 // The update controller drives a whole pen update against the lab: it finds
-// the pen through a small discovery over the lab bus, hears attach and
+// the product through discovery over the lab bus, hears attach and
 // detach from the bus, switches the pen to its loader, programs an S-record
 // file and brings it back.
 
@@ -7,52 +7,18 @@
 
 #include <mutex>
 
-#include "devices/CDiscovery.h"
 #include "firmware/FirmwareFiles.h"
+#include "lab/CLabDeviceRegistry.h"
 #include "lab/CLabHidNode.h"
 #include "lab/CLabPenController.h"
-#include "platform/linux/CLinuxHIDFLDeviceInterface.h"
+#include "lab/CLabProducts.h"
+#include "lab/CLabUsbControl.h"
+#include "platform/linux/CLinuxDiscovery.h"
 #include "support/LabFixture.h"
 #include "support/LabImages.h"
 #include "update/CLinuxUpdateController.h"
 
 namespace {
-
-constexpr uint16_t kPen = 0x0301;
-constexpr uint16_t kLoader = 0x0302;
-
-// One device per pen found on the bus: its digitizer interface in normal
-// mode, its loader interface in loader mode.
-class LabDiscovery : public CDiscovery {
- public:
-  explicit LabDiscovery(std::shared_ptr<CLabBus> bus_I) : mBus(std::move(bus_I)) {}
-
-  bool GenerateDeviceList() override {
-    mDeviceList.ClearDeviceList();
-    for (const SLabInterface& entry : mBus->ListInterfaces()) {
-      const bool loader = entry.info.productId == kLoader;
-      const bool pen = entry.info.productId == kPen && entry.info.usagePage == 0x000D;
-      if (!loader && !pen) continue;
-      auto device = std::make_shared<CDevice>();
-      device->SetDeviceName("lab pen");
-      device->SetPenVendorId(entry.info.vendorId);
-      device->SetPenProductId(kPen);
-      device->SetPenInterfaceType(EHID_INTERFACE);
-      device->SetPenFlashSectors(48);
-      device->SetPenIntoBLMode(true);
-      device->SetIsFlashLoader(loader);
-      auto interface = std::make_shared<CLinuxHIDFLDeviceInterface>(
-          entry.info, std::make_unique<CLabHidNode>(mBus));
-      interface->SetIsFlashLoader(loader);
-      device->SetPenInterface(interface);
-      mDeviceList.AddDevice(device);
-    }
-    return mDeviceList.GetDeviceCount() != 0;
-  }
-
- private:
-  std::shared_ptr<CLabBus> mBus;
-};
 
 class Recorder : public CUpdateNotifier {
  public:
@@ -60,16 +26,12 @@ class Recorder : public CUpdateNotifier {
     std::lock_guard<std::mutex> guard(mLock);
     errors.push_back(text_I);
   }
-  void UpdateStatus(ECONTROLLER_STATE state_I) override {
-    std::lock_guard<std::mutex> guard(mLock);
-    states.push_back(state_I);
-  }
+  void UpdateStatus(ECONTROLLER_STATE) override {}
   void UpdateProgress(unsigned int percent_I) override {
     std::lock_guard<std::mutex> guard(mLock);
     progress.push_back(percent_I);
   }
   std::vector<std::string> errors;
-  std::vector<ECONTROLLER_STATE> states;
   std::vector<unsigned int> progress;
 
  private:
@@ -90,14 +52,19 @@ std::string SRecordText(const SContinuousDataBlock& block_I) {
 class ControllerOverLab : public LabFixture {};
 
 TEST_F(ControllerOverLab, APenUpdateFromFileToNormalMode) {
-  auto pen = std::make_shared<CLabPenController>();
-  mBus->Plug(pen);
+  const auto pen = std::dynamic_pointer_cast<CLabPenController>(
+      CLabProducts::Plug(*mBus, "classic-tablet").at(0));
   const CLabFlash before = pen->GetLoader().GetCpu(0);
   const SContinuousDataBlock image = LabImages::Record(0x08002000, 0x3000, 61);
   CTempFolder folder;
   const std::string path = folder.Write("lab.pen", SRecordText(image));
 
-  CLinuxUpdateController controller(std::make_unique<LabDiscovery>(mBus));
+  auto discovery = std::make_unique<CLinuxDiscovery>(
+      std::make_shared<CLabDeviceRegistry>(mBus),
+      [this] { return std::make_unique<CLabHidNode>(mBus); },
+      [this] { return std::make_unique<CLabUsbControl>(mBus); });
+  discovery->SetConfig(TAV_DATA_DIR "/fw_loader.ini");
+  CLinuxUpdateController controller(std::move(discovery));
   Recorder recorder;
   controller.RegisterCallback(&recorder);
   const int listener = mBus->AddListener([&](const SLabInterface& interface_I, bool attached_I) {
