@@ -66,6 +66,13 @@ class InterruptionCampaign : public LabFixture, public ::testing::WithParamInter
   std::filesystem::path mFolder;
 };
 
+std::vector<std::vector<uint8_t>> Blocks(const CLabFlash& flash_I) {
+  std::vector<std::vector<uint8_t>> blocks;
+  for (uint32_t i = 0; i < flash_I.GetBlockCount(); ++i)
+    blocks.push_back(flash_I.GetBlockContent(i));
+  return blocks;
+}
+
 TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
   const std::vector<SContinuousDataBlock> image{Record(0x08002100, 3 * 4096 + 200, 11),
                                                 Record(0x08009000, 300, 12)};
@@ -73,12 +80,7 @@ TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
 
   // The uninterrupted sequence: how many reports, and where the commits lie.
   std::shared_ptr<CLabPenController> pen = NewRun(false);
-  const std::vector<std::vector<uint8_t>> oldImage = [&] {
-    std::vector<std::vector<uint8_t>> blocks;
-    for (uint32_t i = 0; i < 12; ++i)
-      blocks.push_back(pen->GetLoader().GetCpu(0).GetBlockContent(i));
-    return blocks;
-  }();
+  const auto oldImage = Blocks(pen->GetLoader().GetCpu(0));
   const auto newImage = LabImages::Expected(pen->GetLoader().GetCpu(0), image);
   ASSERT_TRUE(RunUpdate(*pen, image).backToNormal);
   const uint64_t sequence = pen->GetReportCount();
@@ -109,8 +111,7 @@ TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
     // Power returns.
     pen = NewRun(true);
     const CLabFlash& flash = pen->GetLoader().GetCpu(0);
-    std::vector<std::vector<uint8_t>> content;
-    for (uint32_t i = 0; i < 12; ++i) content.push_back(flash.GetBlockContent(i));
+    const auto content = Blocks(flash);
     if (cut < firstCommit) {
       // Nothing was invalidated or erased yet: the old firmware runs.
       EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eNormal);
@@ -134,19 +135,16 @@ TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
     const LabSRecUpdate::SResult second = RunUpdate(*pen, image);
     EXPECT_TRUE(second.programmed && second.backToNormal);
     EXPECT_TRUE(pen->GetLoader().IsImageValid());
-    for (uint32_t i = 0; i < 12; ++i) {
-      EXPECT_EQ(pen->GetLoader().GetCpu(0).GetBlockContent(i), newImage[i]) << "block " << i;
-    }
+    EXPECT_EQ(Blocks(pen->GetLoader().GetCpu(0)), newImage);
     for (const std::string& violation : pen->GetViolations()) ADD_FAILURE() << violation;
     if (HasFailure()) break;
   }
 
-  std::printf(
-      "interruption points tried: %llu (old image kept %llu, left in loader %llu, "
-      "new image committed %llu)\n",
-      static_cast<unsigned long long>(sequence), static_cast<unsigned long long>(keptOld),
-      static_cast<unsigned long long>(leftInLoader), static_cast<unsigned long long>(keptNew));
+  // Where each cut left the board, for the test's report.
   RecordProperty("interruption_points", static_cast<int>(sequence));
+  RecordProperty("kept_old_image", static_cast<int>(keptOld));
+  RecordProperty("left_in_loader", static_cast<int>(leftInLoader));
+  RecordProperty("new_image_committed", static_cast<int>(keptNew));
   EXPECT_EQ(keptOld + leftInLoader + keptNew, sequence);
   EXPECT_GT(leftInLoader, sequence / 2);
 }
