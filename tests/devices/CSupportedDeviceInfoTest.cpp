@@ -270,43 +270,33 @@ TEST(CSupportedDeviceInfoTest, LookupsCompareOnlyTheSumAndListEveryKeyInOrder) {
   EXPECT_EQ(info.ToString(), "[32093]: [32094]: [32095]: ");
 }
 
-TEST(CSupportedDeviceInfoTest, UnreadableOrEmptyDocumentsGiveFalseAndAnEmptyMap) {
+TEST(CSupportedDeviceInfoTest, OnlyAnArrayOfProductsParsesAndEachParseStartsFromNothing) {
   LogCapture log;
   ConfigFile file;
   CSupportedDeviceInfo info;
   EXPECT_EQ(info.GetConfigPath(), "./fw_loader.ini");
   info.SetConfigPath(file.Path());
   EXPECT_FALSE(info.ParseConfig());  // missing
-
-  file.Write("[{\"name\": \"Slate\", ");
-  EXPECT_FALSE(info.ParseConfig());
-  file.Write("[]");
-  EXPECT_FALSE(info.ParseConfig());
-  file.Write(R"({"name": "Slate", "penBoard": {"pid": "300"}})");
-  EXPECT_FALSE(info.ParseConfig());
+  for (const char* text :
+       {"[{\"name\": \"Slate\", ", "[]", R"({"name": "Slate", "penBoard": {"pid": "300"}})"}) {
+    file.Write(text);
+    EXPECT_FALSE(info.ParseConfig()) << text;
+  }
   EXPECT_TRUE(log.LogContains("CastToArray got a map"));
   EXPECT_FALSE(info.IsValid());
 
-  file.Write(kTwoProducts);
-  ASSERT_TRUE(info.ParseConfig());
-  // A failed read afterwards empties the map: a parse starts from nothing.
-  fs::remove(file.Path());
-  EXPECT_FALSE(info.ParseConfig());
-  EXPECT_FALSE(info.IsValid());
-}
-
-TEST(CSupportedDeviceInfoTest, ElementsThatAreNoObjectsAreSkipped) {
-  LogCapture log;
-  ConfigFile file;
+  // Elements that are no objects are skipped, and reach no key.
   file.Write(R"([42, "text", null, [], {"name": "Slate", "penBoard": {"pid": "300"}}])");
-  CSupportedDeviceInfo info;
-  info.SetConfigPath(file.Path());
   ASSERT_TRUE(info.ParseConfig());
   EXPECT_EQ(info.GetAllDevices().size(), 1u);
   EXPECT_EQ(info.FindDevice(0x7A5D, 0x300).GetDeviceName(), "Slate");
   EXPECT_TRUE(log.LogContains("CastToMap got a integer"));
-  // Nothing of those elements reached the map under key 0.
   EXPECT_FALSE(info.FindDevice(0, 0).IsValid());
+
+  // A failed read afterwards empties the map.
+  fs::remove(file.Path());
+  EXPECT_FALSE(info.ParseConfig());
+  EXPECT_FALSE(info.IsValid());
 }
 
 TEST(CSupportedDeviceInfoTest, DiscoveryReadsTheConfigurationUntilOneReadGivesProducts) {

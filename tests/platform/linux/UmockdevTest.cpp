@@ -122,6 +122,7 @@ TEST_F(Umockdev, TouchControllerSwitchedOverLibusbAndUpdatedOnItsLoader) {
   EXPECT_TRUE(bulk.IsAlive());
   EXPECT_EQ(touch->GetTrace().back().bytes, (Bytes{0xC1, 0x01, 0, 0, 0, 0, 2, 0, 0x01, 0x00}));
   EXPECT_TRUE(bulk.InitEEPROM());
+  EXPECT_EQ(touch->GetTrace().back().bytes, (Bytes{0x41, 0xF5, 0xFF, 0xFF, 0, 0, 0, 0}));
   EXPECT_EQ(touch->GetEEPROMInits(), 1u);
   Bytes unknownRequest{0x41, 0x77, 0, 0, 0};
   EXPECT_FALSE(bulk.Write(unknownRequest)) << "a stalled control request";
