@@ -14,21 +14,15 @@
 #include "lab/CLabTouchHex.h"
 #include "platform/linux/CLinuxHIDFLDeviceInterface.h"
 #include "support/LabFixture.h"
+#include "support/LabImages.h"
 #include "support/RecordingNotifier.h"
 
 namespace {
 
 using Bytes = std::vector<uint8_t>;
 
-Bytes Pattern(size_t size_I, uint32_t seed_I) {
-  Bytes bytes(size_I);
-  uint32_t state = seed_I;
-  for (uint8_t& byte : bytes) {
-    state = state * 1664525u + 1013904223u;
-    byte = static_cast<uint8_t>(state >> 24);
-  }
-  return bytes;
-}
+// Bytes of a pattern that never holds 0xFF, so a blank byte is never data.
+Bytes Pattern(size_t size_I, uint32_t seed_I) { return LabImages::Record(0, size_I, seed_I).data; }
 
 // Intel-hex text of `data_I` from 0x8000, 16 bytes a record.
 std::string IntelHexText(const Bytes& data_I) {
