@@ -1,13 +1,12 @@
 #include <gtest/gtest.h>
-#include <unistd.h>
 
 #include <cstdio>
 #include <filesystem>
-#include <fstream>
 
 #include "devices/CDiscovery.h"
 #include "devices/CFakeInterface.h"
 #include "devices/CSupportedDeviceInfo.h"
+#include "firmware/FirmwareFiles.h"
 #include "settings/CSettingsArray.h"
 #include "settings/CSettingsMap.h"
 #include "support/LogCapture.h"
@@ -45,20 +44,10 @@ CDevice Product(const std::string& json_I) {
       CSettingsMap::CastToMap(CSettingsObject::ReadFromJSONBuffer(json_I), false));
 }
 
-// A configuration file of its own for each test, removed afterwards.
-class ConfigFile {
- public:
-  ConfigFile() {
-    mPath = fs::temp_directory_path() /
-            ("fw_loader-" + std::to_string(getpid()) + "-" +
-             ::testing::UnitTest::GetInstance()->current_test_info()->name() + ".ini");
-  }
-  ~ConfigFile() { fs::remove(mPath); }
-  void Write(const std::string& text_I) const { std::ofstream(mPath) << text_I; }
-  std::string Path() const { return mPath.string(); }
-
- private:
-  fs::path mPath;
+// A configuration file in a folder of the test's own, removed afterwards.
+struct ConfigFile : CTempFolder {
+  void Write(const std::string& text_I) const { CTempFolder::Write("fw_loader.ini", text_I); }
+  std::string Path() const { return CTempFolder::Path("fw_loader.ini"); }
 };
 
 constexpr const char* kTwoProducts = R"([

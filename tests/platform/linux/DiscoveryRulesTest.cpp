@@ -2,19 +2,15 @@
 // it: the search criteria, the roles, the parent test and reconciliation.
 
 #include <gtest/gtest.h>
-#include <unistd.h>
-
-#include <filesystem>
-#include <fstream>
 
 #include "devices/IOUtils.h"
+#include "firmware/FirmwareFiles.h"
 #include "platform/linux/CLinuxDiscovery.h"
 #include "platform/linux/CLinuxHIDFLDeviceInterface.h"
 #include "support/LogCapture.h"
 
 namespace {
 
-namespace fs = std::filesystem;
 using DevicePtr = std::shared_ptr<CDevice>;
 
 class CListedRegistry : public CDeviceRegistry {
@@ -50,15 +46,8 @@ uint32_t BehindHub(unsigned port_I) { return 0x01100000u | (port_I << 16); }
 
 class DiscoveryRules : public ::testing::Test {
  protected:
-  DiscoveryRules()
-      : mConfig(fs::temp_directory_path() /
-                ("rules-" + std::to_string(getpid()) + "-" +
-                 ::testing::UnitTest::GetInstance()->current_test_info()->name() + ".ini")) {}
-  ~DiscoveryRules() override { fs::remove(mConfig); }
-
   std::vector<DevicePtr> Scan(const std::string& config_I) {
-    std::ofstream(mConfig) << config_I;
-    mDiscovery.SetConfig(mConfig.string());
+    mDiscovery.SetConfig(mFolder.Write("fw_loader.ini", config_I));
     EXPECT_TRUE(mDiscovery.GenerateDeviceList());
     const CDeviceList list = mDiscovery.GetDeviceList();
     std::vector<DevicePtr> devices;
@@ -66,7 +55,7 @@ class DiscoveryRules : public ::testing::Test {
     return devices;
   }
 
-  fs::path mConfig;
+  CTempFolder mFolder;
   std::shared_ptr<CListedRegistry> mRegistry = std::make_shared<CListedRegistry>();
   CLinuxDiscovery mDiscovery{mRegistry, nullptr, nullptr};
 };
