@@ -8,6 +8,7 @@
 #include <cstdlib>
 #include <filesystem>
 
+#include "firmware/FirmwareFiles.h"
 #include "lab/CLabPenController.h"
 #include "support/LabFixture.h"
 #include "support/LabImages.h"
@@ -26,17 +27,6 @@ SLabPenDescription SmallPen(ELabProtocol protocol_I) {
 
 class InterruptionCampaign : public LabFixture, public ::testing::WithParamInterface<ELabProtocol> {
  protected:
-  void SetUp() override {
-    LabFixture::SetUp();
-    mFolder = std::filesystem::temp_directory_path() /
-              ("tavik-campaign-" + std::to_string(::getpid()) + "-" +
-               std::to_string(GetParam() == ELabProtocol::eLoader ? 0 : 1));
-  }
-  void TearDown() override {
-    std::filesystem::remove_all(mFolder);
-    LabFixture::TearDown();
-  }
-
   EFLProtocolType Protocol() const {
     return GetParam() == ELabProtocol::eNonBL ? EFL_PROTOCOL_NON_BL : EFL_PROTOCOL_LOADER;
   }
@@ -48,7 +38,7 @@ class InterruptionCampaign : public LabFixture, public ::testing::WithParamInter
     auto pen = std::make_shared<CLabPenController>(SmallPen(GetParam()));
     mBus->Plug(pen);
     if (fromFolder_I) {
-      EXPECT_EQ(mBus->LoadState(mFolder.string()), 1);
+      EXPECT_EQ(mBus->LoadState(mFolder), 1);
     }
     return pen;
   }
@@ -63,7 +53,8 @@ class InterruptionCampaign : public LabFixture, public ::testing::WithParamInter
     return update.Run(image_I);
   }
 
-  std::filesystem::path mFolder;
+  CTempFolder mTemp;
+  const std::string mFolder = mTemp.Path("state");
 };
 
 std::vector<std::vector<uint8_t>> Blocks(const CLabFlash& flash_I) {
@@ -106,7 +97,7 @@ TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
     pen->Faults().Add({ELabFaultKind::eVanish, static_cast<uint32_t>(cut), ""});
     EXPECT_FALSE(RunUpdate(*pen, image).backToNormal);
     ASSERT_TRUE(pen->IsUnplugged());
-    ASSERT_TRUE(mBus->SaveState(mFolder.string()));
+    ASSERT_TRUE(mBus->SaveState(mFolder));
 
     // Power returns.
     pen = NewRun(true);
