@@ -1,4 +1,3 @@
-#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include "support/LogCapture.h"
@@ -34,31 +33,20 @@ std::string FindPrinting(const CDeviceList& list_I, const std::string& path_I,
 
 }  // namespace
 
-TEST(CDeviceListTest, EmptyListFindsNothing) {
-  CDeviceList list;
-  EXPECT_EQ(list.GetDeviceCount(), 0u);
-  EXPECT_EQ(list.GetBestDevice(), nullptr);
-  EXPECT_EQ(list.GetDevice(0u), nullptr);
-  EXPECT_EQ(list.GetDevice("31325:768:1:2:13"), nullptr);
-  EXPECT_EQ(list.GetDevice(static_cast<unsigned short>(0), static_cast<unsigned short>(0)),
-            nullptr);
-  EXPECT_EQ(list.ToString(), "");
-}
-
 TEST(CDeviceListTest, BestDeviceIsTheFirstLoaderElseTheFirst) {
   CDeviceList list;
+  EXPECT_EQ(list.GetBestDevice(), nullptr);
+  EXPECT_EQ(list.GetDevice(0u), nullptr);
+  EXPECT_EQ(list.ToString(), "");
   auto first = MakeDevice("a", 1);
   auto second = MakeDevice("b", 2);
   auto third = MakeDevice("c", 3);
-  list.AddDevice(first);
-  list.AddDevice(second);
-  list.AddDevice(third);
+  for (const auto& device : {first, second, third}) list.AddDevice(device);
   EXPECT_EQ(list.GetBestDevice(), first);
   third->SetIsFlashLoader(true);
   EXPECT_EQ(list.GetBestDevice(), third);
   second->SetIsFlashLoader(true);
   EXPECT_EQ(list.GetBestDevice(), second);
-
   EXPECT_EQ(list.GetDevice(2u), third);
   EXPECT_EQ(list.GetDevice(3u), nullptr);
   // Copies share the devices.
@@ -96,7 +84,9 @@ TEST(CDeviceListTest, FindsByInterfacePathPrintingEveryComparison) {
   device->SetTouchInterface(CFakeInterface::Make("31325:769:19922944:1:65280"));
   device->SetBluetoothInterface(CFakeInterface::Make("31325:770:19922944:1:65281"));
   CDeviceList list;
+  list.AddDevice(MakeDevice("no interface", 2));
   list.AddDevice(device);
+  EXPECT_EQ(list.ToString(), "\n" + device->ToString() + "\n");
 
   std::shared_ptr<CDevice> found;
   EXPECT_EQ(FindPrinting(list, "31325:769:19922944:1:65280", found),
@@ -116,38 +106,34 @@ TEST(CDeviceListTest, FindsAScalarByVendorAndProductWith4192And4195Interchangeab
   CDeviceList list;
   list.AddDevice(display);
 
-  std::shared_ptr<CDevice> found;
   const std::string vendor = std::to_string(0x5B27);
-  FindPrinting(list, vendor + ":4192:0:10:65280", found);
-  EXPECT_EQ(found, display);
-  FindPrinting(list, vendor + ":4195", found);
-  EXPECT_EQ(found, display);
-  FindPrinting(list, vendor + ":4196", found);
-  EXPECT_EQ(found, nullptr);
-  FindPrinting(list, "1:4192", found);
-  EXPECT_EQ(found, nullptr);
-  display->SetScalarProductId(4195);
-  FindPrinting(list, vendor + ":4192", found);
-  EXPECT_EQ(found, display);
-  // Fewer than two numbers cannot name a scalar.
-  FindPrinting(list, vendor, found);
-  EXPECT_EQ(found, nullptr);
+  const struct {
+    uint32_t scalarProduct;
+    std::string path;
+    bool found;
+  } cases[] = {
+      {4192, vendor + ":4192:0:10:65280", true},
+      {4192, vendor + ":4195", true},
+      {4192, vendor + ":4196", false},
+      {4192, "1:4192", false},
+      {4195, vendor + ":4192", true},
+      {4195, vendor, false},  // fewer than two numbers cannot name a scalar
+  };
+  for (const auto& entry : cases) {
+    SCOPED_TRACE(entry.path);
+    display->SetScalarProductId(entry.scalarProduct);
+    std::shared_ptr<CDevice> found;
+    FindPrinting(list, entry.path, found);
+    EXPECT_EQ(found, entry.found ? display : nullptr);
+  }
 
-  // A path that is not numbers reaches the caller as the conversion's error.
+  // A path that is not numbers reaches the caller as the conversion's error,
+  // unless no device has a scalar to convert it for.
   testing::internal::CaptureStdout();
   EXPECT_THROW(list.GetDevice("pen:x"), std::invalid_argument);
   testing::internal::GetCapturedStdout();
-  // A device without a scalar never converts.
   display->SetScalarSupported(false);
+  std::shared_ptr<CDevice> found;
   FindPrinting(list, "pen:x", found);
   EXPECT_EQ(found, nullptr);
-}
-
-TEST(CDeviceListTest, ToStringJoinsTheDevicesTexts) {
-  auto withPen = MakeDevice("a", 1);
-  withPen->SetPenInterface(CFakeInterface::Make("p"));
-  CDeviceList list;
-  list.AddDevice(MakeDevice("no interface", 2));
-  list.AddDevice(withPen);
-  EXPECT_EQ(list.ToString(), "\n" + withPen->ToString() + "\n");
 }

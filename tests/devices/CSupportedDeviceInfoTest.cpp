@@ -1,12 +1,12 @@
 #include <gtest/gtest.h>
-#include <unistd.h>
 
+#include <cstdio>
 #include <filesystem>
-#include <fstream>
 
 #include "devices/CDiscovery.h"
 #include "devices/CFakeInterface.h"
 #include "devices/CSupportedDeviceInfo.h"
+#include "firmware/FirmwareFiles.h"
 #include "settings/CSettingsArray.h"
 #include "settings/CSettingsMap.h"
 #include "support/LogCapture.h"
@@ -15,13 +15,28 @@ namespace {
 
 namespace fs = std::filesystem;
 
-constexpr const char* kTypeWarning = "CSettingsMap::ObjectForKey got a";
-
 std::shared_ptr<CSettingsArray> Products(const std::string& json_I) {
   auto array = CSettingsArray::CastToArray(CSettingsObject::ReadFromJSONBuffer(json_I), false);
   EXPECT_NE(array, nullptr) << json_I;
   return array;
 }
+
+// One board's identity in one line: vendor:product (hex), interface,
+// topology, usage/page (hex), sectors (hex) and update file.
+std::string BoardText(uint32_t vendor_I, uint32_t product_I, EINTERFACE_TYPE type_I,
+                      unsigned topology_I, uint32_t usage_I, uint32_t page_I, uint32_t sectors_I,
+                      const std::string& update_I) {
+  static const char* const kTypes[] = {"INVALID", "HID", "BULK", "I2C", "FTDI"};
+  char text[96];
+  std::snprintf(text, sizeof(text), "%X:%X %s top%u %X/%X s%X ", vendor_I, product_I,
+                kTypes[type_I], topology_I, usage_I, page_I, sectors_I);
+  return text + ("'" + update_I + "'");
+}
+#define BOARD(device_I, Board)                                                         \
+  BoardText((device_I).Get##Board##VendorId(), (device_I).Get##Board##ProductId(),     \
+            (device_I).Get##Board##InterfaceType(), (device_I).Get##Board##Topology(), \
+            (device_I).Get##Board##UsageId(), (device_I).Get##Board##UsagePage(),      \
+            (device_I).Get##Board##FlashSectors(), (device_I).Get##Board##Update())
 
 CDevice Product(const std::string& json_I) {
   CSupportedDeviceInfo info;
@@ -29,20 +44,10 @@ CDevice Product(const std::string& json_I) {
       CSettingsMap::CastToMap(CSettingsObject::ReadFromJSONBuffer(json_I), false));
 }
 
-// A configuration file of its own for each test, removed afterwards.
-class ConfigFile {
- public:
-  ConfigFile() {
-    mPath = fs::temp_directory_path() /
-            ("fw_loader-" + std::to_string(getpid()) + "-" +
-             ::testing::UnitTest::GetInstance()->current_test_info()->name() + ".ini");
-  }
-  ~ConfigFile() { fs::remove(mPath); }
-  void Write(const std::string& text_I) const { std::ofstream(mPath) << text_I; }
-  std::string Path() const { return mPath.string(); }
-
- private:
-  fs::path mPath;
+// A configuration file in a folder of the test's own, removed afterwards.
+struct ConfigFile : CTempFolder {
+  void Write(const std::string& text_I) const { CTempFolder::Write("fw_loader.ini", text_I); }
+  std::string Path() const { return CTempFolder::Path("fw_loader.ini"); }
 };
 
 constexpr const char* kTwoProducts = R"([
@@ -55,32 +60,23 @@ constexpr const char* kTwoProducts = R"([
 TEST(CSupportedDeviceInfoTest, BoardsLeftOutKeepTheDeviceDefaultsAndBoardsGivenTakeTheirOwn) {
   CDevice onlyPid = Product(R"({"name": "Slate", "penBoard": {"pid": "300"}})");
   EXPECT_EQ(onlyPid.GetDeviceName(), "Slate");
-  EXPECT_EQ(onlyPid.GetPenVendorId(), 0x7A5Du);
-  EXPECT_EQ(onlyPid.GetPenProductId(), 0x300u);
-  EXPECT_EQ(onlyPid.GetPenInterfaceType(), EHID_INTERFACE);
-  EXPECT_EQ(onlyPid.GetPenTopology(), 1);
-  EXPECT_EQ(onlyPid.GetPenUsageId(), 0u);
+  EXPECT_EQ(BOARD(onlyPid, Pen), "7A5D:300 HID top1 0/0 s0 ''");
   EXPECT_TRUE(onlyPid.getPenIntoBLMode());
   EXPECT_FALSE(onlyPid.GetIsFlashLoader());
   // Boards left out are not supported and keep the device's zero identity.
   EXPECT_FALSE(onlyPid.GetTouchSupported());
   EXPECT_FALSE(onlyPid.GetScalarSupported());
-  EXPECT_EQ(onlyPid.GetScalarVendorId(), 0u);
-  EXPECT_EQ(onlyPid.GetScalarInterfaceType(), EINVALID_INTERFACE);
+  EXPECT_EQ(BOARD(onlyPid, Scalar), "0:0 INVALID top1 0/0 s0 ''");
 
   CDevice empties = Product(R"({"name": "Panel", "touchBoard": {}, "bluetoothBoard": {},
                                 "scalarBoard": {}})");
   EXPECT_TRUE(empties.GetTouchSupported());
   EXPECT_TRUE(empties.GetScalarSupported());
-  EXPECT_EQ(empties.GetTouchVendorId(), 0x7A5Du);
-  EXPECT_EQ(empties.GetBluetoothInterfaceType(), EHID_INTERFACE);
-  EXPECT_EQ(empties.GetScalarVendorId(), 0x5B27u);
-  EXPECT_EQ(empties.GetScalarInterfaceType(), EFTDI_INTERFACE);
-  EXPECT_EQ(empties.GetScalarUsageId(), 0xAu);
-  EXPECT_EQ(empties.GetScalarUsagePage(), 0xFF00u);
+  EXPECT_EQ(BOARD(empties, Touch), "7A5D:0 HID top1 0/0 s0 ''");
+  EXPECT_EQ(BOARD(empties, Bluetooth), "7A5D:0 HID top1 0/0 s0 ''");
+  EXPECT_EQ(BOARD(empties, Scalar), "5B27:0 FTDI top1 A/FF00 s0 ''");
   // No pen board: the pen members stay as a default device has them.
-  EXPECT_EQ(empties.GetPenVendorId(), 0u);
-  EXPECT_EQ(empties.GetPenInterfaceType(), EINVALID_INTERFACE);
+  EXPECT_EQ(BOARD(empties, Pen), "0:0 INVALID top1 0/0 s0 ''");
 
   CDevice full = Product(R"({"name": "Full",
     "penBoard": {"vid": "1234", "pid": "56", "interface": "BULK", "sectors": 74565,
@@ -91,21 +87,12 @@ TEST(CSupportedDeviceInfoTest, BoardsLeftOutKeepTheDeviceDefaultsAndBoardsGivenT
     "scalarBoard": {"vid": "0x1111", "pid": "1060", "interface": "HID", "sectors": 64,
                     "quantaScalarBoard": true, "qisdaVenusScalarBoard": true,
                     "update": "full.bin", "usageId": "2", "usagePg": "FF01"}})");
-  EXPECT_EQ(full.GetPenVendorId(), 0x1234u);
-  EXPECT_EQ(full.GetPenInterfaceType(), EBULK_INTERFACE);
-  EXPECT_EQ(full.GetPenFlashSectors(), 0x2345u);  // low 16 bits of 0x12345
-  EXPECT_EQ(full.GetPenTopology(), 2);            // low 8 bits of 0x102
-  EXPECT_EQ(full.GetPenUsagePage(), 0xFF0Du);
-  EXPECT_EQ(full.GetPenUpdate(), "full.pen");
-  EXPECT_EQ(full.GetTouchInterfaceType(), EI2C_INTERFACE);
-  EXPECT_EQ(full.GetTouchTopology(), 3);
-  EXPECT_EQ(full.GetScalarVendorId(), 0x1111u);
-  EXPECT_EQ(full.GetScalarInterfaceType(), EHID_INTERFACE);
+  // Sectors keep their low 16 bits (0x12345), the topology its low 8 (0x102).
+  EXPECT_EQ(BOARD(full, Pen), "1234:56 BULK top2 1/FF0D s2345 'full.pen'");
+  EXPECT_EQ(BOARD(full, Touch), "7A5D:57 I2C top3 0/0 s9 'full.hex'");
+  EXPECT_EQ(BOARD(full, Scalar), "1111:1060 HID top1 2/FF01 s40 'full.bin'");
   EXPECT_TRUE(full.GetIsQuantaScalarBoard());
   EXPECT_TRUE(full.GetIsQisdaVenusScalarBoard());
-  EXPECT_EQ(full.GetScalarUpdate(), "full.bin");
-  EXPECT_EQ(full.GetScalarUsagePage(), 0xFF01u);
-
   // init is only visible in the device's text, which needs a pen interface.
   full.SetPenInterface(CFakeInterface::Make("1:2:3:4:5"));
   EXPECT_NE(full.ToString().find("\tInit Eeprom = YES\n"), std::string::npos);
@@ -118,43 +105,30 @@ TEST(CSupportedDeviceInfoTest, ValuesOfTheWrongJsonTypeWarnAndFallBackToTheBoard
                  "topology": 2.5, "usageId": 1, "update": 7, "intoBLMode": "no"},
     "scalarBoard": {"vid": 4660, "usagePg": 65281, "quantaScalarBoard": 1},
     "touchBoard": "not an object"})");
-  EXPECT_EQ(device.GetPenVendorId(), 0x7A5Du);
-  EXPECT_EQ(device.GetPenProductId(), 0u);
-  EXPECT_EQ(device.GetPenInterfaceType(), EHID_INTERFACE);
-  EXPECT_EQ(device.GetPenFlashSectors(), 0u);
-  EXPECT_EQ(device.GetPenTopology(), 1);
-  EXPECT_EQ(device.GetPenUsageId(), 0u);
-  EXPECT_EQ(device.GetPenUpdate(), "");
+  EXPECT_EQ(BOARD(device, Pen), "7A5D:0 HID top1 0/0 s0 ''");
   EXPECT_TRUE(device.getPenIntoBLMode());
-  EXPECT_EQ(device.GetScalarVendorId(), 0x5B27u);
-  EXPECT_EQ(device.GetScalarUsagePage(), 0xFF00u);
+  EXPECT_EQ(BOARD(device, Scalar), "5B27:0 FTDI top1 A/FF00 s0 ''");
   EXPECT_FALSE(device.GetIsQuantaScalarBoard());
   // A board key holding no object is a board left out.
   EXPECT_FALSE(device.GetTouchSupported());
-  EXPECT_TRUE(log.LogContains(std::string(kTypeWarning) + " integer and failed to cast to "
-                                                          "CSettingsString"));
-  EXPECT_TRUE(log.LogContains(std::string(kTypeWarning) + " string and failed to cast to "
-                                                          "CSettingsInteger"));
-  EXPECT_TRUE(log.LogContains(std::string(kTypeWarning) + " string and failed to cast to "
-                                                          "CSettingsBool"));
-  EXPECT_TRUE(log.LogContains(std::string(kTypeWarning) + " string and failed to cast to "
-                                                          "CSettingsMap"));
+  for (const char* warning : {" integer and failed to cast to CSettingsString",
+                              " string and failed to cast to CSettingsInteger",
+                              " string and failed to cast to CSettingsBool",
+                              " string and failed to cast to CSettingsMap"}) {
+    EXPECT_TRUE(log.LogContains(std::string("CSettingsMap::ObjectForKey got a") + warning));
+  }
 }
 
 TEST(CSupportedDeviceInfoTest, EveryBoardTakesTheIntoBootloaderFlagOfThePenBoard) {
   // The touch board's own flag has no effect.
   CDevice touchOnly = Product(R"({"name": "A", "penBoard": {"pid": "1"},
                                   "touchBoard": {"pid": "2", "intoBLMode": false}})");
-  EXPECT_TRUE(touchOnly.getPenIntoBLMode());
   EXPECT_EQ(touchOnly.GetProtocolType(), EFL_PROTOCOL_LOADER);
-
   CDevice penFalse = Product(R"({"name": "B", "penBoard": {"pid": "1", "intoBLMode": false},
                                  "touchBoard": {"pid": "2", "intoBLMode": true},
                                  "scalarBoard": {"pid": "3", "sectors": 5}})");
-  EXPECT_FALSE(penFalse.getPenIntoBLMode());
   EXPECT_FALSE(penFalse.CanGoIntoBootloaderMode());
   EXPECT_EQ(penFalse.GetProtocolType(), EFL_PROTOCOL_NON_BL);
-
   // No pen board to read it from: the other boards are read as able to go
   // into their loader, and nothing breaks.
   CDevice noPen = Product(R"({"name": "C", "touchBoard": {"pid": "2"},
@@ -166,9 +140,7 @@ TEST(CSupportedDeviceInfoTest, EveryBoardTakesTheIntoBootloaderFlagOfThePenBoard
 TEST(CSupportedDeviceInfoTest, LoaderBoardReplacesThePenIdentityButNotItsFileOrFlag) {
   CDevice alone = Product(R"({"name": "Slate", "loaderBoard": {"pid": "95"}})");
   EXPECT_TRUE(alone.GetIsFlashLoader());
-  EXPECT_EQ(alone.GetPenVendorId(), 0x7A5Du);
-  EXPECT_EQ(alone.GetPenProductId(), 0x95u);
-  EXPECT_EQ(alone.GetPenInterfaceType(), EHID_INTERFACE);
+  EXPECT_EQ(BOARD(alone, Pen), "7A5D:95 HID top1 0/0 s0 ''");
 
   CDevice beside = Product(R"({"name": "Slate",
     "penBoard": {"pid": "300", "interface": "HID", "sectors": 12, "topology": 2,
@@ -176,16 +148,9 @@ TEST(CSupportedDeviceInfoTest, LoaderBoardReplacesThePenIdentityButNotItsFileOrF
                  "intoBLMode": false},
     "loaderBoard": {"pid": "95", "interface": "BULK", "update": "ignored.pen"}})");
   EXPECT_TRUE(beside.GetIsFlashLoader());
-  EXPECT_EQ(beside.GetPenProductId(), 0x95u);
-  EXPECT_EQ(beside.GetPenInterfaceType(), EBULK_INTERFACE);
   // Every identity key is overwritten, by its default where the loader
-  // leaves it out.
-  EXPECT_EQ(beside.GetPenFlashSectors(), 0u);
-  EXPECT_EQ(beside.GetPenTopology(), 1);
-  EXPECT_EQ(beside.GetPenUsageId(), 0u);
-  EXPECT_EQ(beside.GetPenUsagePage(), 0u);
-  // The file and the into-bootloader flag are the pen board's.
-  EXPECT_EQ(beside.GetPenUpdate(), "slate.pen");
+  // leaves it out; the file and the into-bootloader flag are the pen board's.
+  EXPECT_EQ(BOARD(beside, Pen), "7A5D:95 BULK top1 0/0 s0 'slate.pen'");
   EXPECT_FALSE(beside.getPenIntoBLMode());
 }
 
@@ -243,35 +208,32 @@ TEST(CSupportedDeviceInfoTest, LaterElementsWinCollisionsAndScalarSectorsNeverRe
   EXPECT_TRUE(info.ParseDevices(nullptr).empty());
 }
 
-TEST(CSupportedDeviceInfoTest, HexTextsFollowTheStreamRules) {
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("7A5D", 1), 0x7A5Du);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("0x7a5d", 1), 0x7A5Du);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("0X7A5D", 1), 0x7A5Du);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam(" 1f", 1), 0x1Fu);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("12zz", 1), 0x12u);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("FFFFFFFF", 1), 0xFFFFFFFFu);
-  // No leading digit reads as 0; nothing at all, or blanks alone, keep the default.
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("zz", 1), 0u);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("", 0x5B27), 0x5B27u);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam("   ", 0x5B27), 0x5B27u);
+TEST(CSupportedDeviceInfoTest, HexTextsFollowTheStreamRulesAndInterfaceWordsAreExact) {
+  const std::pair<const char*, uint32_t> hex[] = {
+      {"7A5D", 0x7A5D}, {"0x7a5d", 0x7A5D},       {"0X7A5D", 0x7A5D}, {" 1f", 0x1F},
+      {"12zz", 0x12},   {"FFFFFFFF", 0xFFFFFFFF}, {"zz", 0},  // no leading digit reads as 0
+      {"", 0x5B27},     {"   ", 0x5B27}};                     // nothing at all keeps the default
+  for (const auto& [text, value] : hex) {
+    EXPECT_EQ(CSupportedDeviceInfo::ConvertHexParam(text, 0x5B27), value) << '"' << text << '"';
+  }
+  const struct {
+    const char* text;
+    EINTERFACE_TYPE fallback, expected;
+  } words[] = {
+      {"HID", EFTDI_INTERFACE, EHID_INTERFACE},    {"BULK", EHID_INTERFACE, EBULK_INTERFACE},
+      {"I2C", EHID_INTERFACE, EI2C_INTERFACE},     {"FTDI", EHID_INTERFACE, EFTDI_INTERFACE},
+      {"", EFTDI_INTERFACE, EFTDI_INTERFACE},      {"hid", EHID_INTERFACE, EINVALID_INTERFACE},
+      {"HID ", EHID_INTERFACE, EINVALID_INTERFACE}};
+  for (const auto& word : words) {
+    EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam(word.text, word.fallback), word.expected)
+        << '"' << word.text << '"';
+  }
 
-  CDevice device =
-      Product(R"({"name": "A", "penBoard": {"vid": "zz"}, "scalarBoard": {"vid": ""}})");
+  CDevice device = Product(R"({"name": "A", "penBoard": {"vid": "zz", "interface": "hid"},
+                               "scalarBoard": {"vid": ""}})");
   EXPECT_EQ(device.GetPenVendorId(), 0u);
+  EXPECT_EQ(device.GetPenInterfaceType(), EINVALID_INTERFACE);
   EXPECT_EQ(device.GetScalarVendorId(), 0x5B27u);
-}
-
-TEST(CSupportedDeviceInfoTest, InterfaceWordsAreExactAndUnknownWordsAreInvalid) {
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("HID", EFTDI_INTERFACE), EHID_INTERFACE);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("BULK", EHID_INTERFACE), EBULK_INTERFACE);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("I2C", EHID_INTERFACE), EI2C_INTERFACE);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("FTDI", EHID_INTERFACE), EFTDI_INTERFACE);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("", EFTDI_INTERFACE), EFTDI_INTERFACE);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("hid", EHID_INTERFACE), EINVALID_INTERFACE);
-  EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam("HID ", EHID_INTERFACE),
-            EINVALID_INTERFACE);
-  EXPECT_EQ(Product(R"({"name": "A", "penBoard": {"interface": "hid"}})").GetPenInterfaceType(),
-            EINVALID_INTERFACE);
 }
 
 TEST(CSupportedDeviceInfoTest, LookupsCompareOnlyTheSumAndListEveryKeyInOrder) {
@@ -297,43 +259,33 @@ TEST(CSupportedDeviceInfoTest, LookupsCompareOnlyTheSumAndListEveryKeyInOrder) {
   EXPECT_EQ(info.ToString(), "[32093]: [32094]: [32095]: ");
 }
 
-TEST(CSupportedDeviceInfoTest, UnreadableOrEmptyDocumentsGiveFalseAndAnEmptyMap) {
+TEST(CSupportedDeviceInfoTest, OnlyAnArrayOfProductsParsesAndEachParseStartsFromNothing) {
   LogCapture log;
   ConfigFile file;
   CSupportedDeviceInfo info;
   EXPECT_EQ(info.GetConfigPath(), "./fw_loader.ini");
   info.SetConfigPath(file.Path());
   EXPECT_FALSE(info.ParseConfig());  // missing
-
-  file.Write("[{\"name\": \"Slate\", ");
-  EXPECT_FALSE(info.ParseConfig());
-  file.Write("[]");
-  EXPECT_FALSE(info.ParseConfig());
-  file.Write(R"({"name": "Slate", "penBoard": {"pid": "300"}})");
-  EXPECT_FALSE(info.ParseConfig());
+  for (const char* text :
+       {"[{\"name\": \"Slate\", ", "[]", R"({"name": "Slate", "penBoard": {"pid": "300"}})"}) {
+    file.Write(text);
+    EXPECT_FALSE(info.ParseConfig()) << text;
+  }
   EXPECT_TRUE(log.LogContains("CastToArray got a map"));
   EXPECT_FALSE(info.IsValid());
 
-  file.Write(kTwoProducts);
-  ASSERT_TRUE(info.ParseConfig());
-  // A failed read afterwards empties the map: a parse starts from nothing.
-  fs::remove(file.Path());
-  EXPECT_FALSE(info.ParseConfig());
-  EXPECT_FALSE(info.IsValid());
-}
-
-TEST(CSupportedDeviceInfoTest, ElementsThatAreNoObjectsAreSkipped) {
-  LogCapture log;
-  ConfigFile file;
+  // Elements that are no objects are skipped, and reach no key.
   file.Write(R"([42, "text", null, [], {"name": "Slate", "penBoard": {"pid": "300"}}])");
-  CSupportedDeviceInfo info;
-  info.SetConfigPath(file.Path());
   ASSERT_TRUE(info.ParseConfig());
   EXPECT_EQ(info.GetAllDevices().size(), 1u);
   EXPECT_EQ(info.FindDevice(0x7A5D, 0x300).GetDeviceName(), "Slate");
   EXPECT_TRUE(log.LogContains("CastToMap got a integer"));
-  // Nothing of those elements reached the map under key 0.
   EXPECT_FALSE(info.FindDevice(0, 0).IsValid());
+
+  // A failed read afterwards empties the map.
+  fs::remove(file.Path());
+  EXPECT_FALSE(info.ParseConfig());
+  EXPECT_FALSE(info.IsValid());
 }
 
 TEST(CSupportedDeviceInfoTest, DiscoveryReadsTheConfigurationUntilOneReadGivesProducts) {

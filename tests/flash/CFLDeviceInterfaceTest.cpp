@@ -113,7 +113,7 @@ TEST_F(DeviceInterfaceBase, ProgramBoardRefusesFormatsItCannotProgram) {
   EXPECT_TRUE(mDevice.writes.empty());
 }
 
-TEST_F(DeviceInterfaceBase, IdentityAccessors) {
+TEST_F(DeviceInterfaceBase, PathCpuAndBlockLimitFollowLocationAndFormat) {
   mDevice.SetLocation(0x14200000);
   EXPECT_EQ(mDevice.GetPath(), "337641472");
   EXPECT_EQ(mDevice.GetLocation(), 0x14200000u);
@@ -134,11 +134,6 @@ TEST_F(DeviceInterfaceBase, IdentityAccessors) {
   EXPECT_FALSE(mDevice.ValidBlockIndex(39));
   mDevice.SetDataSourceFormat(EDS_SREC_GENERIC);
   EXPECT_TRUE(mDevice.ValidBlockIndex(39));
-
-  mDevice.UpdateChecksums(1, 2, 3);
-  EXPECT_EQ(mDevice.GetOldChecksum(), 1u);
-  EXPECT_EQ(mDevice.GetNewChecksum(), 2u);
-  EXPECT_EQ(mDevice.GetFWChecksum(), 3u);
 
   const std::string text = mDevice.ToString();
   EXPECT_NE(text.find("\tFirmware Loader = YES\n"), std::string::npos);
@@ -294,15 +289,13 @@ TEST_F(DeviceInterfaceBase, CommandsNeedAnOpenLoaderAndTheirSizes) {
   EXPECT_TRUE(mDevice.reads.empty());
 }
 
-TEST(FLProtocol, ReportIdsOfBothProtocolTypes) {
+// The ids on the wire are checked report by report in FLProtWireTest; here
+// the ones no loader command sends, and the fall-backs.
+TEST(FLProtocol, IdsOutsideTheLoaderCommands) {
   LogCapture capture;
   std::shared_ptr<CFLProtocol> protocol = CFLProtocol::GetInstance();
   protocol->SetProtocolType(EFL_PROTOCOL_LOADER);
   EXPECT_FALSE(protocol->IsNonBLProtocol());
-  EXPECT_EQ(protocol->GetCommand(eBL_HID_REP_READ_DATA_ID), 0x10);
-  EXPECT_EQ(protocol->GetCommand(eBL_HID_REP_RESET_CPU_SAVE_ID), 0x15);
-  EXPECT_EQ(protocol->GetCommand(eBL_HID_REP_RESET_CPU_ID), 0x15);
-  EXPECT_EQ(protocol->GetCommand(eBL_HID_REP_GET_TOTAL_CPUS_ID), 0x22);
   EXPECT_EQ(protocol->GetCommand(eBL_HID_REP_PROGRAMMING_ID), 0);
   EXPECT_TRUE(
       capture.AssertionContains("eBL_HID_REP_PROGRAMMING_ID NOT SUPPORTED FOR CURRENT PROTOCOL"));
@@ -312,9 +305,6 @@ TEST(FLProtocol, ReportIdsOfBothProtocolTypes) {
   protocol->SetProtocolType(EFL_PROTOCOL_NON_BL);
   EXPECT_TRUE(protocol->IsNonBLProtocol());
   EXPECT_EQ(protocol->GetCommand(eBL_HID_REP_NOT_USED_ID), 0xD0);
-  EXPECT_EQ(protocol->GetCommand(eBL_HID_REP_RESET_CPU_SAVE_ID), 0xD6);
-  EXPECT_EQ(protocol->GetCommand(eBL_HID_REP_RESET_CPU_ID), 0xCD);
-  EXPECT_EQ(protocol->GetCommand(eBL_HID_REP_WRITE_WORD_ID), 0xD7);
   EXPECT_EQ(protocol->GetCommand(eBL_HID_REP_PROGRAMMING_ID), 0xE4);
 
   // Anything but the non-BL value speaks the loader protocol.

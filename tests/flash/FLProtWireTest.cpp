@@ -21,46 +21,12 @@ struct SIds {
       cpuCount, readData;
 };
 
-constexpr SIds kLoaderIds{EFL_PROTOCOL_LOADER,
-                          0x12,
-                          0x13,
-                          0x14,
-                          0x15,
-                          0x15,
-                          0x16,
-                          0x11,
-                          0x17,
-                          0x18,
-                          0x19,
-                          0x1A,
-                          0x1B,
-                          0x1C,
-                          0x1D,
-                          0x1E,
-                          0x20,
-                          0x21,
-                          0x22,
-                          0x10};
-constexpr SIds kNonBLIds{EFL_PROTOCOL_NON_BL,
-                         0xD3,
-                         0xD4,
-                         0xD5,
-                         0xD6,
-                         0xCD,
-                         0xD7,
-                         0xD2,
-                         0xD8,
-                         0xD9,
-                         0xDA,
-                         0xDB,
-                         0xDC,
-                         0xDD,
-                         0xDE,
-                         0xDF,
-                         0xE1,
-                         0xE2,
-                         0xE3,
-                         0xD1};
+// clang-format off
+constexpr SIds kLoaderIds{EFL_PROTOCOL_LOADER, 0x12, 0x13, 0x14, 0x15, 0x15, 0x16, 0x11, 0x17, 0x18,
+                          0x19, 0x1A, 0x1B, 0x1C, 0x1D, 0x1E, 0x20, 0x21, 0x22, 0x10};
+constexpr SIds kNonBLIds{EFL_PROTOCOL_NON_BL, 0xD3, 0xD4, 0xD5, 0xD6, 0xCD, 0xD7, 0xD2, 0xD8, 0xD9,
+                         0xDA, 0xDB, 0xDC, 0xDD, 0xDE, 0xDF, 0xE1, 0xE2, 0xE3, 0xD1};
+// clang-format on
 
 class WireTest : public LabFixture, public ::testing::WithParamInterface<SIds> {
  protected:

@@ -8,6 +8,7 @@
 #include <cstdlib>
 #include <filesystem>
 
+#include "firmware/FirmwareFiles.h"
 #include "lab/CLabPenController.h"
 #include "support/LabFixture.h"
 #include "support/LabImages.h"
@@ -26,17 +27,6 @@ SLabPenDescription SmallPen(ELabProtocol protocol_I) {
 
 class InterruptionCampaign : public LabFixture, public ::testing::WithParamInterface<ELabProtocol> {
  protected:
-  void SetUp() override {
-    LabFixture::SetUp();
-    mFolder = std::filesystem::temp_directory_path() /
-              ("tavik-campaign-" + std::to_string(::getpid()) + "-" +
-               std::to_string(GetParam() == ELabProtocol::eLoader ? 0 : 1));
-  }
-  void TearDown() override {
-    std::filesystem::remove_all(mFolder);
-    LabFixture::TearDown();
-  }
-
   EFLProtocolType Protocol() const {
     return GetParam() == ELabProtocol::eNonBL ? EFL_PROTOCOL_NON_BL : EFL_PROTOCOL_LOADER;
   }
@@ -48,7 +38,7 @@ class InterruptionCampaign : public LabFixture, public ::testing::WithParamInter
     auto pen = std::make_shared<CLabPenController>(SmallPen(GetParam()));
     mBus->Plug(pen);
     if (fromFolder_I) {
-      EXPECT_EQ(mBus->LoadState(mFolder.string()), 1);
+      EXPECT_EQ(mBus->LoadState(mFolder), 1);
     }
     return pen;
   }
@@ -63,8 +53,16 @@ class InterruptionCampaign : public LabFixture, public ::testing::WithParamInter
     return update.Run(image_I);
   }
 
-  std::filesystem::path mFolder;
+  CTempFolder mTemp;
+  const std::string mFolder = mTemp.Path("state");
 };
+
+std::vector<std::vector<uint8_t>> Blocks(const CLabFlash& flash_I) {
+  std::vector<std::vector<uint8_t>> blocks;
+  for (uint32_t i = 0; i < flash_I.GetBlockCount(); ++i)
+    blocks.push_back(flash_I.GetBlockContent(i));
+  return blocks;
+}
 
 TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
   const std::vector<SContinuousDataBlock> image{Record(0x08002100, 3 * 4096 + 200, 11),
@@ -73,12 +71,7 @@ TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
 
   // The uninterrupted sequence: how many reports, and where the commits lie.
   std::shared_ptr<CLabPenController> pen = NewRun(false);
-  const std::vector<std::vector<uint8_t>> oldImage = [&] {
-    std::vector<std::vector<uint8_t>> blocks;
-    for (uint32_t i = 0; i < 12; ++i)
-      blocks.push_back(pen->GetLoader().GetCpu(0).GetBlockContent(i));
-    return blocks;
-  }();
+  const auto oldImage = Blocks(pen->GetLoader().GetCpu(0));
   const auto newImage = LabImages::Expected(pen->GetLoader().GetCpu(0), image);
   ASSERT_TRUE(RunUpdate(*pen, image).backToNormal);
   const uint64_t sequence = pen->GetReportCount();
@@ -104,13 +97,12 @@ TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
     pen->Faults().Add({ELabFaultKind::eVanish, static_cast<uint32_t>(cut), ""});
     EXPECT_FALSE(RunUpdate(*pen, image).backToNormal);
     ASSERT_TRUE(pen->IsUnplugged());
-    ASSERT_TRUE(mBus->SaveState(mFolder.string()));
+    ASSERT_TRUE(mBus->SaveState(mFolder));
 
     // Power returns.
     pen = NewRun(true);
     const CLabFlash& flash = pen->GetLoader().GetCpu(0);
-    std::vector<std::vector<uint8_t>> content;
-    for (uint32_t i = 0; i < 12; ++i) content.push_back(flash.GetBlockContent(i));
+    const auto content = Blocks(flash);
     if (cut < firstCommit) {
       // Nothing was invalidated or erased yet: the old firmware runs.
       EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eNormal);
@@ -134,19 +126,16 @@ TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
     const LabSRecUpdate::SResult second = RunUpdate(*pen, image);
     EXPECT_TRUE(second.programmed && second.backToNormal);
     EXPECT_TRUE(pen->GetLoader().IsImageValid());
-    for (uint32_t i = 0; i < 12; ++i) {
-      EXPECT_EQ(pen->GetLoader().GetCpu(0).GetBlockContent(i), newImage[i]) << "block " << i;
-    }
+    EXPECT_EQ(Blocks(pen->GetLoader().GetCpu(0)), newImage);
     for (const std::string& violation : pen->GetViolations()) ADD_FAILURE() << violation;
     if (HasFailure()) break;
   }
 
-  std::printf(
-      "interruption points tried: %llu (old image kept %llu, left in loader %llu, "
-      "new image committed %llu)\n",
-      static_cast<unsigned long long>(sequence), static_cast<unsigned long long>(keptOld),
-      static_cast<unsigned long long>(leftInLoader), static_cast<unsigned long long>(keptNew));
+  // Where each cut left the board, for the test's report.
   RecordProperty("interruption_points", static_cast<int>(sequence));
+  RecordProperty("kept_old_image", static_cast<int>(keptOld));
+  RecordProperty("left_in_loader", static_cast<int>(leftInLoader));
+  RecordProperty("new_image_committed", static_cast<int>(keptNew));
   EXPECT_EQ(keptOld + leftInLoader + keptNew, sequence);
   EXPECT_GT(leftInLoader, sequence / 2);
 }

@@ -4,33 +4,34 @@
 
 #include <gtest/gtest.h>
 
-#include <cstdio>
-#include <filesystem>
-#include <fstream>
-
 #include "firmware/CBinaryAiroFlash.h"
 #include "firmware/CIntelHex.h"
 #include "firmware/CScalarBinary.h"
+#include "firmware/FirmwareFiles.h"
 #include "lab/CLabBluetooth.h"
 #include "lab/CLabHidNode.h"
 #include "lab/CLabScalarHid.h"
 #include "lab/CLabTouchHex.h"
 #include "platform/linux/CLinuxHIDFLDeviceInterface.h"
 #include "support/LabFixture.h"
+#include "support/LabImages.h"
 #include "support/RecordingNotifier.h"
 
 namespace {
 
 using Bytes = std::vector<uint8_t>;
 
-Bytes Pattern(size_t size_I, uint32_t seed_I) {
-  Bytes bytes(size_I);
-  uint32_t state = seed_I;
-  for (uint8_t& byte : bytes) {
-    state = state * 1664525u + 1013904223u;
-    byte = static_cast<uint8_t>(state >> 24);
+// Bytes of a pattern that never holds 0xFF, so a blank byte is never data.
+Bytes Pattern(size_t size_I, uint32_t seed_I) { return LabImages::Record(0, size_I, seed_I).data; }
+
+// Intel-hex text of `data_I` from 0x8000, 16 bytes a record.
+std::string IntelHexText(const Bytes& data_I) {
+  std::string text;
+  for (size_t at = 0; at < data_I.size(); at += 16) {
+    const Bytes chunk(data_I.begin() + at, data_I.begin() + std::min(at + 16, data_I.size()));
+    text += HexRecord(0, static_cast<uint16_t>(0x8000 + at), chunk) + "\r\n";
   }
-  return bytes;
+  return text + ":00000001FF\r\n";
 }
 
 class ProgrammingReports : public LabFixture {
@@ -38,13 +39,6 @@ class ProgrammingReports : public LabFixture {
   void SetUp() override {
     LabFixture::SetUp();
     CFLProtocol::GetInstance()->SetProtocolType(EFL_PROTOCOL_NON_BL);
-    mFolder =
-        std::filesystem::temp_directory_path() / ("tavik-programs-" + std::to_string(::getpid()));
-    std::filesystem::create_directories(mFolder);
-  }
-  void TearDown() override {
-    std::filesystem::remove_all(mFolder);
-    LabFixture::TearDown();
   }
 
   std::unique_ptr<CLinuxHIDFLDeviceInterface> Connect(const CLabBoard& board_I,
@@ -58,40 +52,18 @@ class ProgrammingReports : public LabFixture {
     return interface;
   }
 
-  std::string WriteFile(const std::string& name_I, const std::string& content_I) {
-    const std::string path = (mFolder / name_I).string();
-    std::ofstream(path, std::ios::binary) << content_I;
-    return path;
+  std::shared_ptr<CIntelHex> IntelHex(const Bytes& data_I) {
+    auto hex = std::make_shared<CIntelHex>();
+    EXPECT_TRUE(hex->Load(mFolder.Write("touch.hex", IntelHexText(data_I))));
+    return hex;
   }
-
-  // Intel-hex text of `data_I` from 0x8000, 16 bytes a record.
-  static std::string IntelHexText(const Bytes& data_I) {
-    std::string text;
-    char line[64];
-    for (size_t at = 0; at < data_I.size(); at += 16) {
-      const size_t count = std::min<size_t>(16, data_I.size() - at);
-      const uint32_t address = 0x8000 + static_cast<uint32_t>(at);
-      uint8_t sum = static_cast<uint8_t>(count + (address >> 8) + address);
-      std::snprintf(line, sizeof(line), ":%02X%04X00", static_cast<unsigned>(count), address);
-      text += line;
-      for (size_t k = 0; k < count; ++k) {
-        std::snprintf(line, sizeof(line), "%02X", data_I[at + k]);
-        text += line;
-        sum = static_cast<uint8_t>(sum + data_I[at + k]);
-      }
-      std::snprintf(line, sizeof(line), "%02X\r\n", static_cast<uint8_t>(0x100 - sum));
-      text += line;
-    }
-    return text + ":00000001FF\r\n";
-  }
-
   std::shared_ptr<CBinaryAiroFlash> AiroFlash(const Bytes& data_I) {
     auto image = std::make_shared<CBinaryAiroFlash>();
-    EXPECT_TRUE(image->Load(WriteFile("bt.airoflash", std::string(data_I.begin(), data_I.end()))));
+    EXPECT_TRUE(image->Load(mFolder.Write("bt.airoflash", data_I)));
     return image;
   }
 
-  std::filesystem::path mFolder;
+  CTempFolder mFolder;
   RecordingNotifier mNotifier;
 };
 
@@ -99,12 +71,8 @@ TEST_F(ProgrammingReports, IntelHexChunksLandInOrder) {
   auto touch = std::make_shared<CLabTouchHex>();
   mBus->Plug(touch);
   const Bytes data = Pattern(3000, 1);
-  auto hex = std::make_shared<CIntelHex>();
-  ASSERT_TRUE(hex->Load(WriteFile("touch.hex", IntelHexText(data))));
-  ASSERT_EQ(hex->Size(), 3072u);
-
   auto interface = Connect(*touch, EDS_INTEL_HEX);
-  interface->SetIntelHexData(hex);
+  interface->SetIntelHexData(IntelHex(data));
   ASSERT_TRUE(interface->ProgramBoard()) << mNotifier.errors.back();
 
   EXPECT_TRUE(touch->IsImageValid());
@@ -123,10 +91,8 @@ TEST_F(ProgrammingReports, IntelHexChunksLandInOrder) {
 TEST_F(ProgrammingReports, ADataPollWhoseReadsAllFailEndsBusy) {
   auto touch = std::make_shared<CLabTouchHex>();
   mBus->Plug(touch);
-  auto hex = std::make_shared<CIntelHex>();
-  ASSERT_TRUE(hex->Load(WriteFile("touch.hex", IntelHexText(Pattern(100, 2)))));
   auto interface = Connect(*touch, EDS_INTEL_HEX);
-  interface->SetIntelHexData(hex);
+  interface->SetIntelHexData(IntelHex(Pattern(100, 2)));
   // Past the start's poll (whose byte 3 is 0 as written), every read fails.
   touch->Faults().Add({ELabFaultKind::eFailRead, 1000000, ""});
   EXPECT_FALSE(interface->ProgramBoard());

@@ -22,14 +22,8 @@ class SRecProgramming : public LabFixture {
     mBus->Plug(mPen);
   }
 
-  DeviceInfo NormalInfo() const {
-    DeviceInfo info{0x7A71, 0x0301, mPen->GetLocationId(), 0x0002, 0x000D};
-    return info;
-  }
-  DeviceInfo LoaderInfo() const {
-    DeviceInfo info{0x7A71, 0x0302, mPen->GetLocationId(), 0x0001, 0xFF00};
-    return info;
-  }
+  DeviceInfo NormalInfo() const { return {0x7A71, 0x0301, mPen->GetLocationId(), 2, 0x000D}; }
+  DeviceInfo LoaderInfo() const { return {0x7A71, 0x0302, mPen->GetLocationId(), 1, 0xFF00}; }
 
   // Runs the update and checks what every S-record update must leave.
   LabSRecUpdate::SResult Update(const std::vector<SContinuousDataBlock>& image_I,

@@ -1,60 +1,24 @@
 // The update controller drives a whole pen update against the lab: it finds
-// the pen through a small discovery over the lab bus, hears attach and
+// the product through discovery over the lab bus, hears attach and
 // detach from the bus, switches the pen to its loader, programs an S-record
 // file and brings it back.
 
 #include <gtest/gtest.h>
 
-#include <cstdio>
-#include <filesystem>
-#include <fstream>
 #include <mutex>
 
-#include "devices/CDiscovery.h"
+#include "firmware/FirmwareFiles.h"
+#include "lab/CLabDeviceRegistry.h"
 #include "lab/CLabHidNode.h"
 #include "lab/CLabPenController.h"
-#include "platform/linux/CLinuxHIDFLDeviceInterface.h"
+#include "lab/CLabProducts.h"
+#include "lab/CLabUsbControl.h"
+#include "platform/linux/CLinuxDiscovery.h"
 #include "support/LabFixture.h"
 #include "support/LabImages.h"
 #include "update/CLinuxUpdateController.h"
 
 namespace {
-
-constexpr uint16_t kPen = 0x0301;
-constexpr uint16_t kLoader = 0x0302;
-
-// One device per pen found on the bus: its digitizer interface in normal
-// mode, its loader interface in loader mode.
-class LabDiscovery : public CDiscovery {
- public:
-  explicit LabDiscovery(std::shared_ptr<CLabBus> bus_I) : mBus(std::move(bus_I)) {}
-
-  bool GenerateDeviceList() override {
-    mDeviceList.ClearDeviceList();
-    for (const SLabInterface& entry : mBus->ListInterfaces()) {
-      const bool loader = entry.info.productId == kLoader;
-      const bool pen = entry.info.productId == kPen && entry.info.usagePage == 0x000D;
-      if (!loader && !pen) continue;
-      auto device = std::make_shared<CDevice>();
-      device->SetDeviceName("lab pen");
-      device->SetPenVendorId(entry.info.vendorId);
-      device->SetPenProductId(kPen);
-      device->SetPenInterfaceType(EHID_INTERFACE);
-      device->SetPenFlashSectors(48);
-      device->SetPenIntoBLMode(true);
-      device->SetIsFlashLoader(loader);
-      auto interface = std::make_shared<CLinuxHIDFLDeviceInterface>(
-          entry.info, std::make_unique<CLabHidNode>(mBus));
-      interface->SetIsFlashLoader(loader);
-      device->SetPenInterface(interface);
-      mDeviceList.AddDevice(device);
-    }
-    return mDeviceList.GetDeviceCount() != 0;
-  }
-
- private:
-  std::shared_ptr<CLabBus> mBus;
-};
 
 class Recorder : public CUpdateNotifier {
  public:
@@ -62,16 +26,12 @@ class Recorder : public CUpdateNotifier {
     std::lock_guard<std::mutex> guard(mLock);
     errors.push_back(text_I);
   }
-  void UpdateStatus(ECONTROLLER_STATE state_I) override {
-    std::lock_guard<std::mutex> guard(mLock);
-    states.push_back(state_I);
-  }
+  void UpdateStatus(ECONTROLLER_STATE) override {}
   void UpdateProgress(unsigned int percent_I) override {
     std::lock_guard<std::mutex> guard(mLock);
     progress.push_back(percent_I);
   }
   std::vector<std::string> errors;
-  std::vector<ECONTROLLER_STATE> states;
   std::vector<unsigned int> progress;
 
  private:
@@ -81,21 +41,10 @@ class Recorder : public CUpdateNotifier {
 // S3 records of 32 bytes each.
 std::string SRecordText(const SContinuousDataBlock& block_I) {
   std::string text = "S00600004844521B\n";
-  char field[16];
   for (size_t at = 0; at < block_I.data.size(); at += 32) {
-    const size_t count = std::min<size_t>(32, block_I.data.size() - at);
-    const uint32_t address = block_I.startAddress + static_cast<uint32_t>(at);
-    uint32_t sum = static_cast<uint32_t>(count + 5);
-    std::snprintf(field, sizeof(field), "S3%02X%08X", static_cast<unsigned>(count + 5), address);
-    text += field;
-    for (int shift = 0; shift < 32; shift += 8) sum += (address >> shift) & 0xFF;
-    for (size_t k = 0; k < count; ++k) {
-      std::snprintf(field, sizeof(field), "%02X", block_I.data[at + k]);
-      text += field;
-      sum += block_I.data[at + k];
-    }
-    std::snprintf(field, sizeof(field), "%02X\n", static_cast<unsigned>(~sum & 0xFF));
-    text += field;
+    const std::vector<uint8_t> chunk(block_I.data.begin() + at,
+                                     block_I.data.begin() + std::min(at + 32, block_I.data.size()));
+    text += SRecLine('3', block_I.startAddress + static_cast<uint32_t>(at), chunk) + "\n";
   }
   return text + "S70500000000FA\n";
 }
@@ -103,16 +52,19 @@ std::string SRecordText(const SContinuousDataBlock& block_I) {
 class ControllerOverLab : public LabFixture {};
 
 TEST_F(ControllerOverLab, APenUpdateFromFileToNormalMode) {
-  auto pen = std::make_shared<CLabPenController>();
-  mBus->Plug(pen);
+  const auto pen = std::dynamic_pointer_cast<CLabPenController>(
+      CLabProducts::Plug(*mBus, "classic-tablet").at(0));
   const CLabFlash before = pen->GetLoader().GetCpu(0);
   const SContinuousDataBlock image = LabImages::Record(0x08002000, 0x3000, 61);
-  const std::string path = (std::filesystem::temp_directory_path() /
-                            ("tavik-lab-" + std::to_string(::getpid()) + ".pen"))
-                               .string();
-  std::ofstream(path) << SRecordText(image);
+  CTempFolder folder;
+  const std::string path = folder.Write("lab.pen", SRecordText(image));
 
-  CLinuxUpdateController controller(std::make_unique<LabDiscovery>(mBus));
+  auto discovery = std::make_unique<CLinuxDiscovery>(
+      std::make_shared<CLabDeviceRegistry>(mBus),
+      [this] { return std::make_unique<CLabHidNode>(mBus); },
+      [this] { return std::make_unique<CLabUsbControl>(mBus); });
+  discovery->SetConfig(TAV_DATA_DIR "/fw_loader.ini");
+  CLinuxUpdateController controller(std::move(discovery));
   Recorder recorder;
   controller.RegisterCallback(&recorder);
   const int listener = mBus->AddListener([&](const SLabInterface& interface_I, bool attached_I) {
@@ -129,7 +81,6 @@ TEST_F(ControllerOverLab, APenUpdateFromFileToNormalMode) {
   ASSERT_TRUE(controller.SetUpdateFile(path));
   const bool updated = controller.UpdateDevice();
   mBus->RemoveListener(listener);
-  std::filesystem::remove(path);
 
   ASSERT_TRUE(updated) << (recorder.errors.empty() ? "" : recorder.errors.back());
   EXPECT_EQ(controller.GetState(), ESTATE_SUCCESS);

@@ -33,20 +33,19 @@ class LogCapture {
     std::lock_guard<std::mutex> guard(mLock);
     return mAssertions;
   }
-  bool LogContains(const std::string& part_I) const {
-    for (const std::string& line : Log()) {
-      if (line.find(part_I) != std::string::npos) return true;
-    }
-    return false;
-  }
+  bool LogContains(const std::string& part_I) const { return AnyContains(Log(), part_I); }
   bool AssertionContains(const std::string& part_I) const {
-    for (const std::string& line : Assertions()) {
+    return AnyContains(Assertions(), part_I);
+  }
+
+ private:
+  static bool AnyContains(const std::vector<std::string>& lines_I, const std::string& part_I) {
+    for (const std::string& line : lines_I) {
       if (line.find(part_I) != std::string::npos) return true;
     }
     return false;
   }
 
- private:
   mutable std::mutex mLock;
   std::vector<std::string> mLog;
   std::vector<std::string> mAssertions;

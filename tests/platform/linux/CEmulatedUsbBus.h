@@ -85,10 +85,32 @@ class CEmulatedUsbBus {
   void Unplug(const SHidNode& node_I) {
     for (const std::string* path : {&node_I.hidrawSysPath, &node_I.hidSysPath,
                                     &node_I.interfaceSysPath, &node_I.usbSysPath}) {
-      if (path->empty()) continue;
-      const std::string sysPath = "/sys" + *path;
-      umockdev_testbed_uevent(mTestbed, sysPath.c_str(), "remove");
-      umockdev_testbed_remove_device(mTestbed, sysPath.c_str());
+      if (!path->empty()) Remove(*path);
+    }
+  }
+
+  void Remove(const std::string& path_I) {
+    const std::string sysPath = "/sys" + path_I;
+    umockdev_testbed_uevent(mTestbed, sysPath.c_str(), "remove");
+    umockdev_testbed_remove_device(mTestbed, sysPath.c_str());
+  }
+
+  static std::string Hex(const std::vector<uint8_t>& bytes_I) {
+    std::string text;
+    char pair[3];
+    for (uint8_t byte : bytes_I) {
+      std::snprintf(pair, sizeof(pair), "%02X", byte);
+      text += pair;
+    }
+    return text;
+  }
+
+  void Add(const std::string& text_I) {
+    GError* error = nullptr;
+    if (!umockdev_testbed_add_from_string(mTestbed, text_I.c_str(), &error)) {
+      std::fprintf(stderr, "umockdev: %s\n", error != nullptr ? error->message : "?");
+      if (error != nullptr) g_error_free(error);
+      std::abort();
     }
   }
 
@@ -112,25 +134,6 @@ class CEmulatedUsbBus {
                   "A: devpath=%s\n",
                   vendorId_I, productId_I, version_I, bus_I, devpath_I.c_str());
     return text;
-  }
-
-  static std::string Hex(const std::vector<uint8_t>& bytes_I) {
-    std::string text;
-    char pair[3];
-    for (uint8_t byte : bytes_I) {
-      std::snprintf(pair, sizeof(pair), "%02X", byte);
-      text += pair;
-    }
-    return text;
-  }
-
-  void Add(const std::string& text_I) {
-    GError* error = nullptr;
-    if (!umockdev_testbed_add_from_string(mTestbed, text_I.c_str(), &error)) {
-      std::fprintf(stderr, "umockdev: %s\n", error != nullptr ? error->message : "?");
-      if (error != nullptr) g_error_free(error);
-      std::abort();
-    }
   }
 
   UMockdevTestbed* mTestbed;

@@ -1,12 +1,9 @@
 // Applications, notifications and the access check of the Linux desktop.
-#include "platform/linux/CLinuxDesktop.h"
-
+#include <gtest/gtest.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <systemd/sd-bus.h>
 #include <unistd.h>
-
-#include <gtest/gtest.h>
 
 #include <filesystem>
 #include <fstream>
@@ -14,6 +11,7 @@
 
 #include "common/CClock.h"
 #include "platform/linux/CDesktopEntries.h"
+#include "platform/linux/CLinuxDesktop.h"
 #include "platform/linux/PrivateBus.h"
 
 namespace {
@@ -90,7 +88,8 @@ TEST_F(LinuxDesktop, LaunchedApplicationRunsIsNamedAndQuitsOnRequest) {
 
   EXPECT_TRUE(mDesktop.TerminateApplication(running[0]));
   EXPECT_TRUE(WaitFor([&] { return mDesktop.IsTerminated(running[0]); }));
-  EXPECT_TRUE(WaitFor([&] { return mDesktop.RunningApplications("com.tavik.TestDriver").empty(); }));
+  EXPECT_TRUE(
+      WaitFor([&] { return mDesktop.RunningApplications("com.tavik.TestDriver").empty(); }));
 }
 
 TEST_F(LinuxDesktop, LaunchOfAMissingProgramOrEntryFails) {
@@ -112,8 +111,8 @@ TEST_F(LinuxDesktop, NotificationIsASignalOnTheSessionBus) {
   if (!bus.IsUp()) GTEST_SKIP() << "dbus-daemon is not installed";
   sd_bus* listener = nullptr;
   ASSERT_GE(sd_bus_open_user(&listener), 0);
-  ASSERT_GE(sd_bus_add_match(listener, nullptr,
-                             "type='signal',interface='com.tavik.Notification'", nullptr, nullptr),
+  ASSERT_GE(sd_bus_add_match(listener, nullptr, "type='signal',interface='com.tavik.Notification'",
+                             nullptr, nullptr),
             0);
   sd_bus_flush(listener);
 

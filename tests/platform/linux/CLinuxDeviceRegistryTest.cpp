@@ -4,9 +4,11 @@
 
 #include <chrono>
 #include <condition_variable>
+#include <cstdio>
 #include <memory>
 #include <mutex>
 #include <thread>
+#include <tuple>
 #include <vector>
 
 #include "platform/linux/CEmulatedUsbBus.h"
@@ -29,13 +31,23 @@ const std::vector<uint8_t> kVendorOnly = {0x06, 0x00, 0xFF, 0x09, 0x01, 0xA1, 0x
 
 DeviceInfo Info(uint32_t vendor_I, uint32_t product_I, uint32_t location_I, uint32_t usage_I,
                 uint32_t page_I) {
-  DeviceInfo info;
-  info.vendorId = vendor_I;
-  info.productId = product_I;
-  info.locationId = location_I;
-  info.usage = usage_I;
-  info.usagePage = page_I;
-  return info;
+  return DeviceInfo{vendor_I, product_I, location_I, usage_I, page_I};
+}
+
+// An entry in one line: vendor:product @location usage/page node version,
+// and the hub above it (all hex).
+using Texts = std::vector<std::string>;
+Texts TextsOf(const std::vector<SHidEntry>& entries_I) {
+  Texts texts;
+  char text[160];
+  for (const SHidEntry& entry : entries_I) {
+    std::snprintf(text, sizeof(text), "%X:%X @%X %X/%X %s v%X under %X:%X", entry.info.vendorId,
+                  entry.info.productId, entry.info.locationId, entry.info.usage,
+                  entry.info.usagePage, entry.nodePath.c_str(), entry.version,
+                  entry.parentUsbVendorId, entry.parentUsbProductId);
+    texts.push_back(text);
+  }
+  return texts;
 }
 
 class CLinuxDeviceRegistryTest : public ::testing::Test {
@@ -106,16 +118,19 @@ class CWatchThread {
 }  // namespace
 
 TEST(CLinuxDeviceRegistryLocationTest, PacksBusAndPortsIntoOneWord) {
-  EXPECT_EQ(CLinuxDeviceRegistry::LocationIdFromTopology(1, "2.3"), 0x01230000u);
-  EXPECT_EQ(CLinuxDeviceRegistry::LocationIdFromTopology(3, "2"), 0x03200000u);
-  EXPECT_EQ(CLinuxDeviceRegistry::LocationIdFromTopology(2, "1.4.2.3.1.5"), 0x02142315u);
-  // The same ports on another bus, or one port more, is another place.
-  EXPECT_NE(CLinuxDeviceRegistry::LocationIdFromTopology(1, "2"),
-            CLinuxDeviceRegistry::LocationIdFromTopology(1, "2.1"));
-  EXPECT_NE(CLinuxDeviceRegistry::LocationIdFromTopology(1, "2.3"),
-            CLinuxDeviceRegistry::LocationIdFromTopology(2, "2.3"));
-  // Ports past the sixth do not spill into the bus number.
-  EXPECT_EQ(CLinuxDeviceRegistry::LocationIdFromTopology(1, "1.1.1.1.1.1.7"), 0x01111111u);
+  // The same ports on another bus, or one port more, is another place; ports
+  // past the sixth do not spill into the bus number.
+  const struct {
+    unsigned bus;
+    const char* devpath;
+    uint32_t location;
+  } cases[] = {{1, "2.3", 0x01230000}, {3, "2", 0x03200000},   {2, "1.4.2.3.1.5", 0x02142315},
+               {1, "2.1", 0x01210000}, {2, "2.3", 0x02230000}, {1, "1.1.1.1.1.1.7", 0x01111111}};
+  for (const auto& entry : cases) {
+    EXPECT_EQ(CLinuxDeviceRegistry::LocationIdFromTopology(entry.bus, entry.devpath),
+              entry.location)
+        << entry.bus << "-" << entry.devpath;
+  }
 }
 
 TEST_F(CLinuxDeviceRegistryTest, ListsOneEntryPerTopLevelPairWithIdentityAndNode) {
@@ -127,27 +142,15 @@ TEST_F(CLinuxDeviceRegistryTest, ListsOneEntryPerTopLevelPairWithIdentityAndNode
   const std::string foreign = mBus->AddUsbDevice(mRootHub, 1, "5", kOtherVendor, 0x1, 0x0001);
   mBus->AddHidInterface(foreign, 0, 2, kVendorOnly);
 
-  CLinuxDeviceRegistry registry;
-  const std::vector<SHidEntry> entries = registry.ListHidInterfaces(kVendor);
-  ASSERT_EQ(entries.size(), 3u);
-  EXPECT_EQ(entries[0].info, Info(kVendor, 0x374, 0x01200000, 0x02, 0x0D));
-  EXPECT_EQ(entries[1].info, Info(kVendor, 0x374, 0x01200000, 0x01, 0xFF00));
-  EXPECT_EQ(entries[2].info, Info(kVendor, 0x3A0, 0x01430000, 0x02, 0xFF0D));
-  EXPECT_EQ(entries[0].nodePath, "/dev/hidraw0");
-  EXPECT_EQ(entries[1].nodePath, "/dev/hidraw0");
-  EXPECT_EQ(entries[2].nodePath, "/dev/hidraw1");
-  EXPECT_EQ(entries[0].version, 0x0102);
-  EXPECT_EQ(entries[2].version, 0x0215);
   // The hub's ids go with the device behind it; a root port gives none.
-  EXPECT_EQ(entries[0].parentUsbVendorId, 0u);
-  EXPECT_EQ(entries[0].parentUsbProductId, 0u);
-  EXPECT_EQ(entries[2].parentUsbVendorId, 0x05E3u);
-  EXPECT_EQ(entries[2].parentUsbProductId, 0x0610u);
-
+  CLinuxDeviceRegistry registry;
+  Texts expected{"7A5D:374 @1200000 2/D /dev/hidraw0 v102 under 0:0",
+                 "7A5D:374 @1200000 1/FF00 /dev/hidraw0 v102 under 0:0",
+                 "7A5D:3A0 @1430000 2/FF0D /dev/hidraw1 v215 under 5E3:610"};
+  EXPECT_EQ(TextsOf(registry.ListHidInterfaces(kVendor)), expected);
   // Vendor 0 lists every vendor.
-  const std::vector<SHidEntry> all = registry.ListHidInterfaces(0);
-  ASSERT_EQ(all.size(), 4u);
-  EXPECT_EQ(all[3].info, Info(kOtherVendor, 0x1, 0x01500000, 0x01, 0xFF00));
+  expected.push_back("1234:1 @1500000 1/FF00 /dev/hidraw2 v1 under 0:0");
+  EXPECT_EQ(TextsOf(registry.ListHidInterfaces(0)), expected);
   EXPECT_TRUE(registry.ListHidInterfaces(0x4321).empty());
 }
 
@@ -156,12 +159,8 @@ TEST_F(CLinuxDeviceRegistryTest, LeavesOutInterfacesItCannotIdentify) {
   mBus->AddHidInterface(tablet, 0, 0, {});  // descriptor unreadable
   mBus->AddHidInterface(tablet, 1, 1, kVendorOnly);
   mBus->AddNonUsbHidInterface(2, kVendorOnly);
-
-  CLinuxDeviceRegistry registry;
-  const std::vector<SHidEntry> entries = registry.ListHidInterfaces(0);
-  ASSERT_EQ(entries.size(), 1u);
-  EXPECT_EQ(entries[0].nodePath, "/dev/hidraw1");
-  EXPECT_EQ(entries[0].info, Info(kVendor, 0x374, 0x01200000, 0x01, 0xFF00));
+  EXPECT_EQ(TextsOf(CLinuxDeviceRegistry().ListHidInterfaces(0)),
+            Texts{"7A5D:374 @1200000 1/FF00 /dev/hidraw1 v102 under 0:0"});
 }
 
 TEST_F(CLinuxDeviceRegistryTest, ListsUsbDevicesAndTheHubsTheyHangBehind) {
@@ -174,22 +173,16 @@ TEST_F(CLinuxDeviceRegistryTest, ListsUsbDevicesAndTheHubsTheyHangBehind) {
 
   CLinuxDeviceRegistry registry;
   // What the 0xFA product is judged by: the hub above it, none on a root port.
-  const std::vector<SHidEntry> interfaces = registry.ListHidInterfaces(kVendor);
-  ASSERT_EQ(interfaces.size(), 2u);
-  EXPECT_EQ(interfaces[0].info.locationId, 0x01120000u);
-  EXPECT_EQ(interfaces[0].parentUsbVendorId, kVendor);
-  EXPECT_EQ(interfaces[0].parentUsbProductId, 0xF9u);
-  EXPECT_EQ(interfaces[1].info.locationId, 0x01200000u);
-  EXPECT_EQ(interfaces[1].parentUsbVendorId, 0u);
-  EXPECT_EQ(interfaces[1].parentUsbProductId, 0u);
-
-  const std::vector<SUsbEntry> ours = registry.ListUsbDevices(kVendor);
-  ASSERT_EQ(ours.size(), 3u);
-  EXPECT_EQ(ours[0].productId, 0xF9u);
-  EXPECT_EQ(ours[0].locationId, 0x01100000u);
-  EXPECT_EQ(ours[1].productId, 0xFAu);
-  EXPECT_EQ(ours[1].locationId, 0x01120000u);
-  EXPECT_EQ(ours[1].version, 0x0310);
+  EXPECT_EQ(TextsOf(registry.ListHidInterfaces(kVendor)),
+            (Texts{"7A5D:FA @1120000 1/FF00 /dev/hidraw0 v310 under 7A5D:F9",
+                   "7A5D:FA @1200000 1/FF00 /dev/hidraw1 v310 under 0:0"}));
+  std::vector<std::tuple<uint32_t, uint32_t, uint16_t>> ours;
+  for (const SUsbEntry& entry : registry.ListUsbDevices(kVendor)) {
+    ours.emplace_back(entry.productId, entry.locationId, entry.version);
+  }
+  EXPECT_EQ(ours, (decltype(ours){{0xF9, 0x01100000, 0x0100},
+                                  {0xFA, 0x01120000, 0x0310},
+                                  {0xFA, 0x01200000, 0x0310}}));
   // The root hub and the other vendor's device are there under vendor 0.
   EXPECT_EQ(registry.ListUsbDevices(0).size(), 5u);
 }

@@ -1,15 +1,13 @@
 // The logind inhibitor against a private bus with a stand-in logind.
-#include "platform/linux/CLinuxPowerInhibitor.h"
-
+#include <gtest/gtest.h>
 #include <poll.h>
 #include <systemd/sd-bus.h>
-
-#include <gtest/gtest.h>
 
 #include <atomic>
 #include <thread>
 #include <vector>
 
+#include "platform/linux/CLinuxPowerInhibitor.h"
 #include "platform/linux/PrivateBus.h"
 
 namespace {

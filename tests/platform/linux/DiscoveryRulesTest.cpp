@@ -2,19 +2,15 @@
 // it: the search criteria, the roles, the parent test and reconciliation.
 
 #include <gtest/gtest.h>
-#include <unistd.h>
-
-#include <filesystem>
-#include <fstream>
 
 #include "devices/IOUtils.h"
+#include "firmware/FirmwareFiles.h"
 #include "platform/linux/CLinuxDiscovery.h"
 #include "platform/linux/CLinuxHIDFLDeviceInterface.h"
 #include "support/LogCapture.h"
 
 namespace {
 
-namespace fs = std::filesystem;
 using DevicePtr = std::shared_ptr<CDevice>;
 
 class CListedRegistry : public CDeviceRegistry {
@@ -50,15 +46,8 @@ uint32_t BehindHub(unsigned port_I) { return 0x01100000u | (port_I << 16); }
 
 class DiscoveryRules : public ::testing::Test {
  protected:
-  DiscoveryRules()
-      : mConfig(fs::temp_directory_path() /
-                ("rules-" + std::to_string(getpid()) + "-" +
-                 ::testing::UnitTest::GetInstance()->current_test_info()->name() + ".ini")) {}
-  ~DiscoveryRules() override { fs::remove(mConfig); }
-
   std::vector<DevicePtr> Scan(const std::string& config_I) {
-    std::ofstream(mConfig) << config_I;
-    mDiscovery.SetConfig(mConfig.string());
+    mDiscovery.SetConfig(mFolder.Write("fw_loader.ini", config_I));
     EXPECT_TRUE(mDiscovery.GenerateDeviceList());
     const CDeviceList list = mDiscovery.GetDeviceList();
     std::vector<DevicePtr> devices;
@@ -66,7 +55,7 @@ class DiscoveryRules : public ::testing::Test {
     return devices;
   }
 
-  fs::path mConfig;
+  CTempFolder mFolder;
   std::shared_ptr<CListedRegistry> mRegistry = std::make_shared<CListedRegistry>();
   CLinuxDiscovery mDiscovery{mRegistry, nullptr, nullptr};
 };
@@ -79,11 +68,16 @@ std::shared_ptr<CFLDeviceInterface> Hid(const DeviceInfo& info_I) {
 
 TEST_F(DiscoveryRules, NothingIsListedWithoutAConfigurationAndNoProductWithoutAnEntry) {
   mRegistry->AddHid({0x7A5D, 0x100, BehindHub(1), 1, 0xFF00});
+  // The configured product under another vendor, and under another usage.
+  mRegistry->AddHid({0x7A71, 0x200, BehindHub(2), 1, 0xFF00});
+  mRegistry->AddHid({0x7A5D, 0x200, BehindHub(3), 2, 0xFF00});
   EXPECT_TRUE(Scan("not json").empty());
   EXPECT_TRUE(Scan("[]").empty());
   EXPECT_TRUE(Scan(R"([{"name": "Other", "penBoard": {"pid": "200", "usageId": "1",
                                                        "usagePg": "FF00"}}])")
                   .empty());
+  EXPECT_TRUE(mDiscovery.GetSupportedDeviceInfo().IsValid());
+  EXPECT_EQ(mDiscovery.GetBestDevice(), nullptr);
 }
 
 TEST_F(DiscoveryRules, TheGuardedProductCountsOnlyBehindItsOwnHub) {

@@ -18,7 +18,9 @@ class CPrivateBus {
  public:
   explicit CPrivateBus(const char* variable_I = "DBUS_SYSTEM_BUS_ADDRESS") : mVariable(variable_I) {
     if (access("/usr/bin/dbus-daemon", X_OK) != 0) return;
-    mFolder = std::filesystem::temp_directory_path() / ("bus-" + std::to_string(getpid()) + "-" + std::to_string(reinterpret_cast<uintptr_t>(this)));
+    mFolder = std::filesystem::temp_directory_path() /
+              ("bus-" + std::to_string(getpid()) + "-" +
+               std::to_string(reinterpret_cast<uintptr_t>(this)));
     std::filesystem::create_directories(mFolder);
     const std::string config = (mFolder / "bus.conf").string();
     std::ofstream(config) << "<busconfig><type>system</type>"
@@ -33,8 +35,8 @@ class CPrivateBus {
     if (mPid == 0) {
       dup2(out[1], STDOUT_FILENO);
       close(out[0]);
-      execl("/usr/bin/dbus-daemon", "dbus-daemon", ("--config-file=" + config).c_str(),
-            "--nofork", "--print-address=1", static_cast<char*>(nullptr));
+      execl("/usr/bin/dbus-daemon", "dbus-daemon", ("--config-file=" + config).c_str(), "--nofork",
+            "--print-address=1", static_cast<char*>(nullptr));
       _exit(127);
     }
     close(out[1]);

@@ -26,21 +26,14 @@
 #include <vector>
 
 #include "lab/CLabBus.h"
+#include "platform/linux/CEmulatedUsbBus.h"
 
-class UmockdevLab {
+class UmockdevLab : private CEmulatedUsbBus {
  public:
-  explicit UmockdevLab(std::shared_ptr<CLabBus> bus_I)
-      : mBus(std::move(bus_I)), mTestbed(umockdev_testbed_new()) {
-    Sync();
-  }
-
+  explicit UmockdevLab(std::shared_ptr<CLabBus> bus_I) : mBus(std::move(bus_I)) { Sync(); }
   ~UmockdevLab() {
     while (!mDevices.empty()) RemoveDevice(mDevices.front());
-    g_object_unref(mTestbed);
   }
-
-  UmockdevLab(const UmockdevLab&) = delete;
-  UmockdevLab& operator=(const UmockdevLab&) = delete;
 
   // Brings the emulated devices in line with what the bus lists.
   void Sync() {
@@ -99,22 +92,9 @@ class UmockdevLab {
     return now == device_I.interfaces;
   }
 
-  static std::string Hex(const std::vector<uint8_t>& bytes_I) {
-    std::string text;
-    char pair[3];
-    for (uint8_t byte : bytes_I) {
-      std::snprintf(pair, sizeof(pair), "%02x", byte);
-      text += pair;
-    }
-    return text;
-  }
-
-  void Add(const std::string& text_I) {
-    GError* error = nullptr;
-    if (!umockdev_testbed_add_from_string(mTestbed, text_I.c_str(), &error)) {
-      std::fprintf(stderr, "umockdev: %s\n", error != nullptr ? error->message : "?");
-      if (error != nullptr) g_error_free(error);
-    }
+  static void Le16(std::vector<uint8_t>& bytes_IO, uint16_t value_I) {
+    bytes_IO.push_back(static_cast<uint8_t>(value_I));
+    bytes_IO.push_back(static_cast<uint8_t>(value_I >> 8));
   }
 
   SNode* Attach(SDevice& device_I, const SLabInterface& interface_I, const std::string& devnode_I,
@@ -127,7 +107,7 @@ class UmockdevLab {
     node->handler = umockdev_ioctl_base_new();
     g_signal_connect(node->handler, "handle-ioctl", G_CALLBACK(&UmockdevLab::HandleIoctl),
                      node.get());
-    umockdev_testbed_attach_ioctl(mTestbed, devnode_I.c_str(), node->handler, nullptr);
+    umockdev_testbed_attach_ioctl(GetTestbed(), devnode_I.c_str(), node->handler, nullptr);
     device_I.nodes.push_back(std::move(node));
     return device_I.nodes.back().get();
   }
@@ -189,42 +169,15 @@ class UmockdevLab {
     // class 3) or one vendor-class interface (0xFF, subclass 0).
     const uint16_t vendor = static_cast<uint16_t>(first.info.vendorId);
     const uint16_t product = static_cast<uint16_t>(first.info.productId);
-    std::vector<uint8_t> descriptors{0x12,
-                                     0x01,
-                                     0x00,
-                                     0x02,
-                                     0x00,
-                                     0x00,
-                                     0x00,
-                                     0x40,
-                                     static_cast<uint8_t>(vendor),
-                                     static_cast<uint8_t>(vendor >> 8),
-                                     static_cast<uint8_t>(product),
-                                     static_cast<uint8_t>(product >> 8),
-                                     static_cast<uint8_t>(first.release),
-                                     static_cast<uint8_t>(first.release >> 8),
-                                     0x01,
-                                     0x02,
-                                     0x00,
-                                     0x01};
     const uint8_t interfaces = static_cast<uint8_t>(device->interfaces.size());
-    const uint16_t total = 9 + 9 * interfaces;
-    const std::vector<uint8_t> config{0x09,
-                                      0x02,
-                                      static_cast<uint8_t>(total),
-                                      static_cast<uint8_t>(total >> 8),
-                                      interfaces,
-                                      0x01,
-                                      0x00,
-                                      0x80,
-                                      0x32};
-    descriptors.insert(descriptors.end(), config.begin(), config.end());
+    std::vector<uint8_t> descriptors{0x12, 0x01, 0x00, 0x02, 0x00, 0x00, 0x00, 0x40};
+    for (uint16_t word : {vendor, product, first.release}) Le16(descriptors, word);
+    descriptors.insert(descriptors.end(), {0x01, 0x02, 0x00, 0x01, 0x09, 0x02});
+    Le16(descriptors, static_cast<uint16_t>(9 + 9 * interfaces));
+    descriptors.insert(descriptors.end(), {interfaces, 0x01, 0x00, 0x80, 0x32});
     for (uint8_t i = 0; i < interfaces; ++i) {
-      const std::vector<uint8_t> interface {
-        0x09, 0x04, i, 0x00, 0x00, static_cast<uint8_t>(device->usbfs ? 0xFF : 0x03), 0x00, 0x00,
-            0x00
-      };
-      descriptors.insert(descriptors.end(), interface.begin(), interface.end());
+      const uint8_t interfaceClass = device->usbfs ? 0xFF : 0x03;
+      descriptors.insert(descriptors.end(), {0x09, 0x04, i, 0, 0, interfaceClass, 0, 0, 0});
     }
 
     if (device->usbfs) Attach(*device, first, usbNode, true);
@@ -251,17 +204,11 @@ class UmockdevLab {
         std::snprintf(buffer, sizeof(buffer), "%s/0003:%04X:%04X.%04X", interfacePath.c_str(),
                       vendor, product, hidIndex);
         const std::string hidPath = buffer;
-        const uint16_t page = static_cast<uint16_t>(entry.info.usagePage);
-        const uint16_t usage = static_cast<uint16_t>(entry.info.usage);
-        const std::vector<uint8_t> report{0x06,
-                                          static_cast<uint8_t>(page),
-                                          static_cast<uint8_t>(page >> 8),
-                                          0x0A,
-                                          static_cast<uint8_t>(usage),
-                                          static_cast<uint8_t>(usage >> 8),
-                                          0xA1,
-                                          0x01,
-                                          0xC0};
+        std::vector<uint8_t> report{0x06};
+        Le16(report, static_cast<uint16_t>(entry.info.usagePage));
+        report.push_back(0x0A);
+        Le16(report, static_cast<uint16_t>(entry.info.usage));
+        report.insert(report.end(), {0xA1, 0x01, 0xC0});
         Add("P: " + hidPath + "\nE: SUBSYSTEM=hid\nH: report_descriptor=" + Hex(report) + "\n");
         const unsigned hidraw = mNextHidraw++;
         const std::string name = "hidraw" + std::to_string(hidraw);
@@ -280,12 +227,10 @@ class UmockdevLab {
   void RemoveDevice(std::shared_ptr<SDevice> device_I) {
     // Leaf first, each with its remove event.
     for (auto path = device_I->syspaths.rbegin(); path != device_I->syspaths.rend(); ++path) {
-      const std::string syspath = "/sys" + *path;
-      umockdev_testbed_uevent(mTestbed, syspath.c_str(), "remove");
-      umockdev_testbed_remove_device(mTestbed, syspath.c_str());
+      Remove(*path);
     }
     for (auto& node : device_I->nodes) {
-      umockdev_testbed_detach_ioctl(mTestbed, node->devnode.c_str(), nullptr);
+      umockdev_testbed_detach_ioctl(GetTestbed(), node->devnode.c_str(), nullptr);
       if (node->bound) mBus->Release(node->binding);
       {
         std::lock_guard<std::mutex> guard(node->lock);
@@ -452,7 +397,6 @@ class UmockdevLab {
   }
 
   std::shared_ptr<CLabBus> mBus;
-  UMockdevTestbed* mTestbed;
   std::vector<std::shared_ptr<SDevice>> mDevices;
   std::vector<std::string> mHubs;
   unsigned mNextDevnum = 2;

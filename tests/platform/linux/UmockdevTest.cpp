@@ -29,10 +29,7 @@ class Umockdev : public LabFixture {
  protected:
   void SetUp() override {
     // Without the preload library the real /sys would answer: refuse.
-    const char* preload = std::getenv("LD_PRELOAD");
-    ASSERT_TRUE(preload != nullptr &&
-                std::string(preload).find("umockdev-preload") != std::string::npos)
-        << "run under umockdev-wrapper";
+    ASSERT_TRUE(CEmulatedUsbBus::IsEmulated()) << "run under umockdev-wrapper";
     LabFixture::SetUp();
   }
   void TearDown() override {
@@ -125,10 +122,13 @@ TEST_F(Umockdev, TouchControllerSwitchedOverLibusbAndUpdatedOnItsLoader) {
   EXPECT_TRUE(bulk.IsAlive());
   EXPECT_EQ(touch->GetTrace().back().bytes, (Bytes{0xC1, 0x01, 0, 0, 0, 0, 2, 0, 0x01, 0x00}));
   EXPECT_TRUE(bulk.InitEEPROM());
+  EXPECT_EQ(touch->GetTrace().back().bytes, (Bytes{0x41, 0xF5, 0xFF, 0xFF, 0, 0, 0, 0}));
   EXPECT_EQ(touch->GetEEPROMInits(), 1u);
   Bytes unknownRequest{0x41, 0x77, 0, 0, 0};
   EXPECT_FALSE(bulk.Write(unknownRequest)) << "a stalled control request";
   ASSERT_TRUE(bulk.SwitchToBLMode());
+  TavSleep(1.0);
+  EXPECT_FALSE(bulk.IsAlive()) << "the USB device it had is gone";
   bulk.Close();
 
   const CLabFlash before = touch->GetLoader().GetCpu(1);
@@ -198,6 +198,8 @@ TEST_F(Umockdev, DiscoveryFindsLabProductsBehindTheirHubsThroughLibudev) {
   const auto best = discovery.GetBestDevice();
   ASSERT_NE(best, nullptr);
   EXPECT_TRUE(best->GetIsFlashLoader());
+  EXPECT_EQ(best->GetDeviceName(), "Lab Classic Tablet");
+  EXPECT_EQ(best->GetPenUpdate(), "classic-tablet.pen");
   EXPECT_EQ(best->GetPenInterface()->GetPath(), "31325:770:17891328:1:65280");
   EXPECT_EQ(best->GetTouchInterface()->GetPath(), "31325:785:17956864:0:0");
   EXPECT_NE(discovery.FindDevice(other->GetBluetoothInterface()->GetPath()), nullptr);
