@@ -43,6 +43,15 @@ fi
 touch "$STATE/file"
 refused 1 "--lab-state $STATE/file/lab" --lab --lab-state "$STATE/file/lab" --yes -p ""
 
+# Files --inspect must refuse before reading them.
+mkfifo "$STATE/pipe.pen"
+refused 1 "not a regular file" --inspect "$STATE/pipe.pen"
+truncate -s 1G "$STATE/huge.bin"
+refused 1 "larger than any board takes" --inspect "$STATE/huge.bin"
+refused 1 "No such file or directory" --inspect "$STATE/none.pen"
+echo text >"$STATE/notes.txt"
+refused 1 "is not one of a firmware file (.pen, .touch" --inspect "$STATE/notes.txt"
+
 check() {  # check DESCRIPTION COMMAND...: the command must succeed
   runs=$((runs + 1))
   local what="$1"
@@ -60,6 +69,11 @@ check "log lines in a file carry a timestamp" \
   bash -c '"$0" --log "$1/run.log" --list --lab --lab-state "$1/l" >/dev/null &&
            grep -qE "^[0-9]{4}-[0-9]{2}-[0-9]{2} [0-9:]{8}\.[0-9]{3} \[I\]" "$1/run.log"' \
   "$PROGRAM" "$STATE"
+name="$STATE/$(printf 'odd\377name\001"')".pen
+printf 'S1\n' >"$name"
+check "--inspect --json gives valid JSON whatever the bytes of the path" \
+  bash -c '"$0" --inspect "$1" --json | python3 -c "import json,sys; d=json.load(sys.stdin); assert d[\"error\"]"' \
+  "$PROGRAM" "$name"
 check "the usage line names interface paths" \
   bash -c '"$0" --help | head -1 | grep -qF "[-p PATH]"' "$PROGRAM"
 
