@@ -28,21 +28,19 @@ struct SToolResult {
   std::string mOutput;
 };
 
-bool ToolAvailable(const std::string& tool_I) {
-  return std::system(("command -v " + tool_I + " >/dev/null 2>&1").c_str()) == 0;
-}
-
 SToolResult RunTool(const std::string& command_I) {
   SToolResult result;
   FILE* pipe = popen((command_I + " 2>&1").c_str(), "r");
   if (pipe == nullptr) return result;
   char buffer[4096];
-  size_t count = 0;
-  while ((count = fread(buffer, 1, sizeof buffer, pipe)) > 0) result.mOutput.append(buffer, count);
+  for (size_t n; (n = fread(buffer, 1, sizeof buffer, pipe)) > 0;) result.mOutput.append(buffer, n);
   const int status = pclose(pipe);
   result.mStatus = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
   return result;
 }
+
+#define SKIP_WITHOUT(tool_I) \
+  if (RunTool("command -v " tool_I).mStatus != 0) GTEST_SKIP() << tool_I " is not installed"
 
 // Named after the running test too: ctest runs tests side by side.
 fs::path WriteTemp(const std::string& name_I, const std::string& content_I) {
@@ -80,7 +78,7 @@ std::shared_ptr<CSettingsMap> PortableTree() {
 }
 
 TEST(InteropTest, XmlIsWellFormedForXmllint) {
-  if (!ToolAvailable("xmllint")) GTEST_SKIP() << "xmllint (libxml2-utils) is not installed";
+  SKIP_WITHOUT("xmllint");
   auto tree = PortableTree();
   tree->SetKeyAndString("Escaped", "a<b & \"c\" 'd' ]]> e");
   tree->SetKeyAndKEString("Secret", "k]]>y");
@@ -88,8 +86,11 @@ TEST(InteropTest, XmlIsWellFormedForXmllint) {
   tree->SetKeyAndObject("Nothing", nullptr);
 
   const fs::path xml = WriteTemp("tree.xml", tree->GetXMLString(""));
-  const SToolResult lint = RunTool("xmllint --noout '" + xml.string() + "'");
-  EXPECT_EQ(lint.mStatus, 0) << lint.mOutput;
+  const fs::path plist = WriteTemp("tree.plist", tree->GetPListString(true));
+  for (const fs::path& path : {xml, plist}) {
+    const SToolResult lint = RunTool("xmllint --noout '" + path.string() + "'");
+    EXPECT_EQ(lint.mStatus, 0) << lint.mOutput;
+  }
   for (const auto& [path, expected] :
        {std::pair<const char*, const char*>{"/root/Escaped", "a<b & \"c\" 'd' ]]> e\n"},
         {"/root/Secret", "k&rsqbracket;&rsqbracket;>y\n"},
@@ -98,15 +99,12 @@ TEST(InteropTest, XmlIsWellFormedForXmllint) {
                   .mOutput,
               expected);
   }
-  const fs::path plist = WriteTemp("tree.plist", tree->GetPListString(true));
-  const SToolResult plistLint = RunTool("xmllint --noout '" + plist.string() + "'");
-  EXPECT_EQ(plistLint.mStatus, 0) << plistLint.mOutput;
   fs::remove(xml);
   fs::remove(plist);
 }
 
 TEST(InteropTest, PropertyListAndJsonLoadInPython) {
-  if (!ToolAvailable("python3")) GTEST_SKIP() << "python3 is not installed";
+  SKIP_WITHOUT("python3");
   auto tree = PortableTree();
   const fs::path plist = WriteTemp("tree.plist", tree->GetPListString(true));
   tree->SetKeyAndObject("Nothing", nullptr);
@@ -139,7 +137,7 @@ TEST(InteropTest, PropertyListAndJsonLoadInPython) {
 }
 
 TEST(InteropTest, BinaryFormIsValidBer) {
-  if (!ToolAvailable("openssl")) GTEST_SKIP() << "openssl is not installed";
+  SKIP_WITHOUT("openssl");
   auto list = CSettingsArray::New();
   list->AddBool(true);
   list->AddInteger(100);
