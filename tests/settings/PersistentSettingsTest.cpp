@@ -165,17 +165,6 @@ TEST_F(PersistentSettingsTest, LegacyFileStaysWhenItIsBadOrCannotBeMovedIn) {
   EXPECT_FALSE(blocked.SetKeyAndString("x", "y"));
 }
 
-TEST_F(PersistentSettingsTest, FolderFollowsXdgRules) {
-  EXPECT_EQ(CLinuxPersistentSettings::ConfigFolder(), (mRoot / "config" / "tavik").string());
-  setenv("XDG_CONFIG_HOME", "relative/path", 1);
-  EXPECT_EQ(CLinuxPersistentSettings::ConfigFolder(),
-            (mRoot / "home" / ".config" / "tavik").string());
-  unsetenv("XDG_CONFIG_HOME");
-  EXPECT_EQ(CLinuxPersistentSettings::ConfigFolder(),
-            (mRoot / "home" / ".config" / "tavik").string());
-  EXPECT_EQ(CLinuxPersistentSettings::LegacyFolder(), (mRoot / "home" / ".tavik").string());
-}
-
 TEST_F(PersistentSettingsTest, LoggingSwitchInTheRootIsAnnounced) {
   CLinuxPersistentSettings store;
   store.Init();
