@@ -92,7 +92,7 @@ TEST(CSettingsArrayTest, IndexedAccessReplacesAppendsOrIgnores) {
   }
 }
 
-TEST(CSettingsCastTest, CastsReportAsSpecifiedAndNeverConvert) {
+TEST(CSettingsCastTest, CastsReportWhatTheyGotAndNeverConvert) {
   LogCapture capture;
   auto integer = CSettingsInteger::New(4);
   auto text = CSettingsString::New("4");

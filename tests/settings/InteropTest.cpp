@@ -10,6 +10,7 @@
 
 #include <gtest/gtest.h>
 #include <sys/wait.h>
+#include <unistd.h>
 
 #include <cstdio>
 #include <filesystem>
@@ -140,7 +141,8 @@ TEST(InteropTest, StandardReadersReadWhatWeWrite) {
       missing += std::string(" ") + check.tool;
       continue;
     }
-    const fs::path path = fs::temp_directory_path() / "settings-interop-document";
+    const fs::path path =
+        fs::temp_directory_path() / ("settings-interop-" + std::to_string(getpid()));
     std::ofstream(path, std::ios::binary) << check.document;
     std::string command = check.command;
     command.replace(command.find("FILE"), 4, "'" + path.string() + "'");

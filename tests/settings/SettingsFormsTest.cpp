@@ -2,6 +2,7 @@
 // limit, one table over the forms. Their quirks stay with each form's tests.
 
 #include <gtest/gtest.h>
+#include <unistd.h>
 
 #include <filesystem>
 #include <functional>
@@ -15,7 +16,9 @@ namespace {
 
 using Object = std::shared_ptr<CSettingsObject>;
 using CSO = CSettingsObject;
-const std::string kPath = std::filesystem::temp_directory_path() / "settings-forms-tree";
+// One file a process: ctest runs the tests side by side.
+const std::string kPath =
+    std::filesystem::temp_directory_path() / ("settings-forms-" + std::to_string(getpid()));
 
 Object Xml(const Object& t_I) { return CSO::ReadFromXMLBuffer(t_I->GetXMLString("")); }
 Object XmlFile(const Object& t_I) {
