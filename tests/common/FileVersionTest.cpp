@@ -17,21 +17,15 @@ TEST(FileVersion, ParsesEveryTextForm) {
       {"1.2.3d7", false, FV(1, 2, 3, FV::EDevelopmentVersion, 7)},
       {"1.2.3f8", false, FV(1, 2, 3, fin, 8)}, {"1.2.3?9", false, FV(1, 2, 3, unk, 9)},
       {"1.2.3.4", false, FV(1, 2, 3, fin, 4)}, {"1.2.3", false, FV(1, 2, 3, fin, 0)},
-      {"10.20.30", false, FV(10, 20, 30, fin, 0)}, {"3.21", false, FV(3, 2, 1, unk, 0)},
-      {"3.5", false, FV(3, 0, 5, unk, 0)}, {"7", false, FV(7, 0, 0, unk, 0)},
+      {"3.21", false, FV(3, 2, 1, unk, 0)}, {"7", false, FV(7, 0, 0, unk, 0)},
       {"", false, FV(0, 0, 0, unk, 0)}, {"x.y.z", false, FV(0, 0, 0, fin, 0)},
       // The web flag overrides whatever stage the text gave.
-      {"1.2.3-4", true, FV(1, 2, 3, web, 4)}, {"1.2.3a4", true, FV(1, 2, 3, web, 4)},
-      {"1.2.3", true, FV(1, 2, 3, web, 0)}};
+      {"1.2.3a4", true, FV(1, 2, 3, web, 4)}, {"1.2.3", true, FV(1, 2, 3, web, 0)}};
   // clang-format on
   for (const auto& c : cases) {
     SCOPED_TRACE(c.text);
     const FV version(std::string(c.text), c.web);
-    EXPECT_EQ(version.Major(), c.expected.Major());
-    EXPECT_EQ(version.Minor(), c.expected.Minor());
-    EXPECT_EQ(version.Variation(), c.expected.Variation());
-    EXPECT_EQ(version.Release(), c.expected.Release());
-    EXPECT_EQ(version.Build(), c.expected.Build());
+    EXPECT_EQ(version, c.expected);
   }
   LogCapture capture;
   EXPECT_EQ(FV(std::string("3.21"), true), FV(3, 2, 1, unk, 0));

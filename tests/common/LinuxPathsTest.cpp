@@ -16,19 +16,15 @@ using namespace LinuxPaths;
 class CEnvironment {
  public:
   ~CEnvironment() {
-    for (const auto& [name, value] : mSaved) Apply(name, value ? value->c_str() : nullptr);
+    for (const auto& [name, value] : mSaved) Set(name, value ? value->c_str() : nullptr);
   }
   void Set(const std::string& name_I, const char* value_I) {
     const char* old = std::getenv(name_I.c_str());
-    if (!mSaved.contains(name_I))
-      mSaved[name_I] = old ? std::optional<std::string>(old) : std::nullopt;
-    Apply(name_I, value_I);
+    mSaved.try_emplace(name_I, old ? std::optional<std::string>(old) : std::nullopt);
+    value_I ? setenv(name_I.c_str(), value_I, 1) : unsetenv(name_I.c_str());
   }
 
  private:
-  static void Apply(const std::string& name_I, const char* value_I) {
-    value_I ? setenv(name_I.c_str(), value_I, 1) : unsetenv(name_I.c_str());
-  }
   std::map<std::string, std::optional<std::string>> mSaved;
 };
 
@@ -89,14 +85,14 @@ TEST(LinuxPaths, ComponentAndExtensionOperations) {
        {{"/tmp/scratch.tiff", "/tmp"}, {"/tmp/lock/", "/tmp"}, {"/tmp//lock", "/tmp"},
         {"/tmp", "/"}, {"/", "/"}, {"scratch.tiff", ""}, {"", ""}}},
       {PathExtension, "PathExtension",
-       {{"/tmp/scratch.tiff", "tiff"}, {"/fw/image.airoflash2", "airoflash2"}, {"/tmp/a.b.c/", "c"},
+       {{"/tmp/scratch.tiff", "tiff"}, {"/tmp/a.b.c/", "c"},
         {"/tmp.d/scratch", ""}, {"/home/u/.profile", ""}, {"/", ""}}},
       {DeletePathExtension, "DeletePathExtension",
        {{"/tmp/scratch.tiff", "/tmp/scratch"}, {"/tmp.d/scratch", "/tmp.d/scratch"},
         {"scratch.bundle/", "scratch"}, {"/home/u/.profile", "/home/u/.profile"}, {"/", "/"}}}};
   const std::vector<std::array<const char*, 3>> appends{
       {"/a", "b", "/a/b"}, {"/a/", "/b/", "/a/b"}, {"/", "b", "/b"}, {"", "b", "b"},
-      {"/a//", "", "/a"}, {"Firmware", "pen.pen", "Firmware/pen.pen"}};
+      {"/a//", "", "/a"}};
   // clang-format on
   for (const auto& op : ops) {
     for (const auto& [in, out] : op.cases) EXPECT_EQ(op.op(in), out) << op.name << "(" << in << ")";

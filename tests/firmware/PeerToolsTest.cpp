@@ -2,9 +2,7 @@
 
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <random>
-#include <sstream>
 
 #include "firmware/CIntelHex.h"
 #include "firmware/CSRec.h"
@@ -46,20 +44,18 @@ TEST(PeerTools, SRecordFilesOfSrecCatAndObjcopyLoadByteForByte) {
   const std::string bin = folder.Write("image.bin", image);
   const std::vector<SContinuousDataBlock> one{{0x1000, image}};
   const std::string cat = "srec_cat " + bin + " -binary -offset 0x1000 -o OUT -Motorola";
-  for (int width : {2, 3, 4}) {
-    for (int line : {16, 32, 64}) {
-      const std::string options =
-          " -address-length=" + std::to_string(width) + " -obs=" + std::to_string(line);
-      EXPECT_EQ(LoadSRec(Make(folder, "w" + std::to_string(width) + ".pen", cat + options)), one)
-          << options;
-    }
+  // S1, S2 and S3 records, each with another line length.
+  for (const auto& [width, line] : {std::pair{2, 16}, {3, 32}, {4, 64}}) {
+    const std::string options =
+        " -address-length=" + std::to_string(width) + " -obs=" + std::to_string(line);
+    EXPECT_EQ(LoadSRec(Make(folder, "w.pen", cat + options)), one) << options;
   }
   EXPECT_EQ(LoadSRec(Make(folder, "crlf.touch", cat + " -crlf")), one);
-  const std::string objcopied =
-      Make(folder, "obj.tav",
-           "objcopy -I binary -O srec --srec-len=28 --srec-forceS3 --change-addresses 0x1000 " +
-               bin + " OUT");
-  EXPECT_EQ(LoadSRec(objcopied), one);
+  EXPECT_EQ(LoadSRec(Make(folder, "obj.tav",
+                          "objcopy -I binary -O srec --srec-len=28 --srec-forceS3 "
+                          "--change-addresses 0x1000 " +
+                              bin + " OUT")),
+            one);
 
   // Two pieces with a hole: two blocks.
   const std::vector<uint8_t> second = RandomImage(500, 2);
@@ -68,23 +64,6 @@ TEST(PeerTools, SRecordFilesOfSrecCatAndObjcopyLoadByteForByte) {
                           "srec_cat " + bin + " -binary -offset 0x100 " + bin2 +
                               " -binary -offset 0x2000 -o OUT -Motorola")),
             (std::vector<SContinuousDataBlock>{{0x100, image}, {0x2000, second}}));
-
-  // The same records shuffled: blocks may stay apart, the image may not change.
-  std::istringstream lines(CTempFolder::Read(objcopied));
-  std::vector<std::string> records;
-  for (std::string line; std::getline(lines, line);) records.push_back(line);
-  std::shuffle(records.begin() + 1, records.end(), std::mt19937(3));
-  std::string shuffled;
-  for (const std::string& line : records) shuffled += line + "\n";
-  const std::vector<SContinuousDataBlock> blocks = LoadSRec(folder.Write("shuffled.tav", shuffled));
-  ASSERT_FALSE(blocks.empty());
-  EXPECT_EQ(blocks.front().startAddress, 0x1000u);
-  std::vector<uint8_t> flat;  // laid out from the lowest start, gaps erased
-  for (const SContinuousDataBlock& block : blocks) {
-    flat.resize(block.startAddress - 0x1000, 0xFF);
-    flat.insert(flat.end(), block.data.begin(), block.data.end());
-  }
-  EXPECT_EQ(flat, image);
 }
 
 TEST(PeerTools, IntelHexFilesOfSrecCatAndObjcopyLoadByteForByte) {

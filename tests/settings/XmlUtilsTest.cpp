@@ -155,8 +155,8 @@ TEST_F(XmlUtilsTest, MergeMatchesByNameAndAttributesAndAppendsTheRest) {
   XmlUtils::MergeNodes(xmlDocGetRootElement(target2), nullptr);
 }
 
-TEST(XmlUtilsMatchTest, NodesMatchIgnoresCaseAndNeedsOnlyTheMarkerToExist) {
-  xmlDocPtr doc = XmlUtils::LoadXmlDocumentFromMemory(
+TEST_F(XmlUtilsTest, NodesMatchIgnoresCaseAndNeedsOnlyTheMarkerToExist) {
+  xmlDocPtr doc = Load(
       "<r><a k=\"V\" matchUsingAttributes=\"1\"/><A k=\"v\" matchUsingAttributes=\"0\"/>"
       "<a k=\"v\"/><a/></r>");
   xmlNodePtr root = xmlDocGetRootElement(doc);
@@ -172,7 +172,6 @@ TEST(XmlUtilsMatchTest, NodesMatchIgnoresCaseAndNeedsOnlyTheMarkerToExist) {
   // Attribute values compare ignoring case, so the first child already matches.
   EXPECT_EQ(XmlUtils::ChildMatchingNode(root, third), first);
   EXPECT_EQ(XmlUtils::ChildMatchingNode(XmlUtils::GetChildNode(root, 3), third), nullptr);
-  XmlUtils::FreeDoc(doc);
 }
 
 }  // namespace
