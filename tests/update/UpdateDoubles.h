@@ -75,6 +75,7 @@ class CLog {
   std::vector<T> mItems;
 };
 using CJournal = CLog<std::string>;
+using Words = std::vector<std::string>;
 
 inline std::string Error(ECONTROLLER_ERROR error_I, const std::string& text_I) {
   return std::to_string(error_I) + ":" + text_I;
@@ -114,16 +115,11 @@ class CFakeInterface : public CFLDeviceInterface {
     mBLParams.numFlashBlocks = mBlocks;
     return Call("Init", "(" + std::to_string(bytes) + " bytes)");
   }
-  void SetBinaryAiroFlashData(std::shared_ptr<CBinaryAiroFlash> data_I) override {
-    Call("SetBinaryAiroFlashData");
-    CFLDeviceInterface::SetBinaryAiroFlashData(std::move(data_I));
-  }
-  void SetScalarBinaryData(std::shared_ptr<CScalarBinary> data_I) override {
-    Call("SetScalarBinaryData");
-    CFLDeviceInterface::SetScalarBinaryData(std::move(data_I));
-  }
+  // Says which binary image, if any, was handed over before it.
   bool ProgramBoard() override {
-    const bool ok = Call("ProgramBoard");
+    const bool ok = Call("ProgramBoard", GetAiroFlashData()      ? "(airoflash)"
+                                         : GetScalarBinaryData() ? "(scalar binary)"
+                                                                 : "");
     if (mNotifier != nullptr) mNotifier->InterfaceProgress(50);
     if (!ok && mNotifier != nullptr) mNotifier->InterfaceError("lab: write failed");
     if (ok) CFLDeviceInterface::UpdateChecksums(0x1111, 0x2222, 0x3333);
