@@ -102,12 +102,17 @@ TEST_F(Updater, SetupParsesTheArgumentsOnceTheWatchStandsAndTheWatchFilters) {
   EXPECT_EQ(updater->deviceUpdates().size(), 2u);
 
   // Attach and detach of watched interfaces reach the controller; others do not.
-  updater->GetController().ProcessStateChange(ESTATE_WAIT_LOADER);
-  mRegistry->Deliver(true, {kVendor, 0x101, 1, 0x02, 0x0001});  // another usage
-  mRegistry->Deliver(true, {0x1234, 0x101, 1, 0x01, 0xFF00});   // another vendor
-  EXPECT_EQ(updater->GetController().GetState(), ESTATE_WAIT_LOADER);
-  mRegistry->Deliver(true, {kVendor, 0x101, 1, 0x01, 0xFF00});
-  EXPECT_EQ(updater->GetController().GetState(), ESTATE_PROGRAM);
+  CUpdateController& controller = updater->GetController();
+  controller.ProcessStateChange(ESTATE_WAIT_LOADER);
+  updater->DeviceAdded({kVendor, 0x101, 1, 0x02, 0x0001});  // another usage
+  updater->DeviceAdded({0x1234, 0x101, 1, 0x01, 0xFF00});   // another vendor
+  EXPECT_EQ(controller.GetState(), ESTATE_WAIT_LOADER);
+  updater->DeviceAdded({kVendor, 0x101, 1, 0x01, 0xFF00});
+  EXPECT_EQ(controller.GetState(), ESTATE_PROGRAM);
+  mBus->devices.front()->SetPenIntoBLMode(true);  // now the pen's detach ends the run
+  controller.ProcessStateChange(ESTATE_READY);
+  updater->DeviceRemoved({kVendor, 0x100, 16777216, 0x01, 0xFF00});
+  EXPECT_EQ(controller.GetState(), ESTATE_TERMINATE);
 }
 
 TEST_F(Updater, TheUpdateThreadTellsTheApplicationEveryStep) {
@@ -212,14 +217,14 @@ TEST_F(Updater, UpdateDeviceListMakesUpForAMissedReEnumeration) {
 
   // On the way to the loader, the one present interface is the loader.
   const DeviceInfo loader{kVendor, 0x101, 7, 1, 0xFF00};
-  mRegistry->SetEntries({SHidEntry{loader, "/dev/hidraw1", 0, 0, 0}});
+  mRegistry->mEntries = {SHidEntry{loader, "/dev/hidraw1", 0, 0, 0}};
   controller.ProcessStateChange(ESTATE_WAIT_LOADER);
   updater->updateDeviceList(true);
   EXPECT_EQ(controller.GetState(), ESTATE_PROGRAM);
 
   // Two present interfaces: nothing is made up.
-  mRegistry->SetEntries({SHidEntry{loader, "/dev/hidraw1", 0, 0, 0},
-                         SHidEntry{{kVendor, 0x100, 7, 1, 0xFF00}, "/dev/hidraw2", 0, 0, 0}});
+  mRegistry->mEntries = {SHidEntry{loader, "/dev/hidraw1", 0, 0, 0},
+                         SHidEntry{{kVendor, 0x100, 7, 1, 0xFF00}, "/dev/hidraw2", 0, 0, 0}};
   controller.ProcessStateChange(ESTATE_WAIT_DEVICE);
   updater->updateDeviceList(false);
   EXPECT_EQ(controller.GetState(), ESTATE_WAIT_DEVICE);

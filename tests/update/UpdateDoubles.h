@@ -7,7 +7,6 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <condition_variable>
 #include <filesystem>
 #include <fstream>
 #include <functional>
@@ -68,6 +67,11 @@ class CLog {
   void Clear() {
     std::lock_guard<std::mutex> guard(mLock);
     mItems.clear();
+  }
+  // Adds "<what><number>".
+  template <typename V>
+  void Add(const char* what_I, V value_I) {
+    Add(what_I + std::to_string(value_I));
   }
 
  private:
@@ -172,47 +176,17 @@ class CFakeDiscovery : public CDiscovery {
   std::shared_ptr<SBus> mBus;
 };
 
-// Lists the entries a test sets; its watch hands the events a test delivers
-// to the watcher, until stopped.
+// Lists the entries a test sets. Its watch ends at once: tests hand
+// attach and detach to the watcher themselves.
 class CFakeRegistry : public CDeviceRegistry {
  public:
-  std::vector<SHidEntry> ListHidInterfaces(uint32_t) override {
-    std::lock_guard<std::mutex> guard(mLock);
-    return mEntries;
-  }
+  std::vector<SHidEntry> ListHidInterfaces(uint32_t) override { return mEntries; }
   std::vector<SUsbEntry> ListUsbDevices(uint32_t) override { return {}; }
   bool OpenWatch() override { return mCanWatch; }
-  void RunWatch(CRegistryWatcher& watcher_I) override {
-    std::unique_lock<std::mutex> lock(mLock);
-    mWatcher = &watcher_I;
-    mChanged.notify_all();
-    mChanged.wait(lock, [this] { return mStopped; });
-    mWatcher = nullptr;
-  }
-  void StopWatching() override {
-    std::lock_guard<std::mutex> guard(mLock);
-    mStopped = true;
-    mChanged.notify_all();
-  }
-  void SetEntries(std::vector<SHidEntry> entries_I) {
-    std::lock_guard<std::mutex> guard(mLock);
-    mEntries = std::move(entries_I);
-  }
-  // Once the watch runs, hands it one attach or detach.
-  void Deliver(bool added_I, const DeviceInfo& info_I) {
-    std::unique_lock<std::mutex> lock(mLock);
-    mChanged.wait(lock, [this] { return mWatcher != nullptr; });
-    added_I ? mWatcher->DeviceAdded(info_I) : mWatcher->DeviceRemoved(info_I);
-  }
-
+  void RunWatch(CRegistryWatcher&) override {}
+  void StopWatching() override {}
   bool mCanWatch = true;
-
- private:
-  std::mutex mLock;
-  std::condition_variable mChanged;
   std::vector<SHidEntry> mEntries;
-  CRegistryWatcher* mWatcher = nullptr;
-  bool mStopped = false;
 };
 
 class CFakePower : public CPowerInhibitor {
@@ -235,32 +209,27 @@ class CFakePower : public CPowerInhibitor {
 class CRecordingDelegate : public CApplicationDelegate {
  public:
   bool userLaunched() const override { return mUserLaunched; }
-  void doStateMachine(ECONTROLLER_STATE state_I) override {
-    mJournal.Add("state:" + std::to_string(state_I));
-  }
-  void updateProgressBar(double percent_I) override {
-    mJournal.Add("bar:" + std::to_string(percent_I));
-  }
+  void doStateMachine(ECONTROLLER_STATE state_I) override { mJournal.Add("state:", state_I); }
+  void updateProgressBar(double percent_I) override { mJournal.Add("bar:", percent_I); }
   void notifyDialog(const std::string& text_I) override { mJournal.Add("dialog:" + text_I); }
-  void terminate(ERunOutcome outcome_I) override {
-    mJournal.Add("terminate:" + std::to_string(outcome_I));
-  }
+  void terminate(ERunOutcome outcome_I) override { mJournal.Add("terminate:", outcome_I); }
   bool mUserLaunched = true;
   CJournal mJournal;
 };
 
-// Journals what the application shows; tasks for later wait for RunDelayed.
+// Journals what the application shows, on the thread that asks; tasks for
+// later wait for RunDelayed.
 class CFakeWindow : public CWindowController {
  public:
-  void initForDialog(bool commandLine_I) override { Add("init:", commandLine_I); }
+  void initForDialog(bool commandLine_I) override { mCalls.Add("init:", commandLine_I); }
   void showWindow() override { mCalls.Add("show"); }
-  void enableClose(bool enable_I) override { Add("close:", enable_I); }
+  void enableClose(bool enable_I) override { mCalls.Add("close:", enable_I); }
   void SetCloseHandler(std::function<void()>) override {}
   void setStatusText(const std::string& text_I) override { mCalls.Add("text:" + text_I); }
   void setStatusProgress(double percent_I) override {
-    Add("progress:", static_cast<int>(percent_I));
+    mCalls.Add("progress:", static_cast<int>(percent_I));
   }
-  void setStatusColor(ESTATUS_COLOR color_I) override { Add("color:", color_I); }
+  void setStatusColor(ESTATUS_COLOR color_I) override { mCalls.Add("color:", color_I); }
   void setTabletName(const std::string& name_I) override { mCalls.Add("name:" + name_I); }
   void setBoardArray(const std::vector<std::string>& boards_I) override {
     std::string joined;
@@ -273,8 +242,8 @@ class CFakeWindow : public CWindowController {
   void setTouchFirmwareVersion(uint32_t) override {}
   void setTouchOldChecksum(uint32_t) override {}
   void setTouchNewChecksum(uint32_t) override {}
-  void enableUIElements(bool enable_I) override { Add("ui:", enable_I); }
-  void enableProgramButton(bool enable_I) override { Add("button:", enable_I); }
+  void enableUIElements(bool enable_I) override { mCalls.Add("ui:", enable_I); }
+  void enableProgramButton(bool enable_I) override { mCalls.Add("button:", enable_I); }
   int ShowAlert(const SAlert& alert_I) override {
     mCalls.Add("alert:" + alert_I.message + "|" + alert_I.informativeText);
     mLastAlert = alert_I;
@@ -288,22 +257,17 @@ class CFakeWindow : public CWindowController {
   void QuitMainLoop() override {}
   void PostToMainLoop(std::function<void()> task_I) override { task_I(); }
   void PostToMainLoopAfter(double delay_I, std::function<void()> task_I) override {
-    std::lock_guard<std::mutex> guard(mTaskLock);
     mDelayed.emplace_back(delay_I, std::move(task_I));
   }
   bool IsMainLoopThread() const override { return true; }
 
   // Runs the oldest task for later; -1 when there is none, else its delay.
   double RunDelayed() {
-    std::pair<double, std::function<void()>> next;
-    {
-      std::lock_guard<std::mutex> guard(mTaskLock);
-      if (mDelayed.empty()) return -1;
-      next = std::move(mDelayed.front());
-      mDelayed.erase(mDelayed.begin());
-    }
-    next.second();
-    return next.first;
+    if (mDelayed.empty()) return -1;
+    const auto [delay, task] = mDelayed.front();
+    mDelayed.erase(mDelayed.begin());
+    task();
+    return delay;
   }
 
   bool mAnswerYes = true;
@@ -311,8 +275,6 @@ class CFakeWindow : public CWindowController {
   CJournal mCalls;
 
  private:
-  void Add(const char* call_I, int value_I) { mCalls.Add(call_I + std::to_string(value_I)); }
-  std::mutex mTaskLock;
   std::vector<std::pair<double, std::function<void()>>> mDelayed;
 };
 
