@@ -1,6 +1,6 @@
 // The application object: launch rules, the state table, the moving text,
 // the driver's stop and start, and every way out.
-#include <atomic>
+#include <future>
 #include <thread>
 
 #include "common/CMainThreadLoop.h"
@@ -34,17 +34,17 @@ class Application : public UpdateFixture {
     mReport.clear();
     mErrors.clear();
     mExitStatus = -100;
-    SApplicationSetup app;
-    app.window = &mWindow;
-    app.desktop = mDesktop;
-    app.terminal = terminal_I;
-    app.exitProcess = [this](int status_I) {
-      mExitStatus = status_I;
-      if (mLoop) mLoop->Quit();
-    };
-    app.printResult = [this](const std::string& line_I) { mReport.push_back(line_I); };
-    app.printError = [this](const std::string& line_I) { mErrors.push_back(line_I); };
-    mApp = std::make_unique<FLAppDelegate>(app);
+    mApp = std::make_unique<FLAppDelegate>(SApplicationSetup{
+        .window = &mWindow,
+        .desktop = mDesktop,
+        .terminal = terminal_I,
+        .exitProcess =
+            [this](int status_I) {
+              mExitStatus = status_I;
+              if (mLoop) mLoop->Quit();
+            },
+        .printResult = [this](const std::string& line_I) { mReport.push_back(line_I); },
+        .printError = [this](const std::string& line_I) { mErrors.push_back(line_I); }});
     return *mApp;
   }
 
@@ -69,13 +69,9 @@ class Application : public UpdateFixture {
 
 TEST_F(Application, LaunchSenderDecidesWhetherTheUserStartedUs) {
   AttachPen();
-  const struct {
-    int pid;
-    std::string id;
-    bool application;
-    int arguments;
-    bool userLaunched;
-  } rows[] = {
+  // The sender's pid, its id, whether it is an application, our argument
+  // count, and whether the user started us.
+  const std::vector<std::tuple<int, std::string, bool, int, bool>> rows = {
       {42, "com.tavik.TabletDriver", true, 1, false},  // a program of the family
       {42, "com.tavik.helper", false, 1, false},       // its executable, not an application
       {42, "bash", false, 3, false},                   // a shell, with arguments
@@ -84,15 +80,13 @@ TEST_F(Application, LaunchSenderDecidesWhetherTheUserStartedUs) {
       {0, "", false, 3, true},                         // sender unknown
   };
   mWindow.mAnswerYes = false;
-  for (const auto& row : rows) {
-    SCOPED_TRACE(row.id + " " + std::to_string(row.arguments));
-    mDesktop->mSenderPid = row.pid;
-    mDesktop->mSenderId = row.id;
-    mDesktop->mSenderIsApplication = row.application;
-    mDesktop->mArgumentCount = row.arguments;
+  for (const auto& [pid, id, application, arguments, userLaunched] : rows) {
+    SCOPED_TRACE(id + " " + std::to_string(arguments));
+    std::tie(mDesktop->mSenderPid, mDesktop->mSenderId, mDesktop->mSenderIsApplication,
+             mDesktop->mArgumentCount) = std::tie(pid, id, application, arguments);
     FLAppDelegate& app = Make({"-p", ""});
     app.applicationDidFinishLaunching();
-    EXPECT_EQ(app.userLaunched(), row.userLaunched);
+    EXPECT_EQ(app.userLaunched(), userLaunched);
   }
 }
 
@@ -119,12 +113,10 @@ TEST_F(Application, SuccessfulRunShowsEveryStepAndEndsWithStatusZero) {
   EXPECT_EQ(mExitStatus, 0);
   EXPECT_EQ(mReport.back(), T("Result: the firmware was updated."));
   // The driver was stopped before the update and started after it.
-  const Words desktop = mDesktop->mJournal.Get();
-  ASSERT_GE(desktop.size(), 3u);
-  EXPECT_EQ(desktop[0], "notify:com.tavik.removeTavikTablet.closeModalDialog");
-  EXPECT_EQ(desktop[1], "quit:77");
-  EXPECT_EQ(desktop.back(), "notify:com.tavik.TFUCompleted");
-  EXPECT_TRUE(mDesktop->mJournal.Has("launch:com.tavik.TabletDriver"));
+  EXPECT_EQ(mDesktop->mJournal.Get(),
+            (Words{"notify:com.tavik.removeTavikTablet.closeModalDialog", "quit:77",
+                   "launch:com.tavik.taviktablet", "launch:com.tavik.TabletDriver",
+                   "launch:com.tavik.TavikTouchDriver", "notify:com.tavik.TFUCompleted"}));
 
   const CJournal& window = mWindow.mCalls;
   EXPECT_LT(window.At("init:1"), window.At("ask"));
@@ -252,16 +244,14 @@ TEST_F(Application, WatchThatCannotBeSetUpEndsTheRunOnARealMainLoop) {
   CMainThreadLoop loop;
   loop.RegisterMainThread();
   mLoop = &loop;
-  std::atomic<bool> ended{false};
-  std::thread watchdog([&] {
-    for (int i = 0; i < 1000 && !ended; ++i) {
-      std::this_thread::sleep_for(std::chrono::milliseconds(10));
-    }
+  std::promise<void> ended;
+  std::thread watchdog([&loop, done = ended.get_future()] {
+    done.wait_for(std::chrono::seconds(10));
     loop.Quit();
   });
   loop.Post([&app] { app.applicationDidFinishLaunching(); });
   loop.Run();
-  ended = true;
+  ended.set_value();
   watchdog.join();
   mLoop = nullptr;
   loop.Unregister();

@@ -14,9 +14,9 @@ class Updater : public UpdateFixture {
   OFLUpdater* Make(std::vector<std::string> arguments_I) {
     OFLUpdater::DisposeInstance();
     SUpdaterSetup setup = Setup(std::move(arguments_I));
-    setup.preferencesFolder = (mFolder / "prefs").string();
-    setup.executableFolder = (mFolder / "bin").string();
-    setup.installedDataFolder = (mFolder / "share").string();
+    std::tie(setup.preferencesFolder, setup.executableFolder, setup.installedDataFolder) =
+        std::tuple((mFolder / "prefs").string(), (mFolder / "bin").string(),
+                   (mFolder / "share").string());
     setup.delegate = &mDelegate;
     OFLUpdater::Configure(std::move(setup));
     return OFLUpdater::updater();
