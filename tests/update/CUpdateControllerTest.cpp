@@ -56,7 +56,7 @@ class ControllerTest : public UpdateFixture {
     mJournal.Clear();
   }
   void Connect(std::vector<std::shared_ptr<CDevice>> devices_I) {
-    mBus->Set(std::move(devices_I));
+    mBus->devices = std::move(devices_I);
     ASSERT_TRUE(mController->UpdateDeviceList());
   }
   // A pen of this transport; without intoBLMode it switches in place.
@@ -74,13 +74,13 @@ class ControllerTest : public UpdateFixture {
     mLoaderDevice = Product(mLoader, true, true);
     mPen->mOnSwitchTo = [this] {
       mClock->Schedule(3, [this] {
-        mBus->Set({mLoaderDevice});
+        mBus->devices = {mLoaderDevice};
         mController->DeviceAttach(kLoaderPath);
       });
     };
     mLoader->mOnSwitchFrom = [this] {
       mClock->Schedule(2, [this] {
-        mBus->Set({Product(Board("penAgain", kNormalPath), false, true)});
+        mBus->devices = {Product(Board("penAgain", kNormalPath), false, true)};
         mController->DeviceAttach(kNormalPath);
       });
     };
@@ -320,7 +320,7 @@ TEST_F(Failure, NoDeviceNoInterfaceOrNoFileStopsBeforeTheBoardIsProgrammed) {
 }
 
 TEST_F(File, TheTypeDecidesWhichImagesFit) {
-  mBus->Set({Product(Board("pen", kNormalPath), false, true, Board("touch", kTouchPath))});
+  mBus->devices = {Product(Board("pen", kNormalPath), false, true, Board("touch", kTouchPath))};
   // A touch image loads for a pen update, but does not fit.
   // clang-format off
   const std::vector<std::tuple<EUPDATE_TYPE, const char*, ECONTROLLER_ERROR>> rows = {
@@ -446,7 +446,7 @@ TEST_F(Attach, UnimportantDetachesAreIgnored) {
 TEST_F(Attach, SelectionRefusesInvalidDevicesAndCheckDeviceListAlwaysCloses) {
   auto pen = Board("pen", kNormalPath);
   auto device = Product(pen, false, true);
-  mBus->Set({device});
+  mBus->devices = {device};
   EXPECT_FALSE(mController->CheckDeviceList());  // nothing selected
   EXPECT_FALSE(mController->SetSelectedDevice(std::shared_ptr<CDevice>()));
   EXPECT_FALSE(mController->SetSelectedDevice(std::make_shared<CDevice>()));  // no name

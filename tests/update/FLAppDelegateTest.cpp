@@ -140,63 +140,47 @@ TEST_F(Application, WindowRunExitsWithZeroWhateverTheOutcome) {
 
 TEST_F(Application, TerminalStatusesTellEachOutcome) {
   const std::string file = (mFolder / "cfg" / "Firmware" / "pen.pen").string();
-  const struct {
-    const char* name;
-    Words arguments;
-    std::function<void(CFakeInterface&)> change;
-    int status;
-    std::string shown;  // a line of the report, or a dialog
-  } rows[] = {
-      {"programming fails",
-       {"-p", ""},
-       [](CFakeInterface& pen_I) { pen_I.mFails = {"ProgramBoard"}; },
-       ERUN_FAILED,
-       "  pen controller of Lab Tablet: failed: lab: write failed"},
-      {"the user says no",
-       {"-p", ""},
-       [this](CFakeInterface&) { mWindow.mAnswerYes = false; },
-       ERUN_DECLINED,
-       "ask"},
-      {"no tablet",
-       {"-p", ""},
-       [this](CFakeInterface&) { mBus->Set({}); },
-       ERUN_NO_DEVICE,
-       Alert(T("Error: No supported tablet is connected. Please connect a tablet."))},
-      {"no firmware file",
-       {"-p", ""},
-       [&file](CFakeInterface&) { fs::remove(file); },
-       ERUN_REFUSED_FILE,
-       "  " + T("pen controller") + " of Lab Tablet: " + T("firmware file refused") + ": " + file +
-           ": No such file or directory"},
-      // A product without the board asked for says so, not that the file is bad.
-      {"no such board",
-       {"-b", ""},
-       [](CFakeInterface&) {},
-       ERUN_NO_DEVICE,
-       Alert("Error: Lab Tablet has no " + T("Bluetooth module") + " to update.")},
-      {"the loader never comes",
-       {"-p", ""},
-       [this](CFakeInterface&) { mBus->devices.front()->SetPenIntoBLMode(true); },
-       ERUN_FAILED,
-       "  pen controller of Lab Tablet: failed: the board did not reach its loader mode in time"},
+  const auto none = [](CFakeInterface&) {};
+  // What changes, the status, and a line of the report or a dialog shown.
+  // clang-format off
+  const std::vector<std::tuple<const char*, Words, std::function<void(CFakeInterface&)>, int,
+                               std::string>> rows = {
+    {"programming fails", {"-p", ""},
+     [](CFakeInterface& pen_I) { pen_I.mFails = {"ProgramBoard"}; }, ERUN_FAILED,
+     "  pen controller of Lab Tablet: failed: lab: write failed"},
+    {"the user says no", {"-p", ""}, [this](CFakeInterface&) { mWindow.mAnswerYes = false; },
+     ERUN_DECLINED, "ask"},
+    {"no tablet", {"-p", ""}, [this](CFakeInterface&) { mBus->devices = {}; }, ERUN_NO_DEVICE,
+     Alert(T("Error: No supported tablet is connected. Please connect a tablet."))},
+    {"no firmware file", {"-p", ""}, [&file](CFakeInterface&) { fs::remove(file); },
+     ERUN_REFUSED_FILE,
+     "  " + T("pen controller") + " of Lab Tablet: " + T("firmware file refused") + ": " + file +
+         ": No such file or directory"},
+    // A product without the board asked for says so, not that the file is bad.
+    {"no such board", {"-b", ""}, none, ERUN_NO_DEVICE,
+     Alert("Error: Lab Tablet has no " + T("Bluetooth module") + " to update.")},
+    {"the loader never comes", {"-p", ""},
+     [this](CFakeInterface&) { mBus->devices.front()->SetPenIntoBLMode(true); }, ERUN_FAILED,
+     "  pen controller of Lab Tablet: failed: the board did not reach its loader mode in time"},
   };
+  // clang-format on
   const std::map<int, const char*> results = {
       {ERUN_FAILED, "Result: the update failed."},
       {ERUN_DECLINED, "Result: nothing was updated."},
       {ERUN_NO_DEVICE, "Result: no supported tablet is connected."},
       {ERUN_REFUSED_FILE, "Result: the firmware file was refused."}};
-  for (const auto& row : rows) {
-    SCOPED_TRACE(row.name);
+  for (const auto& [name, arguments, change, status, shown] : rows) {
+    SCOPED_TRACE(name);
     auto pen = AttachPen();
     WriteConfig();
     mWindow.mAnswerYes = true;
-    row.change(*pen);
-    RunToTheEnd(Make(row.arguments));
-    EXPECT_EQ(mExitStatus, row.status);
-    EXPECT_TRUE(mWindow.mCalls.Has(row.shown) ||
-                std::find(mReport.begin(), mReport.end(), row.shown) != mReport.end());
+    change(*pen);
+    RunToTheEnd(Make(arguments));
+    EXPECT_EQ(mExitStatus, status);
+    EXPECT_TRUE(mWindow.mCalls.Has(shown) ||
+                std::find(mReport.begin(), mReport.end(), shown) != mReport.end());
     ASSERT_FALSE(mReport.empty());
-    EXPECT_EQ(mReport.back(), T(results.at(row.status)));
+    EXPECT_EQ(mReport.back(), T(results.at(status)));
   }
 }
 

@@ -124,53 +124,46 @@ TEST_F(Updater, TheUpdateThreadTellsTheApplicationEveryStep) {
                            "state:5", "state:5", "bar:100.000000"}) {
     updated.push_back(step);
   }
-  const struct {
-    const char* name;
-    Words arguments;
-    const char* penUpdate;
-    bool refusePower;
-    double seconds;  // of the update thread
-    Words delegate;
-  } rows[] = {
-      {"an update, under a power assertion", {"-p", ""}, "pen.pen", false, 0.0, updated},
-      {"no power assertion, no update", {"-p", ""}, "pen.pen", true, 0.0, ready},
-      // Five one-second tries to select the path, then the board found.
-      {"an unknown path", {"-p", "1:2:3:4:5"}, "pen.pen", false, 5.0, updated},
-      {"a refused file",
-       {"-p", ""},
-       "missing.pen",
-       false,
-       0.0,
-       {"state:3", "state:0", "state:0",
-        "dialog:Error: The specified file does not appear to be a valid firmware file.",
-        "terminate:3"}},
-      // Still a command line, with nothing to do.
-      {"no arguments", {}, "pen.pen", false, 0.0, {"state:3"}},
+  // The pen's option, its firmware, whether power stays on, the seconds of
+  // the update thread and what the application was told.
+  // clang-format off
+  const std::vector<std::tuple<const char*, Words, const char*, bool, double, Words>> rows = {
+    {"an update, under a power assertion", {"-p", ""}, "pen.pen", false, 0.0, updated},
+    {"no power assertion, no update", {"-p", ""}, "pen.pen", true, 0.0, ready},
+    // Five one-second tries to select the path, then the board found.
+    {"an unknown path", {"-p", "1:2:3:4:5"}, "pen.pen", false, 5.0, updated},
+    {"a refused file", {"-p", ""}, "missing.pen", false, 0.0,
+     {"state:3", "state:0", "state:0",
+      "dialog:Error: The specified file does not appear to be a valid firmware file.",
+      "terminate:3"}},
+    // Still a command line, with nothing to do.
+    {"no arguments", {}, "pen.pen", false, 0.0, {"state:3"}},
   };
-  for (const auto& row : rows) {
-    SCOPED_TRACE(row.name);
+  // clang-format on
+  for (const auto& [name, option, penUpdate, refusePower, seconds, delegate] : rows) {
+    SCOPED_TRACE(name);
     AttachPen();
-    mBus->devices.front()->SetPenUpdate(row.penUpdate);
-    mPower->mRefuse = row.refusePower;
+    mBus->devices.front()->SetPenUpdate(penUpdate);
+    mPower->mRefuse = refusePower;
     mPower->mNames.Clear();
     mDelegate.mJournal.Clear();
     mJournal.Clear();
     Words arguments = {"prog", "-f", config};
-    arguments.insert(arguments.end(), row.arguments.begin(), row.arguments.end());
+    arguments.insert(arguments.end(), option.begin(), option.end());
     OFLUpdater* updater = Make(arguments);
     ASSERT_TRUE(updater->setupUpdate());
     const double before = mClock->Now();
     updater->boardProgram();
     updater->joinProgramThread();
-    EXPECT_DOUBLE_EQ(mClock->Now() - before, row.seconds);
-    EXPECT_EQ(mDelegate.mJournal.Get(), row.delegate);
-    const bool programmed = row.delegate.back() == "bar:100.000000";
+    EXPECT_DOUBLE_EQ(mClock->Now() - before, seconds);
+    EXPECT_EQ(mDelegate.mJournal.Get(), delegate);
+    const bool programmed = delegate.back() == "bar:100.000000";
     EXPECT_EQ(mJournal.Has("pen.ProgramBoard"), programmed);
     EXPECT_EQ(mPower->mNames.Get(),
-              programmed || row.refusePower ? Words{"Updating Tavik tablet firmware"} : Words{});
+              programmed || refusePower ? Words{"Updating Tavik tablet firmware"} : Words{});
     EXPECT_EQ(mPower->mHeld, 0);  // released after the update
     // The file is the one beside the configuration once the board is ready.
-    if (std::count(row.delegate.begin(), row.delegate.end(), "state:1") != 0) {
+    if (std::count(delegate.begin(), delegate.end(), "state:1") != 0) {
       EXPECT_EQ(updater->GetController().GetUpdateFile(), pen);
     }
   }

@@ -9,20 +9,12 @@
 #include <algorithm>
 #include <filesystem>
 #include <fstream>
-#include <functional>
 #include <map>
-#include <mutex>
 #include <set>
 
 #include "common/CVirtualClock.h"
-#include "devices/CDiscovery.h"
 #include "flash/CFLDeviceInterface.h"
-#include "seams/CDesktop.h"
-#include "seams/CDeviceRegistry.h"
-#include "seams/CPowerInhibitor.h"
 #include "support/LogCapture.h"
-#include "update/CUpdateNotifier.h"
-#include "update/CWindowController.h"
 #include "update/FLAppDelegate.h"
 #include "update/OFLUpdater.h"
 
@@ -41,41 +33,28 @@ constexpr const char* kImage =
     "S1131020E0E7EEF5FC030A11181F262D343B424974\nS113103050575E656C737A81888F969DA4ABB2B964\n"
     "S9030000FC\n";
 
-// A list any thread may add to; the order is what tests check.
+// What a double was asked, in order. One thread writes at a time: the
+// others wait on the clock, a join or a dispatch.
 template <typename T>
 class CLog {
  public:
-  void Add(T item_I) {
-    std::lock_guard<std::mutex> guard(mLock);
-    mItems.push_back(std::move(item_I));
-  }
-  std::vector<T> Get() const {
-    std::lock_guard<std::mutex> guard(mLock);
-    return mItems;
-  }
-  // Index of the first `item_I`, or -1.
-  int At(const T& item_I) const {
-    const std::vector<T> items = Get();
-    const auto found = std::find(items.begin(), items.end(), item_I);
-    return found == items.end() ? -1 : static_cast<int>(found - items.begin());
-  }
-  bool Has(const T& item_I) const { return At(item_I) >= 0; }
-  long Count(const T& item_I) const {
-    const std::vector<T> items = Get();
-    return std::count(items.begin(), items.end(), item_I);
-  }
-  void Clear() {
-    std::lock_guard<std::mutex> guard(mLock);
-    mItems.clear();
-  }
+  void Add(T item_I) { mItems.push_back(std::move(item_I)); }
   // Adds "<what><number>".
   template <typename V>
   void Add(const char* what_I, V value_I) {
     Add(what_I + std::to_string(value_I));
   }
+  const std::vector<T>& Get() const { return mItems; }
+  // Index of the first `item_I`, or -1.
+  int At(const T& item_I) const {
+    const auto found = std::find(mItems.begin(), mItems.end(), item_I);
+    return found == mItems.end() ? -1 : static_cast<int>(found - mItems.begin());
+  }
+  bool Has(const T& item_I) const { return At(item_I) >= 0; }
+  long Count(const T& item_I) const { return std::count(mItems.begin(), mItems.end(), item_I); }
+  void Clear() { mItems.clear(); }
 
  private:
-  mutable std::mutex mLock;
   std::vector<T> mItems;
 };
 using CJournal = CLog<std::string>;
@@ -152,20 +131,14 @@ class CFakeInterface : public CFLDeviceInterface {
 
 // What is attached right now; each discovery lists it.
 struct SBus {
-  std::mutex lock;
   std::vector<std::shared_ptr<CDevice>> devices;
   bool failGenerate = false;
-  void Set(std::vector<std::shared_ptr<CDevice>> devices_I) {
-    std::lock_guard<std::mutex> guard(lock);
-    devices = std::move(devices_I);
-  }
 };
 
 class CFakeDiscovery : public CDiscovery {
  public:
   explicit CFakeDiscovery(std::shared_ptr<SBus> bus_I) : mBus(std::move(bus_I)) {}
   bool GenerateDeviceList() override {
-    std::lock_guard<std::mutex> guard(mBus->lock);
     mDeviceList.ClearDeviceList();
     if (mBus->failGenerate) return false;
     for (const auto& device : mBus->devices) mDeviceList.AddDevice(device);
@@ -358,7 +331,7 @@ class UpdateFixture : public ::testing::Test {
   // A pen that switches in place, so an update needs no re-enumeration.
   std::shared_ptr<CFakeInterface> AttachPen() {
     auto pen = Board("pen", kNormalPath);
-    mBus->Set({Product(pen, false, false)});
+    mBus->devices = {Product(pen, false, false)};
     return pen;
   }
   std::string WriteImage(const fs::path& path_I) {
