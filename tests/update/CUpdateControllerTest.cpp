@@ -28,16 +28,10 @@ class CRecordingNotifier : public CUpdateNotifier {
 
 using States = std::vector<ECONTROLLER_STATE>;
 
-// One update: a change to the re-enumerating pen, and how the update ends.
-struct SRun {
-  const char* name;
-  States states;
-  Words errors;
-  double slept;                        // virtual seconds
-  Words tail;                          // the last board calls
-  std::map<std::string, long> counts;  // of board calls and log lines
-  std::function<void()> change;
-};
+// One update of the re-enumerating pen after a change: its name, states,
+// errors, virtual seconds, last board calls, and counted calls and lines.
+using SRun = std::tuple<const char*, States, Words, double, Words, std::map<std::string, long>,
+                        std::function<void()>>;
 
 class ControllerTest : public UpdateFixture {
  protected:
@@ -108,28 +102,28 @@ class ControllerTest : public UpdateFixture {
   }
 
   void Run(const std::vector<SRun>& rows_I) {
-    for (const SRun& row : rows_I) {
-      SCOPED_TRACE(row.name);
+    for (const auto& [name, states, errors, slept, tail, counts, change] : rows_I) {
+      SCOPED_TRACE(name);
       Reset();
       LogCapture capture;
       ConnectReEnumeratingPen();
       mFile = WriteImage(mFolder / "image.pen");
-      row.change();
+      change();
       mNotifier->mStates.Clear();
       ASSERT_TRUE(mController->SetUpdateFile(mFile.string()));
       mNotifier->mLogs.Clear();
-      const bool success = row.states.back() == ESTATE_SUCCESS;
+      const bool success = states.back() == ESTATE_SUCCESS;
       const auto start = std::chrono::steady_clock::now();
       EXPECT_EQ(mController->UpdateDevice(), success);
       EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(5));
-      EXPECT_DOUBLE_EQ(mClock->GetTotalSlept(), row.slept);
-      EXPECT_EQ(mNotifier->mStates.Get(), row.states);
-      EXPECT_EQ(mController->GetState(), row.states.back());
-      EXPECT_EQ(mNotifier->mErrors.Get(), row.errors);
+      EXPECT_DOUBLE_EQ(mClock->GetTotalSlept(), slept);
+      EXPECT_EQ(mNotifier->mStates.Get(), states);
+      EXPECT_EQ(mController->GetState(), states.back());
+      EXPECT_EQ(mNotifier->mErrors.Get(), errors);
       const Words journal = mJournal.Get();
-      ASSERT_GE(journal.size(), row.tail.size());
-      EXPECT_EQ(Words(journal.end() - static_cast<long>(row.tail.size()), journal.end()), row.tail);
-      for (const auto& [text, count] : row.counts) {
+      ASSERT_GE(journal.size(), tail.size());
+      EXPECT_EQ(Words(journal.end() - static_cast<long>(tail.size()), journal.end()), tail);
+      for (const auto& [text, count] : counts) {
         EXPECT_EQ(mJournal.Count(text) + mNotifier->mLogs.Count(text), count) << text;
       }
       // No loader interface: no update, and no error callback of its own.
@@ -187,8 +181,7 @@ TEST_F(Flow, EachPathEndsInItsStatesAndCalls) {
       "loader.ProgramBoard", "loader.RegisterCallback", "loader.SwitchFromBLMode(true)",
       penAgain[0], penAgain[1], penAgain[2], penAgain[3], penAgain[4]},
      {{"Waiting for bootloader mode...", 3}, {"Switching Pen to Loader mode... ", 1},
-      {"IMPORTANT Attach Message (31325:257:16777216:1:65280) STATE->ESTATE_PROGRAM", 1},
-      {"Setting protocolType to 0", 1}},
+      {"IMPORTANT Attach Message (31325:257:16777216:1:65280) STATE->ESTATE_PROGRAM", 1}},
      [] {}},
     {"already in its loader: no switch, no block count check",
      {ESTATE_READY, ESTATE_PROGRAM, ESTATE_WAIT_DEVICE, ESTATE_SUCCESS, ESTATE_SUCCESS}, {}, 2.0,
@@ -196,7 +189,7 @@ TEST_F(Flow, EachPathEndsInItsStatesAndCalls) {
      {{"Device already in loader mode", 1}, {"loader.SwitchToBLMode", 0}},
      [this] { mLoader->mBlocks = 17; /* not the 64 expected */ Connect({mLoaderDevice}); }},
     {"switches in place, without waiting", inPlace, {}, 0.0, LeftInPlace("pen", true),
-     {{"Setting protocolType to 1", 1}, {"pen.SetProtocolType(1)", 1}},
+     {{"pen.SetProtocolType(1)", 1}},
      [this] { ConnectPenOf(EHID_INTERFACE, false); }},
     {"a HID board's failed switches are only logged", inPlace, {}, 0.0, LeftInPlace("pen", true),
      {{"Error returned from SwitchToBLMode()", 1}, {"Error returned from SwitchFromBLMode()", 1}},

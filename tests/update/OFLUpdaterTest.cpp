@@ -44,19 +44,11 @@ TEST_F(Updater, ParseArgumentsKeepsOrderAndTakesTheNextElementBlindly) {
   EXPECT_EQ(OFLUpdater::toHex("123456789"), 0xFFFFFFFFu);
 }
 
-TEST_F(Updater, ArgumentsComeFromTheParmFileOnlyWhenNotUserLaunched) {
+TEST_F(Updater, ArgumentsAndConfigurationComeFromTheParmFileOnlyWhenNotUserLaunched) {
   EXPECT_EQ(Make({"prog"})->getArgs(), Words{});  // only the program name
-  std::ofstream(mFolder / "prefs" / "fwupdater.parm") << "  -p  -t x\n\n";
-  OFLUpdater* updater = Make({"prog", " -b ", "\tv\n"});
-  EXPECT_EQ(updater->getArgs(), (Words{"prog", "-b", "v"}));
-  // Two blanks in a row give an empty element; ends are trimmed.
-  mDelegate.mUserLaunched = false;
-  EXPECT_EQ(updater->getArgs(), (Words{"prog", "-p", "", "-t", "x"}));
-}
-
-TEST_F(Updater, ConfigPathPrefersTheOptionThenBesideTheProgramThenTheInstallation) {
+  // The configuration: the option, else beside the program, else installed.
   EXPECT_EQ(Make({"prog", "-p", "", "-f", "/etc/x.ini"})->configPath(), "/etc/x.ini");
-  OFLUpdater* updater = Make({"prog", "-p", ""});
+  OFLUpdater* updater = Make({"prog", " -b ", "\tv\n"});
   EXPECT_EQ(updater->configPath(), (mFolder / "share" / "fw_loader.ini").string());
   std::ofstream(mFolder / "bin" / "fw_loader.ini") << "{}";
   EXPECT_EQ(updater->configPath(), (mFolder / "bin" / "fw_loader.ini").string());
@@ -66,8 +58,11 @@ TEST_F(Updater, ConfigPathPrefersTheOptionThenBesideTheProgramThenTheInstallatio
 
   // Launched by another program, the preferences file names the boards and
   // the configuration alike, and the configuration is the one updated from.
-  std::ofstream(mFolder / "prefs" / "fwupdater.parm") << "-p  -f /opt/parm.ini";
+  std::ofstream(mFolder / "prefs" / "fwupdater.parm") << "  -p  -t x  -f /opt/parm.ini\n\n";
+  EXPECT_EQ(updater->getArgs(), (Words{"prog", "-b", "v"}));  // ends trimmed
   mDelegate.mUserLaunched = false;
+  // Two blanks in a row give an empty element.
+  EXPECT_EQ(updater->getArgs(), (Words{"prog", "-p", "", "-t", "x", "", "-f", "/opt/parm.ini"}));
   EXPECT_EQ(Make({"prog"})->GetController().getConfigPath(), "/opt/parm.ini");
 }
 
