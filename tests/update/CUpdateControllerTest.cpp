@@ -338,6 +338,10 @@ TEST_F(File, TheTypeDecidesWhichImagesFit) {
   EXPECT_EQ(mController->GetUpdateFileExt(), "pen");
   EXPECT_TRUE(mCapture.AssertionContains(
       "This method is deprecated; use CSRec::GetDataSourceFormat instead!"));
+  // The scalar behind the display's bridge has no board interface of its own.
+  mController->SetUpdateType(EUPDATE_SCALAR_FTDI);
+  EXPECT_EQ(mController->GetActiveInterface(), nullptr);
+  EXPECT_EQ(mController->GetActiveFlashSectors(), 0u);
 }
 
 TEST_F(File, AutoUpdateFileAcceptsWhatTheLoadAccepts) {
@@ -384,7 +388,10 @@ TEST_F(File, AutoUpdateFileAcceptsWhatTheLoadAccepts) {
 }
 
 TEST_F(Attach, OnlyTheWaitingStatesMoveAndOnlyOutsideAnUpdateDoesADetachEnd) {
-  Connect({Product(Board("pen", kNormalPath), false, true, Board("touch", kTouchPath))});
+  auto device = Product(Board("pen", kNormalPath), false, true, Board("touch", kTouchPath));
+  device->SetScalarSupported(true);
+  device->SetScalarInterface(Board("scalar", "31325:4192:1:1:1"));
+  Connect({device});
   // From each state: where an attach (of any device) moves it, and whether
   // a detach of the selected product ends the run.
   // clang-format off
@@ -411,26 +418,20 @@ TEST_F(Attach, OnlyTheWaitingStatesMoveAndOnlyOutsideAnUpdateDoesADetachEnd) {
                                                  "Detach Message (" + kTouchPath + ")" +
                                                  (detachEnds ? " STATE->ESTATE_TERMINATE" : ""));
   }
-}
 
-TEST_F(Attach, UnimportantDetachesAreIgnored) {
-  auto device = Product(Board("pen", kNormalPath), false, false);
-  device->SetScalarSupported(true);
-  device->SetScalarInterface(Board("scalar", "31325:4192:1:1:1"));
-  Connect({device});
-
+  // A scalar path is never active, nor an unknown one, and a product that
+  // switches in place never ends on a detach.
   mController->ProcessStateChange(ESTATE_READY);
-  // A product that switches in place never terminates on a detach.
-  mController->DeviceDetach(kNormalPath);
-  // A scalar path is never active, nor an unknown one.
-  device->SetPenIntoBLMode(true);
   mController->DeviceDetach("31325:4192:1:1:1");
   mController->DeviceDetach("other");
+  device->SetPenIntoBLMode(false);
+  mController->DeviceDetach(kNormalPath);
   EXPECT_EQ(mController->GetState(), ESTATE_READY);
   for (const std::string path : {kNormalPath, "31325:4192:1:1:1", "other"}) {
     EXPECT_EQ(mNotifier->mLogs.Count("Ignored Unimportant Detach Message (" + path + ")"), 1);
   }
   // The path case does not matter.
+  device->SetPenIntoBLMode(true);
   device->SetPenInterface(Board("upper", "ABC:1"));
   mController->DeviceDetach("abc:1");
   EXPECT_EQ(mController->GetState(), ESTATE_TERMINATE);

@@ -129,15 +129,6 @@ TEST_F(Application, SuccessfulRunShowsEveryStepAndEndsWithStatusZero) {
   EXPECT_TRUE(mCapture.LogContains("Firmware updater started."));
 }
 
-TEST_F(Application, WindowRunExitsWithZeroWhateverTheOutcome) {
-  AttachPen()->mFails = {"ProgramBoard"};
-  RunToTheEnd(Make({"-p", ""}, /*terminal=*/false));
-  EXPECT_TRUE(mWindow.mCalls.Has("text:" + T("Programming Failed")));
-  EXPECT_TRUE(mWindow.mCalls.Has("color:3"));
-  EXPECT_EQ(mExitStatus, 0);
-  EXPECT_EQ(mReport, Words{});
-}
-
 TEST_F(Application, TerminalStatusesTellEachOutcome) {
   const std::string file = (mFolder / "cfg" / "Firmware" / "pen.pen").string();
   const auto none = [](CFakeInterface&) {};
@@ -202,8 +193,8 @@ TEST_F(Application, TerminalRunReportsEveryBoardAndCountsEachOne) {
                    T("Result: no supported tablet is connected.")}));
 }
 
-TEST_F(Application, WithoutABoardATerminalRunEndsAtOnceAndAWindowRunWaits) {
-  AttachPen();
+TEST_F(Application, WithoutABoardATerminalRunEndsAtOnceAndAWindowRunWaitsAndExitsWithZero) {
+  auto pen = AttachPen();
   Make({}).applicationDidFinishLaunching();
   EXPECT_EQ(mExitStatus, ERUN_USAGE);
   ASSERT_EQ(mErrors.size(), 1u);
@@ -217,6 +208,14 @@ TEST_F(Application, WithoutABoardATerminalRunEndsAtOnceAndAWindowRunWaits) {
   EXPECT_TRUE(mWindow.mCalls.Has("close:0"));  // the window cannot be closed either
   window.terminate(ERUN_DECLINED);             // from outside
   EXPECT_EQ(mExitStatus, 0);
+
+  // A window run exits with 0 whatever the outcome.
+  pen->mFails = {"ProgramBoard"};
+  RunToTheEnd(Make({"-p", ""}, /*terminal=*/false));
+  EXPECT_TRUE(mWindow.mCalls.Has("text:" + T("Programming Failed")));
+  EXPECT_TRUE(mWindow.mCalls.Has("color:3"));
+  EXPECT_EQ(mExitStatus, 0);
+  EXPECT_EQ(mReport, Words{});
 }
 
 TEST_F(Application, WatchThatCannotBeSetUpEndsTheRunOnARealMainLoop) {

@@ -82,7 +82,7 @@ TEST_F(Updater, SetupGivesUpWithoutADeviceAWatchOrAValueForTheLastOption) {
   EXPECT_FALSE(OFLUpdater::updater()->isCommandLine());
   EXPECT_EQ(mDelegate.mJournal.Get(), Words{});
 
-  mRegistry = std::make_shared<CFakeRegistry>();
+  mRegistry->mCanWatch = true;
   EXPECT_FALSE(Make({"prog", "-p", "", "-t"})->setupUpdate());
   EXPECT_EQ(
       mDelegate.mJournal.Get(),
