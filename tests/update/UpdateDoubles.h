@@ -3,6 +3,7 @@
 // of this folder builds on: the virtual clock, the attached products, one
 // journal of board calls and a folder of the test's own.
 
+#include <atomic>
 #include <gtest/gtest.h>
 #include <unistd.h>
 
@@ -158,7 +159,7 @@ class CFakeRegistry : public CDeviceRegistry {
   bool OpenWatch() override { return mCanWatch; }
   void RunWatch(CRegistryWatcher&) override {}
   void StopWatching() override {}
-  bool mCanWatch = true;
+  std::atomic<bool> mCanWatch{true};  // read by a device thread that may still run
   std::vector<SHidEntry> mEntries;
 };
 
