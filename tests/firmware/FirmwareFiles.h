@@ -43,9 +43,12 @@ class CTempFolder {
 };
 
 inline std::string HexBytes(const std::vector<uint8_t>& bytes_I) {
+  static const char kDigits[] = "0123456789ABCDEF";
   std::string text;
-  char digits[3];
-  for (uint8_t byte : bytes_I) text.append(digits, std::snprintf(digits, 3, "%02X", byte));
+  for (uint8_t byte : bytes_I) {
+    text += kDigits[byte >> 4];
+    text += kDigits[byte & 0x0F];
+  }
   return text;
 }
 
@@ -53,7 +56,11 @@ inline std::string HexBytes(const std::vector<uint8_t>& bytes_I) {
 // add the record type and the checksum.
 inline std::vector<uint8_t> RecordBody(uint8_t count_I, uint32_t address_I, int addressBytes_I,
                                        const std::vector<uint8_t>& data_I) {
-  std::vector<uint8_t> body{count_I};
+  // Reserved and filled by push_back: GCC 12 at -O3 misreads the growth of
+  // a vector made from an initializer list as an overflow.
+  std::vector<uint8_t> body;
+  body.reserve(data_I.size() + 8);
+  body.push_back(count_I);
   for (int i = addressBytes_I - 1; i >= 0; --i) body.push_back(uint8_t(address_I >> (8 * i)));
   body.insert(body.end(), data_I.begin(), data_I.end());
   return body;
