@@ -150,6 +150,14 @@ TEST_F(ProgrammingReports, AB1122SkipsItsOwnRangeAndChecksEveryPage) {
   EXPECT_TRUE(mNotifier.Logged(": - 36865 bytes were programmed Successfully"));
   EXPECT_TRUE(module->GetViolations().empty());
 
+  // An image of whole pages ends with its last page: no empty one after it.
+  auto whole = std::make_shared<CLabBluetooth>(CLabBluetooth::EChip::eAB1122);
+  mBus->Plug(whole);
+  auto wholeInterface = Connect(*whole, EDS_AIROFLASH);
+  wholeInterface->SetBinaryAiroFlashData(AiroFlash(Pattern(0x9000, 4)));
+  ASSERT_TRUE(wholeInterface->ProgramBoard());
+  EXPECT_EQ(whole->GetDataTaken(), 0x90u - 0x50u);
+
   module->Faults().Add({ELabFaultKind::eBadCrc, 5, ""});
   EXPECT_FALSE(interface->ProgramBoard());
   EXPECT_EQ(mNotifier.errors.back(), "ProgramBoardAiroHaBinary_AB1122: Programming error");
