@@ -74,6 +74,7 @@ class CLabBoard {
   uint64_t GetReportCount() const { return mReportCount; }
   // Rules of the protocol or of the flash that the host broke.
   virtual std::vector<std::string> GetViolations() const { return mViolations; }
+  void ClearViolations() { mViolations.clear(); }
 
   // The board's file in a state folder.
   std::string StatePath(const std::string& folder_I) const;
