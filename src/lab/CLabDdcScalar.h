@@ -28,8 +28,10 @@
 // The scalar runs the firmware in its flash, read when it starts: at
 // power-on, at a reset, and when the MCU ends ISP mode by 0xEE = 2. Its
 // release is the one the flash names (LabRelease.h), or the release it
-// shipped with. With its first flash byte erased it does not start, and
-// after a start it answers nothing for kBootSeconds of clock time.
+// shipped with. With its first flash byte erased it does not start and
+// acknowledges none of its addresses. After a reset or the end of ISP mode
+// it acknowledges nothing for kBootSeconds of clock time while it boots; a
+// lab run finds it long started. The host's reset therefore reads no reply.
 //
 // Violations: a request with a wrong checksum, source or length, and a
 // request the scalar does not know. A request cut short by a refused byte

@@ -33,7 +33,8 @@ class LabFTDI : public LabFixture {
     mApi = std::make_unique<CLabFTDIExAPI32>(mBus);
   }
 
-  // Opens the first bridge in MPSSE mode with SDA open-drain, both lines high.
+  // Opens the first bridge the way the host's link does, call for call;
+  // without `openDrain_I` SDA is left push-pull.
   void Open(bool openDrain_I = true) {
     uint32_t location = 0;
     ASSERT_EQ(mApi->FT_ListDevices(nullptr, &location, FT_LIST_BY_INDEX | FT_OPEN_BY_LOCATION),
@@ -41,11 +42,30 @@ class LabFTDI : public LabFixture {
     ASSERT_EQ(mApi->FT_OpenEx(reinterpret_cast<void*>(uintptr_t{location}), FT_OPEN_BY_LOCATION,
                               &mHandle),
               FT_OK);
+    ASSERT_EQ(mApi->FT_ResetDevice(mHandle), FT_OK);
+    ASSERT_EQ(mApi->FT_SetUSBParameters(mHandle, 65536, 65536), FT_OK);
+    ASSERT_EQ(mApi->FT_SetChars(mHandle, 0, 0, 0, 0), FT_OK);
+    ASSERT_EQ(mApi->FT_SetTimeouts(mHandle, 5000, 5000), FT_OK);
+    ASSERT_EQ(mApi->FT_SetLatencyTimer(mHandle, 8), FT_OK);
+    ASSERT_EQ(mApi->FT_SetBitMode(mHandle, 0, FT_BITMODE_RESET), FT_OK);
     ASSERT_EQ(mApi->FT_SetBitMode(mHandle, 0, FT_BITMODE_MPSSE), FT_OK);
-    if (openDrain_I) Send({0x9E, 0x02, 0x00});
-    Send({0x80, 0x03, 0x03});
+    Send({0x84});
+    EXPECT_EQ(Waiting(), 0u);
+    Send({0xAA});
+    EXPECT_EQ(Take(2), (Bytes{0xFA, 0xAA}));
+    Send({0x85});
+    EXPECT_EQ(Waiting(), 0u);
+    Send({0x8A, 0x97, 0x8D});
+    Send(openDrain_I ? Bytes{0x9E, 0x02, 0x00, 0x80, 0x03, 0x03} : Bytes{0x80, 0x03, 0x03});
+    Send({0x86, 0x2B, 0x01});
+    Send({0x82, 0x14, 0xFF});
   }
 
+  uint32_t Waiting() {
+    uint32_t waiting = 0;
+    EXPECT_EQ(mApi->FT_GetQueueStatus(mHandle, &waiting), FT_OK);
+    return waiting;
+  }
   void Send(const Bytes& bytes_I) {
     uint32_t written = 0;
     ASSERT_EQ(mApi->FT_Write(mHandle, bytes_I.data(), static_cast<uint32_t>(bytes_I.size()),
@@ -181,9 +201,7 @@ TEST_F(LabFTDI, TheEngineAnswersCommandsAsTheBridgeDoes) {
   };
   for (const auto& row : rows) {
     Send(row.command);
-    uint32_t waiting = 0;
-    ASSERT_EQ(mApi->FT_GetQueueStatus(mHandle, &waiting), FT_OK);
-    EXPECT_EQ(Take(waiting), row.answer);
+    EXPECT_EQ(Take(Waiting()), row.answer);
   }
   // A command split over transfers waits for its last byte.
   Send({0x86, 0x2B});
@@ -214,7 +232,6 @@ TEST_F(LabFTDI, TheSeamListsOpensAndRefusesAsTheDriverDoes) {
   EXPECT_EQ(mApi->FT_SetUSBParameters(mHandle, 65536, 100), FT_INVALID_PARAMETER);
 
   // A short read returns what there is once the read time-out has passed.
-  ASSERT_EQ(mApi->FT_SetTimeouts(mHandle, 5000, 5000), FT_OK);
   Send({0xAA});
   const double before = mClock->Now();
   EXPECT_EQ(Take(3), (Bytes{0xFA, 0xAA}));
@@ -322,6 +339,16 @@ TEST_F(LabFTDI, TheScalarAnswersRequestsWithGoodChecksums) {
     EXPECT_EQ(Xor(caps, 0x50), 0);
   }
   EXPECT_EQ(mBridge->GetViolations(), std::vector<std::string>{});
+
+  // The reset request restarts the scalar, which is deaf while it boots.
+  Start();
+  for (uint8_t byte : {0xEE, 0x05, 0x11, 0x00, 0x00, 0xEA}) EXPECT_TRUE(SendByte(byte));
+  Stop();
+  Start();
+  EXPECT_FALSE(SendByte(0x6F));
+  Stop();
+  EXPECT_EQ(mBridge->GetScalar().GetResets(), 1u);
+  mClock->Advance(CLabDdcScalar::kBootSeconds);
 
   // A request with a wrong checksum is ignored and recorded.
   EXPECT_EQ(Exchange({0x6E, 0x51, 0x82, 0x01, 0xC9, 0x00}), (Bytes{0x6E, 0x80, 0xBE}));
@@ -519,13 +546,16 @@ TEST_F(LabFTDIVariant, FaultsOfTheScalarAndItsBridge) {
          EXPECT_EQ(mBridge->GetFlash().GetData()[0], 0xFF) << "block 0 as the cut left it";
        }},
   };
+  SLabFault parsed;
+  std::string error;
+  EXPECT_FALSE(ParseLabFault("stuck-busy@2", parsed, error));
   for (const auto& row : rows) {
     SCOPED_TRACE(row.fault);
     mBus = CLabBus::Create();
     Plug("display-ftdi");
     SLabFault fault;
-    std::string error;
     ASSERT_TRUE(ParseLabFault(row.fault, fault, error)) << error;
+    EXPECT_EQ(LabFaultText(fault), row.fault);
     if (fault.kind != ELabFaultKind::eVanish) mBus->AddFaults({fault}, 1);
     if (fault.kind != ELabFaultKind::eRefuseOpen) Open();
     row.check();
