@@ -48,10 +48,12 @@ void CLabI2CBus::Settle() {
 void CLabI2CBus::OnStartOrStop(bool start_I) {
   const bool inByte =
       mPhase == EPhase::eAddress || mPhase == EPhase::eWrite || mPhase == EPhase::eRead;
+  const std::string condition = start_I ? "START" : "STOP";
   if (inByte && mBits > 0) {
-    Report(std::string(start_I ? "START" : "STOP") + " after " + std::to_string(mBits) +
-           " bits of a byte");
+    Report(condition + " after " + std::to_string(mBits) + " bits of a byte");
   }
+  const bool inAcknowledge = mPhase == EPhase::eSlaveAck || mPhase == EPhase::eMasterAck;
+  if (inAcknowledge && mPulseOpen) Report(condition + " during an acknowledge");
   EndTransaction();
   mPulseOpen = false;
   mPhase = start_I ? EPhase::eAddress : EPhase::eIdle;

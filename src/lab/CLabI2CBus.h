@@ -10,7 +10,8 @@
 // a device sees set-up and hold kept.
 //
 // What it records as violations: a START or STOP after some but not all
-// bits of a byte, a clock pulse outside any transaction, a read clocked on
+// bits of a byte or while an acknowledge is clocked (SDA changing while SCL
+// is high where no condition belongs), a clock pulse outside any transaction, a read clocked on
 // with no device addressed or after the host refused the last byte, the
 // bridge holding SDA low while a device sends, and the bridge driving SDA
 // high against a device that holds it low.

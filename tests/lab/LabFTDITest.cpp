@@ -266,6 +266,12 @@ TEST_F(LabFTDI, TheBusAcknowledgesItsDevicesAndRecordsMalformedSequences) {
          Stop();
        },
        "STOP after 4 bits of a byte"},
+      {"SDA rising while an acknowledge is clocked",
+       [&] {
+         Start();
+         Send({0x11, 0x00, 0x00, 0x50, 0x80, 0x00, 0x01, 0x80, 0x01, 0x03, 0x80, 0x03, 0x03});
+       },
+       "STOP during an acknowledge"},
       {"a read of nobody",
        [&] {
          Start();
