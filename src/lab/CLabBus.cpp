@@ -306,8 +306,7 @@ EUsbStatus CLabBus::Control(const SBinding& binding_I, uint8_t requestType_I, ui
   return status;
 }
 
-bool CLabBus::WithBoard(const SBinding& binding_I,
-                        const std::function<void(CLabBoard&)>& work_I) {
+bool CLabBus::WithBoard(const SBinding& binding_I, const std::function<void(CLabBoard&)>& work_I) {
   bool held = false;
   {
     std::lock_guard<std::recursive_mutex> guard(mLock);

@@ -132,8 +132,9 @@ void CLabDdcScalar::TakeRequest() {
     if (at >= mEdid.size()) {
       AnswerNull();
     } else {
-      Answer(std::vector<uint8_t>(mEdid.begin() + static_cast<std::ptrdiff_t>(at),
-                                  mEdid.begin() + static_cast<std::ptrdiff_t>(at + kEdidBlockSize)));
+      Answer(
+          std::vector<uint8_t>(mEdid.begin() + static_cast<std::ptrdiff_t>(at),
+                               mEdid.begin() + static_cast<std::ptrdiff_t>(at + kEdidBlockSize)));
     }
   } else if (is({0x01, 0xF2}, 2)) {
     std::vector<uint8_t> payload{0x02};

@@ -45,8 +45,7 @@ class CLabFTDIExAPI32 : public CFTDIExAPI32 {
   FT_STATUS FT_Purge(FT_HANDLE handle_I, uint32_t mask_I) override;
   FT_STATUS FT_Write(FT_HANDLE handle_I, const void* buffer_I, uint32_t size_I,
                      uint32_t* written_O) override;
-  FT_STATUS FT_Read(FT_HANDLE handle_I, void* buffer_O, uint32_t size_I,
-                    uint32_t* read_O) override;
+  FT_STATUS FT_Read(FT_HANDLE handle_I, void* buffer_O, uint32_t size_I, uint32_t* read_O) override;
   FT_STATUS FT_GetQueueStatus(FT_HANDLE handle_I, uint32_t* rxBytes_O) override;
 
   // The location ids of the bridges attached, in listing order.

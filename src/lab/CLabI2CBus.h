@@ -59,7 +59,16 @@ class CLabI2CBus {
   void Reset();
 
  private:
-  enum class EPhase { eIdle, eAddress, eWrite, eSlaveAck, eRead, eMasterAck, eRefusedRead, eNoDevice };
+  enum class EPhase {
+    eIdle,
+    eAddress,
+    eWrite,
+    eSlaveAck,
+    eRead,
+    eMasterAck,
+    eRefusedRead,
+    eNoDevice
+  };
 
   void Settle();
   void OnSdaChange();

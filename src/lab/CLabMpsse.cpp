@@ -38,7 +38,8 @@ void CLabMpsse::Write(const uint8_t* data_I, size_t size_I) {
   while (!mIn.empty()) {
     const size_t length = CommandLength();
     if (length == 0 || mIn.size() < length) return;
-    const std::vector<uint8_t> command(mIn.begin(), mIn.begin() + static_cast<std::ptrdiff_t>(length));
+    const std::vector<uint8_t> command(mIn.begin(),
+                                       mIn.begin() + static_cast<std::ptrdiff_t>(length));
     mIn.erase(mIn.begin(), mIn.begin() + static_cast<std::ptrdiff_t>(length));
     Run(command);
   }
@@ -46,8 +47,12 @@ void CLabMpsse::Write(const uint8_t* data_I, size_t size_I) {
 
 size_t CLabMpsse::CommandLength() const {
   switch (mIn[0]) {
-    case 0x80: case 0x82: case 0x86: case 0x9E: return 3;
-    case 0x20: case 0x24: return 3;
+    case 0x80:
+    case 0x82:
+    case 0x86:
+    case 0x9E: return 3;
+    case 0x20:
+    case 0x24: return 3;
     case 0x22: return 2;
     case 0x13: return 3;
     case 0x11:
@@ -65,9 +70,10 @@ void CLabMpsse::Run(const std::vector<uint8_t>& command_I) {
       mHighValue = command_I[1];
       mHighDirection = command_I[2];
       break;
-    case 0x81: mOut.push_back(static_cast<uint8_t>((mLowValue & mLowDirection) |
-                                                   (mBus.GetScl() ? kScl : 0) |
-                                                   (mBus.GetSda() ? 0x06 : 0))); break;
+    case 0x81:
+      mOut.push_back(static_cast<uint8_t>((mLowValue & mLowDirection) | (mBus.GetScl() ? kScl : 0) |
+                                          (mBus.GetSda() ? 0x06 : 0)));
+      break;
     case 0x83: mOut.push_back(mHighValue); break;
     case 0x11: {
       const size_t count = command_I.size() - 3;

@@ -70,9 +70,8 @@ bool CLabScalarMcu::IsProtectPinHigh() const {
     case ELabScalarVariant::eQuanta:
       return (Indirect(0x10, 0x36) & 7) == 1 && Indirect(0xFE, 0x26) == 1;
     case ELabScalarVariant::eQisdaVenus:
-      return Indirect(0x10, 0xD4) == 1 && Indirect(0x10, 0xD8) == 1 &&
-             Indirect(0x10, 0xEE) == 1 && mRegisters[0xCD] == 0 && mRegisters[0xA0] == 1 &&
-             mRegisters[0xD7] == 1;
+      return Indirect(0x10, 0xD4) == 1 && Indirect(0x10, 0xD8) == 1 && Indirect(0x10, 0xEE) == 1 &&
+             mRegisters[0xCD] == 0 && mRegisters[0xA0] == 1 && mRegisters[0xD7] == 1;
   }
   return false;
 }

@@ -68,9 +68,9 @@ class LabFTDI : public LabFixture {
   }
   void Send(const Bytes& bytes_I) {
     uint32_t written = 0;
-    ASSERT_EQ(mApi->FT_Write(mHandle, bytes_I.data(), static_cast<uint32_t>(bytes_I.size()),
-                             &written),
-              FT_OK);
+    ASSERT_EQ(
+        mApi->FT_Write(mHandle, bytes_I.data(), static_cast<uint32_t>(bytes_I.size()), &written),
+        FT_OK);
   }
   Bytes Take(size_t count_I) {
     Bytes bytes(count_I);
@@ -161,7 +161,8 @@ class LabFTDI : public LabFixture {
   void EraseBlock(uint8_t block_I) { Instruction(0xB8, 0xD8, {block_I, 0, 0}); }
   uint8_t Crc(uint32_t address_I, uint32_t length_I) {
     const uint32_t end = address_I + length_I - 1;
-    for (uint8_t r : {0x64, 0x65, 0x66}) WriteReg(r, static_cast<uint8_t>(address_I >> (8 * (0x66 - r))));
+    for (uint8_t r : {0x64, 0x65, 0x66})
+      WriteReg(r, static_cast<uint8_t>(address_I >> (8 * (0x66 - r))));
     for (uint8_t r : {0x72, 0x73, 0x74}) WriteReg(r, static_cast<uint8_t>(end >> (8 * (0x74 - r))));
     WriteReg(0x6F, ReadReg(0x6F) | 0x04);
     EXPECT_TRUE(WaitBit(0x6F, 0x04, 0x00));
@@ -169,7 +170,8 @@ class LabFTDI : public LabFixture {
   }
   void ProgramPage(uint32_t address_I, const Bytes& page_I) {
     WriteReg(0x6D, 0x02);
-    for (uint8_t r : {0x64, 0x65, 0x66}) WriteReg(r, static_cast<uint8_t>(address_I >> (8 * (0x66 - r))));
+    for (uint8_t r : {0x64, 0x65, 0x66})
+      WriteReg(r, static_cast<uint8_t>(address_I >> (8 * (0x66 - r))));
     ASSERT_TRUE(WaitBit(0x6F, 0x10, 0x10));
     Start();
     SendByte(0x94);
@@ -218,16 +220,17 @@ TEST_F(LabFTDI, TheSeamListsOpensAndRefusesAsTheDriverDoes) {
   EXPECT_EQ(mApi->FT_ListDevices(reinterpret_cast<void*>(1), &location,
                                  FT_LIST_BY_INDEX | FT_OPEN_BY_LOCATION),
             FT_DEVICE_NOT_FOUND);
-  ASSERT_EQ(mApi->FT_ListDevices(nullptr, &location, FT_LIST_BY_INDEX | FT_OPEN_BY_LOCATION), FT_OK);
+  ASSERT_EQ(mApi->FT_ListDevices(nullptr, &location, FT_LIST_BY_INDEX | FT_OPEN_BY_LOCATION),
+            FT_OK);
   EXPECT_EQ(location, 0x01150000u) << "root port 1, hub port 5";
   Open();
   FT_HANDLE second = nullptr;
-  EXPECT_EQ(mApi->FT_OpenEx(reinterpret_cast<void*>(uintptr_t{location}), FT_OPEN_BY_LOCATION,
-                            &second),
-            FT_DEVICE_NOT_OPENED);
-  EXPECT_EQ(mApi->FT_OpenEx(reinterpret_cast<void*>(uintptr_t{0x01250000}), FT_OPEN_BY_LOCATION,
-                            &second),
-            FT_DEVICE_NOT_FOUND);
+  EXPECT_EQ(
+      mApi->FT_OpenEx(reinterpret_cast<void*>(uintptr_t{location}), FT_OPEN_BY_LOCATION, &second),
+      FT_DEVICE_NOT_OPENED);
+  EXPECT_EQ(
+      mApi->FT_OpenEx(reinterpret_cast<void*>(uintptr_t{0x01250000}), FT_OPEN_BY_LOCATION, &second),
+      FT_DEVICE_NOT_FOUND);
   EXPECT_EQ(mApi->FT_Purge(&second, 3), FT_INVALID_HANDLE);
   EXPECT_EQ(mApi->FT_SetUSBParameters(mHandle, 65536, 100), FT_INVALID_PARAMETER);
 
@@ -280,7 +283,10 @@ TEST_F(LabFTDI, TheBusAcknowledgesItsDevicesAndRecordsMalformedSequences) {
          Stop();
        },
        "a read with no device addressed"},
-      {"a clock with no START", [&] { Send({0x80, 0x03, 0x03, 0x80, 0x02, 0x03}); },
+      {"a clock with no START",
+       [&] {
+         Send({0x80, 0x03, 0x03, 0x80, 0x02, 0x03});
+       },
        "a clock pulse outside any transaction"},
       {"a read on after a refused byte",
        [&] {
@@ -375,7 +381,8 @@ TEST_F(LabFTDI, DisplaysCarryTheScalarsIdentityInARealEdid) {
   EXPECT_EQ(std::accumulate(edid.begin(), edid.end(), 0u) % 256, 0u);
   const Bytes serial{0x00, 0x00, 0xFF, 0x00, 'L', 'A', 'B', 'F', 'T', '0', '7', '0', '1', 0x0A};
   EXPECT_NE(std::search(edid.begin(), edid.end(), serial.begin(), serial.end()), edid.end());
-  const Bytes name{0x00, 0x00, 0xFC, 0x00, 'L', 'a', 'b', ' ', 'D', 'i', 's', 'p', 'l', 'a', 'y', 0x0A};
+  const Bytes name{0x00, 0x00, 0xFC, 0x00, 'L', 'a', 'b', ' ',
+                   'D',  'i',  's',  'p',  'l', 'a', 'y', 0x0A};
   EXPECT_NE(std::search(edid.begin(), edid.end(), name.begin(), name.end()), edid.end());
   EXPECT_TRUE(list[1].edid.empty());
   EXPECT_EQ(list[1].manufacturerId, 0x5B27);
@@ -388,10 +395,10 @@ TEST_F(LabFTDI, DisplaysCarryTheScalarsIdentityInARealEdid) {
 constexpr int kReadF5 = -1;
 constexpr int kSetPin = -2;
 using Sequence = std::vector<std::pair<uint8_t, int>>;
-const Sequence kPlainSequence{{0xF4, 0x9F}, {0xF5, 0x10}, {0xF4, 0x38}, {0xF5, kReadF5},
+const Sequence kPlainSequence{{0xF4, 0x9F}, {0xF5, 0x10},    {0xF4, 0x38}, {0xF5, kReadF5},
                               {0xF4, 0x38}, {0xF5, kSetPin}, {0xF4, 0x9F}, {0xF5, 0xFE},
                               {0xF4, 0x28}, {0xF5, 1}};
-const Sequence kQuantaSequence{{0xF4, 0x9F}, {0xF5, 0x10}, {0xF4, 0x36}, {0xF5, kReadF5},
+const Sequence kQuantaSequence{{0xF4, 0x9F}, {0xF5, 0x10},    {0xF4, 0x36}, {0xF5, kReadF5},
                                {0xF4, 0x36}, {0xF5, kSetPin}, {0xF4, 0x9F}, {0xF5, 0xFE},
                                {0xF4, 0x26}, {0xF5, 1}};
 const Sequence kVenusSequence{{0xF4, 0x95}, {0xF5, 0x10}, {0xF4, 0xD4}, {0xF5, 1}, {0xCD, 0},
@@ -460,9 +467,10 @@ TEST_F(LabFTDIVariant, PagesProgramAndTheNewReleaseRunsFromFlashAcrossRuns) {
   WriteStatus(0xFF);
   EXPECT_EQ(mBridge->GetFlash().GetStatus(), 0xFC);
   EraseBlock(0);
-  EXPECT_EQ(mBridge->GetViolations(),
-            std::vector<std::string>{
-                "display-ftdi-scalar: erase of block at 0x000000 while the flash is write-protected"});
+  EXPECT_EQ(
+      mBridge->GetViolations(),
+      std::vector<std::string>{
+          "display-ftdi-scalar: erase of block at 0x000000 while the flash is write-protected"});
 
   // Ending ISP mode restarts the scalar from its flash, quiet while it boots.
   WriteReg(0xEE, 2);
@@ -524,7 +532,7 @@ TEST_F(LabFTDIVariant, FaultsOfTheScalarAndItsBridge) {
          mApi->FT_ListDevices(nullptr, &location, FT_LIST_BY_INDEX | FT_OPEN_BY_LOCATION);
          FT_HANDLE handle = nullptr;
          EXPECT_EQ(mApi->FT_OpenEx(reinterpret_cast<void*>(uintptr_t{location}),
-                                     FT_OPEN_BY_LOCATION, &handle),
+                                   FT_OPEN_BY_LOCATION, &handle),
                    FT_DEVICE_NOT_OPENED);
        }},
       {"vanish@3",
@@ -537,7 +545,8 @@ TEST_F(LabFTDIVariant, FaultsOfTheScalarAndItsBridge) {
          mBus->AddFaults({SLabFault{ELabFaultKind::eVanish, 3, ""}}, 1);
          const uint8_t command = 0x87;
          uint32_t written = 0;
-         for (int i = 0; i < 3; ++i) EXPECT_EQ(mApi->FT_Write(mHandle, &command, 1, &written), FT_OK);
+         for (int i = 0; i < 3; ++i)
+           EXPECT_EQ(mApi->FT_Write(mHandle, &command, 1, &written), FT_OK);
          EXPECT_EQ(mApi->FT_Write(mHandle, &command, 1, &written), FT_IO_ERROR);
          uint32_t count = 1;
          mApi->FT_ListDevices(&count, nullptr, FT_LIST_NUMBER_ONLY);

@@ -133,9 +133,9 @@ int main(int argc, char** argv) {
   // The scalars behind an FTDI bridge ship with 1.00 too.
   bool ok = true;
   uint32_t seed = 1;
-  for (const char* product : {"classic-tablet", "wireless-tablet", "wireless-tablet-1122",
-                              "display-hid", "display-ftdi", "display-ftdi-quanta",
-                              "display-ftdi-venus"}) {
+  for (const char* product :
+       {"classic-tablet", "wireless-tablet", "wireless-tablet-1122", "display-hid", "display-ftdi",
+        "display-ftdi-quanta", "display-ftdi-venus"}) {
     ok &= Write(folder / (std::string(product) + ".pen"),
                 SRecordText(kPenStart, Released(Pattern(kPenBytes, seed++), 0x0130)));
   }

@@ -2,9 +2,9 @@
 // registry, HID node and USB control seams are the lab's, everything above
 // them is what a run on hardware uses.
 
-#include <algorithm>
-
 #include <gtest/gtest.h>
+
+#include <algorithm>
 
 #include "devices/IOUtils.h"
 #include "flash/CFLDeviceInterface.h"
