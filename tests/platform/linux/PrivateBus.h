@@ -1,7 +1,6 @@
 #pragma once
-// A private D-Bus daemon for one test, reachable as the system bus
-// (DBUS_SYSTEM_BUS_ADDRESS) or the session bus (DBUS_SESSION_BUS_ADDRESS) of
-// this process, so that nothing touches the machine's own buses.
+// A private D-Bus daemon for one test, reachable as the system bus of this
+// process, so that nothing touches the machine's own.
 
 #include <signal.h>
 #include <sys/wait.h>
@@ -16,7 +15,7 @@
 
 class CPrivateBus {
  public:
-  explicit CPrivateBus(const char* variable_I = "DBUS_SYSTEM_BUS_ADDRESS") : mVariable(variable_I) {
+  CPrivateBus() {
     if (access("/usr/bin/dbus-daemon", X_OK) != 0) return;
     mFolder = std::filesystem::temp_directory_path() /
               ("bus-" + std::to_string(getpid()) + "-" +
@@ -49,7 +48,7 @@ class CPrivateBus {
       }
     }
     if (in != nullptr) std::fclose(in);
-    if (!mAddress.empty()) setenv(mVariable, mAddress.c_str(), 1);
+    if (!mAddress.empty()) setenv("DBUS_SYSTEM_BUS_ADDRESS", mAddress.c_str(), 1);
   }
 
   ~CPrivateBus() {
@@ -57,15 +56,13 @@ class CPrivateBus {
       kill(mPid, SIGTERM);
       waitpid(mPid, nullptr, 0);
     }
-    unsetenv(mVariable);
+    unsetenv("DBUS_SYSTEM_BUS_ADDRESS");
     if (!mFolder.empty()) std::filesystem::remove_all(mFolder);
   }
 
   bool IsUp() const { return !mAddress.empty(); }
-  const std::string& GetAddress() const { return mAddress; }
 
  private:
-  const char* mVariable;
   pid_t mPid = -1;
   std::string mAddress;
   std::filesystem::path mFolder;
