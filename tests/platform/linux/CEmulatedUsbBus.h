@@ -59,42 +59,14 @@ class CEmulatedUsbBus {
                              uint32_t productId_I, unsigned devnum_I, uint8_t interfaceClass_I) {
     char node[32];
     std::snprintf(node, sizeof(node), "/dev/bus/usb/001/%03u", devnum_I);
-    const std::vector<uint8_t> descriptors{0x12,
-                                           0x01,
-                                           0x00,
-                                           0x02,
-                                           0x00,
-                                           0x00,
-                                           0x00,
-                                           0x40,
-                                           0x71,
-                                           0x7A,
-                                           static_cast<uint8_t>(productId_I),
-                                           static_cast<uint8_t>(productId_I >> 8),
-                                           0x10,
-                                           0x02,
-                                           0x01,
-                                           0x02,
-                                           0x00,
-                                           0x01,
-                                           0x09,
-                                           0x02,
-                                           18,
-                                           0,
-                                           1,
-                                           1,
-                                           0,
-                                           0x80,
-                                           0x32,
-                                           0x09,
-                                           0x04,
-                                           0,
-                                           0,
-                                           0,
-                                           interfaceClass_I,
-                                           0,
-                                           0,
-                                           0};
+    // Device descriptor, then one configuration with one interface.
+    std::vector<uint8_t> descriptors{0x12, 0x01, 0x00, 0x02, 0x00, 0x00, 0x00, 0x40, 0x71,
+                                     0x7A, 0x00, 0x00, 0x10, 0x02, 0x01, 0x02, 0x00, 0x01,
+                                     0x09, 0x02, 0x12, 0x00, 0x01, 0x01, 0x00, 0x80, 0x32,
+                                     0x09, 0x04, 0x00, 0x00, 0x00, 0x00, 0x00, 0x00, 0x00};
+    descriptors[10] = static_cast<uint8_t>(productId_I);
+    descriptors[11] = static_cast<uint8_t>(productId_I >> 8);
+    descriptors[32] = interfaceClass_I;
     Add("P: " + parentPath_I + "/1-" + devpath_I + "\nN: " + std::string(node + 5) +
         "=00\nE: SUBSYSTEM=usb\nE: DEVTYPE=usb_device\nE: DRIVER=usb\nE: BUSNUM=001\nE: DEVNAME=" +
         node + "\n" + UsbAttributes(0x7A71, productId_I, 0x0210, 1, devpath_I) +

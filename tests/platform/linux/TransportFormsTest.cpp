@@ -1,5 +1,5 @@
 // The transports bound to their seams: the quirks each keeps, over scripted
-// seams where the exact answer matters, and whole updates over the lab.
+// seams where the exact answer matters, or over the lab.
 
 #include <gtest/gtest.h>
 
@@ -60,48 +60,6 @@ TEST_F(HidTransport, OpenKeepsALiveInterfaceAndRetriesABusyOneOnce) {
   EXPECT_FALSE(mInterface->Open());
   EXPECT_FALSE(mInterface->IsOpen());
   EXPECT_EQ(mLog.opens, 4);
-}
-
-TEST_F(HidTransport, SwitchToLoaderSendsBothFormsAndAlwaysCloses) {
-  // Only the second form goes through.
-  mNode->onSet = [](const Bytes& report_I) {
-    return report_I == Bytes{0xCC, 0x05, 0x6A} ? EHidStatus::eOther : EHidStatus::eSuccess;
-  };
-  EXPECT_TRUE(mInterface->SwitchToBLMode());
-  EXPECT_FALSE(mInterface->IsOpen());
-  EXPECT_EQ(mLog.sets.front(), (Bytes{0xCC, 0x05, 0x6A}));
-  EXPECT_EQ(mLog.sets.back(), (Bytes{0xCC, 0x6A, 0x05}));
-
-  // Neither goes through.
-  mNode->onSet = [](const Bytes&) { return EHidStatus::eGone; };
-  EXPECT_FALSE(mInterface->SwitchToBLMode());
-
-  // Already in loader mode: nothing is sent, and the interface is closed.
-  mNode->onSet = nullptr;
-  ASSERT_TRUE(mInterface->Open());
-  mInterface->SetIsFlashLoader(true);
-  const size_t sent = mLog.sets.size();
-  const int closes = mLog.closes;
-  EXPECT_FALSE(mInterface->SwitchToBLMode());
-  EXPECT_EQ(mLog.sets.size(), sent);
-  EXPECT_EQ(mLog.closes, closes + 1);
-}
-
-TEST_F(HidTransport, ProbeEEPROMAndLeavingTheLoader) {
-  EXPECT_FALSE(mInterface->IsAlive()) << "closed";
-  ASSERT_TRUE(mInterface->Open());
-  EXPECT_TRUE(mInterface->InitEEPROM());
-  EXPECT_EQ(mLog.sets.back(), (Bytes{0x08, 0x01, 0x00, 0xAA, 0xAA}));
-  EXPECT_FALSE(mInterface->SwitchFromBLMode(true)) << "not in loader mode";
-
-  mInterface->SetIsFlashLoader(true);
-  const size_t sent = mLog.sets.size();
-  EXPECT_FALSE(mInterface->InitEEPROM());
-  EXPECT_EQ(mLog.sets.size(), sent);
-  EXPECT_TRUE(mInterface->IsAlive());
-  EXPECT_EQ(mLog.gets.back(), (Bytes{0x14, 0, 0, 0, 0}));
-  EXPECT_TRUE(mInterface->SwitchFromBLMode(false));
-  EXPECT_EQ(mLog.sets.back(), (Bytes{0x15, 0xA6, 0x50}));
 }
 
 // A tunnel master whose answers a test scripts.
@@ -196,31 +154,6 @@ TEST_F(I2CTransport, BusyIsWaitedOutWithoutLimitAndAStallIsAFailure) {
 
   mNode->onSet = [](const Bytes&) { return EHidStatus::eStall; };
   EXPECT_FALSE(mInterface->Write(command));
-  EXPECT_EQ(mInterface->InitEEPROM(), false);
-}
-
-TEST_F(I2CTransport, ModeSwitches) {
-  // A controller that never leaves its main firmware: 60 tries, 30 s.
-  mNode->onGet = [](Bytes& report_IO) {
-    report_IO[1] = report_IO[2] = 1;
-    return EHidStatus::eSuccess;
-  };
-  EXPECT_FALSE(mInterface->SwitchToBLMode());
-  EXPECT_NEAR(mClock->GetTotalSlept(), 30.0, 1e-9);
-  size_t modeReports = 0;
-  for (const Bytes& report : mLog.sets) modeReports += report == Bytes{0xB0, 0x00, 0x00};
-  EXPECT_EQ(modeReports, 60u);
-  EXPECT_FALSE(mInterface->IsOpen());
-
-  // Already in loader mode: true at once, unlike the HID transport.
-  mNode->onGet = [](Bytes& report_IO) {
-    report_IO[1] = report_IO[2] = 0;
-    return EHidStatus::eSuccess;
-  };
-  mLog.sets.clear();
-  EXPECT_TRUE(mInterface->SwitchToBLMode());
-  EXPECT_TRUE(mLog.sets.empty());
-  EXPECT_TRUE(mInterface->GetIsFlashLoader());
 }
 
 class BulkTransport : public LabFixture {
@@ -241,8 +174,6 @@ TEST_F(BulkTransport, VendorRequestsAndTheirGuards) {
   ASSERT_TRUE(mInterface->Open());
   EXPECT_TRUE(mInterface->IsAlive());
   EXPECT_EQ(mTouch->GetTrace().back().bytes, (Bytes{0xC1, 0x01, 0, 0, 0, 0, 2, 0, 0x01, 0x00}));
-  EXPECT_TRUE(mInterface->InitEEPROM());
-  EXPECT_EQ(mTouch->GetTrace().back().bytes, (Bytes{0x41, 0xF5, 0xFF, 0xFF, 0, 0, 0, 0}));
   // The vector is a request's fields, not a report.
   Bytes alive{0xC1, 0x01, 0x00, 0x00, 0x02};
   EXPECT_TRUE(mInterface->Write(alive));
@@ -253,7 +184,6 @@ TEST_F(BulkTransport, VendorRequestsAndTheirGuards) {
   mInterface->SetIsFlashLoader(true);
   const size_t seen = mTouch->GetTrace().size();
   EXPECT_FALSE(mInterface->IsAlive());
-  EXPECT_FALSE(mInterface->InitEEPROM());
   EXPECT_FALSE(mInterface->SwitchToBLMode());
   EXPECT_EQ(mTouch->GetTrace().size(), seen);
 }
