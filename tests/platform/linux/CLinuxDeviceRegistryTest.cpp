@@ -139,7 +139,7 @@ class CIoctlNode {
   }
   ~CIoctlNode() {
     umockdev_testbed_detach_ioctl(mBus.GetTestbed(), mNode.c_str(), nullptr);
-    for (UMockdevIoctlData* urb : mReapable) umockdev_ioctl_data_unref(urb);
+    if (mFinished != nullptr) umockdev_ioctl_data_unref(mFinished);
     g_object_unref(mHandler);
   }
 
@@ -152,19 +152,8 @@ class CIoctlNode {
     UMockdevIoctlData* argument = umockdev_ioctl_client_get_arg(client_I);
     if (!self_I->mUsbfs) return self_I->Hidraw(client_I, request, argument);
     switch (request) {
-      case USBDEVFS_GET_CAPABILITIES: {
-        UMockdevIoctlData* data = umockdev_ioctl_data_resolve(argument, 0, 4, nullptr);
-        *reinterpret_cast<guint32*>(data->data) =
-            USBDEVFS_CAP_BULK_CONTINUATION | USBDEVFS_CAP_NO_PACKET_SIZE_LIM |
-            USBDEVFS_CAP_REAP_AFTER_DISCONNECT | USBDEVFS_CAP_ZERO_PACKET;
-        umockdev_ioctl_data_unref(data);
-        umockdev_ioctl_client_complete(client_I, 0, 0);
-        return TRUE;
-      }
       case USBDEVFS_CLAIMINTERFACE:
       case USBDEVFS_RELEASEINTERFACE: umockdev_ioctl_client_complete(client_I, 0, 0); return TRUE;
-      case USBDEVFS_GETDRIVER:
-      case USBDEVFS_IOCTL: umockdev_ioctl_client_complete(client_I, -1, ENODATA); return TRUE;
       case USBDEVFS_SUBMITURB: return self_I->Submit(client_I, argument);
       case USBDEVFS_REAPURB:
       case USBDEVFS_REAPURBNDELAY: return self_I->Reap(client_I, argument);
@@ -189,7 +178,8 @@ class CIoctlNode {
     return TRUE;
   }
 
-  // A control URB is finished at once and waits to be reaped.
+  // A control URB is finished at once and waits to be reaped; libusb sends
+  // one at a time.
   gboolean Submit(UMockdevIoctlClient* client_I, UMockdevIoctlData* argument_I) {
     UMockdevIoctlData* urbData =
         umockdev_ioctl_data_resolve(argument_I, 0, sizeof(usbdevfs_urb), nullptr);
@@ -203,30 +193,24 @@ class CIoctlNode {
     if (error == 0 && in) std::copy(request.begin() + 8, request.end(), buffer->data + 8);
     urb->status = -error;
     urb->actual_length = error != 0 ? 0 : static_cast<int>(request.size() - 8);
-    {
-      std::lock_guard<std::mutex> guard(mLock);
-      mReapable.push_back(urbData);
-    }
+    mFinished = urbData;
     umockdev_ioctl_client_complete(client_I, 0, 0);
     umockdev_ioctl_data_unref(buffer);
     return TRUE;
   }
 
   gboolean Reap(UMockdevIoctlClient* client_I, UMockdevIoctlData* argument_I) {
-    std::unique_lock<std::mutex> guard(mLock);
-    if (mReapable.empty()) {
+    if (mFinished == nullptr) {
       umockdev_ioctl_client_complete(client_I, -1, EAGAIN);
       return TRUE;
     }
-    UMockdevIoctlData* urb = mReapable.front();
-    mReapable.erase(mReapable.begin());
-    guard.unlock();
     UMockdevIoctlData* pointer =
         umockdev_ioctl_data_resolve(argument_I, 0, sizeof(gpointer), nullptr);
-    umockdev_ioctl_data_set_ptr(pointer, 0, urb);
+    umockdev_ioctl_data_set_ptr(pointer, 0, mFinished);
     umockdev_ioctl_client_complete(client_I, 0, 0);
     umockdev_ioctl_data_unref(pointer);
-    umockdev_ioctl_data_unref(urb);
+    umockdev_ioctl_data_unref(mFinished);
+    mFinished = nullptr;
     return TRUE;
   }
 
@@ -234,8 +218,7 @@ class CIoctlNode {
   std::string mNode;
   bool mUsbfs;
   UMockdevIoctlBase* mHandler = umockdev_ioctl_base_new();
-  std::mutex mLock;
-  std::vector<UMockdevIoctlData*> mReapable;
+  UMockdevIoctlData* mFinished = nullptr;
 };
 
 class Umockdev : public CLinuxDeviceRegistryTest {};
