@@ -106,19 +106,6 @@ TEST(LinuxLanguageManager, LocaleFolderSearchPrefersTheProgramsSurroundings) {
   fs::remove_all(root);
 }
 
-TEST(LinuxLanguageManager, AnExplicitLocaleFolderOverridesTheSearch) {
-  LocaleEnvironment environment("en");
-  CLinuxLanguageManager::SetLocaleDirectory(kTestCatalogs);
-  CLanguageManager::DisposeInstance();
-  EXPECT_EQ(TTCLocalizedNSString("in-both"), "from the application domain");
-
-  // Without it the search starts beside the running program, where this
-  // test program keeps its own catalogs.
-  CLinuxLanguageManager::SetLocaleDirectory("");
-  EXPECT_EQ(std::filesystem::path(CLinuxLanguageManager::GetLocaleDirectory()),
-            std::filesystem::path(kTestCatalogs).lexically_normal());
-}
-
 TEST(LinuxLanguageManager, NoLocaleOrAnUninstalledOneStillShowsTheEnglishTexts) {
   // Neither the C locale nor a missing one may leave the user with bare keys.
   for (const char* lang : {"", "xx_YY.UTF-8"}) {
