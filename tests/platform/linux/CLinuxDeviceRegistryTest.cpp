@@ -37,11 +37,6 @@ const std::vector<uint8_t> kLongItemThenVendor = {0xFE, 0x02, 0x11, 0xA1, 0x01, 
                                                   0xFF, 0x09, 0x02, 0xA1, 0x01, 0xC0};
 const std::vector<uint8_t> kVendorOnly = {0x06, 0x00, 0xFF, 0x09, 0x01, 0xA1, 0x01, 0xC0};
 
-DeviceInfo Info(uint32_t vendor_I, uint32_t product_I, uint32_t location_I, uint32_t usage_I,
-                uint32_t page_I) {
-  return DeviceInfo{vendor_I, product_I, location_I, usage_I, page_I};
-}
-
 // An entry in one line: vendor:product @location usage/page node version,
 // and the hub above it (all hex).
 using Texts = std::vector<std::string>;
@@ -98,29 +93,6 @@ class CRecordingWatcher : public CRegistryWatcher {
   std::mutex mLock;
   std::condition_variable mChanged;
   std::vector<SEvent> mEvents;
-};
-
-// Runs the registry's watch on a thread of its own, as the device thread does.
-class CWatchThread {
- public:
-  explicit CWatchThread(CLinuxDeviceRegistry& registry_I) : mRegistry(registry_I) {
-    mOpened = mRegistry.OpenWatch();
-    mThread = std::thread([this] { mRegistry.RunWatch(mWatcher); });
-  }
-  ~CWatchThread() { Stop(); }
-
-  bool IsOpened() const { return mOpened; }
-  CRecordingWatcher& GetWatcher() { return mWatcher; }
-  void Stop() {
-    mRegistry.StopWatching();
-    if (mThread.joinable()) mThread.join();
-  }
-
- private:
-  CLinuxDeviceRegistry& mRegistry;
-  CRecordingWatcher mWatcher;
-  bool mOpened = false;
-  std::thread mThread;
 };
 
 using Bytes = std::vector<uint8_t>;
@@ -295,9 +267,11 @@ TEST_F(CLinuxDeviceRegistryTest, WatchFollowsADeviceThatReenumeratesUnderAnother
   const std::string normal = mBus->AddUsbDevice(mRootHub, 1, "3", kVendor, 0x374, 0x0102);
   const auto normalNode = mBus->AddHidInterface(normal, 0, 0, kPenAndVendor);
 
+  // The watch runs on a thread of its own, as on the device thread.
   CLinuxDeviceRegistry registry;
-  CWatchThread watch(registry);
-  ASSERT_TRUE(watch.IsOpened());
+  ASSERT_TRUE(registry.OpenWatch());
+  CRecordingWatcher watcher;
+  std::thread thread([&] { registry.RunWatch(watcher); });
 
   // Present before the watch opened, its removal still says who it was.
   // Then back at the same place as another product on the same node name,
@@ -307,43 +281,32 @@ TEST_F(CLinuxDeviceRegistryTest, WatchFollowsADeviceThatReenumeratesUnderAnother
   const auto loaderNode = mBus->AddHidInterface(loader, 0, 0, kVendorOnly);
   // Read before it goes: a node unplugged before its arrival is read shows
   // no usage, as with real hardware that vanishes that fast.
-  watch.GetWatcher().WaitFor(2);
+  watcher.WaitFor(2);
   mBus->Unplug(loaderNode);
   const std::string back = mBus->AddUsbDevice(mRootHub, 1, "3", kVendor, 0x374, 0x0103);
   mBus->AddHidInterface(back, 0, 0, kPenAndVendor);
 
   using SEvent = CRecordingWatcher::SEvent;
-  const DeviceInfo pen = Info(kVendor, 0x374, 0x01300000, 0x02, 0x0D);
-  const DeviceInfo loaderInfo = Info(kVendor, 0x94, 0x01300000, 0x01, 0xFF00);
+  const DeviceInfo pen{kVendor, 0x374, 0x01300000, 0x02, 0x0D};
+  const DeviceInfo loaderInfo{kVendor, 0x94, 0x01300000, 0x01, 0xFF00};
   EXPECT_EQ(
-      watch.GetWatcher().WaitFor(4),
+      watcher.WaitFor(4),
       (std::vector<SEvent>{{false, pen}, {true, loaderInfo}, {false, loaderInfo}, {true, pen}}));
+  registry.StopWatching();
+  thread.join();  // hangs here if the watch's poll is not woken
 }
 
-TEST_F(CLinuxDeviceRegistryTest, StopWakesARunningWatchAndEndsOneNotYetStarted) {
-  {
-    CLinuxDeviceRegistry registry;
-    CWatchThread watch(registry);
-    ASSERT_TRUE(watch.IsOpened());
-    std::this_thread::sleep_for(std::chrono::milliseconds(50));
-    const auto start = std::chrono::steady_clock::now();
-    watch.Stop();  // joins: hangs here if the poll is not woken
-    EXPECT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(2));
-  }
-  {
-    CLinuxDeviceRegistry registry;
-    ASSERT_TRUE(registry.OpenWatch());
-    registry.StopWatching();
-    CRecordingWatcher watcher;
-    const std::string device = mBus->AddUsbDevice(mRootHub, 1, "6", kVendor, 0x300, 0x0100);
-    mBus->AddHidInterface(device, 0, 0, kVendorOnly);
-    registry.RunWatch(watcher);  // returns at once, delivering nothing
-    EXPECT_TRUE(watcher.WaitFor(0).empty());
-  }
-  // A watch that was never opened has nothing to run.
-  CLinuxDeviceRegistry unopened;
+TEST_F(CLinuxDeviceRegistryTest, StopEndsAWatchNotYetStarted) {
+  CLinuxDeviceRegistry registry;
+  ASSERT_TRUE(registry.OpenWatch());
+  registry.StopWatching();
   CRecordingWatcher watcher;
-  unopened.RunWatch(watcher);
+  const std::string device = mBus->AddUsbDevice(mRootHub, 1, "6", kVendor, 0x300, 0x0100);
+  mBus->AddHidInterface(device, 0, 0, kVendorOnly);
+  registry.RunWatch(watcher);  // returns at once, delivering nothing
+  EXPECT_TRUE(watcher.WaitFor(0).empty());
+  // A watch that was never opened has nothing to run.
+  CLinuxDeviceRegistry().RunWatch(watcher);
 }
 
 TEST_F(Umockdev, HidrawNodesAreFoundLockedAndSpokenToThroughIoctls) {

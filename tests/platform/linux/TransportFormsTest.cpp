@@ -18,19 +18,22 @@ namespace {
 using Bytes = std::vector<uint8_t>;
 const DeviceInfo kInfo{0x7A71, 0x0301, 0x01100000, 0x0002, 0x000D};
 
-class HidTransport : public LabFixture {
+// The HID form or the I2C tunnel master over a HID node a test scripts.
+template <class TInterface>
+class ScriptedTransport : public LabFixture {
  protected:
   void SetUp() override {
     LabFixture::SetUp();
     auto node = std::make_unique<ScriptedHidNode>(mLog);
     mNode = node.get();
-    mInterface = std::make_unique<CLinuxHIDFLDeviceInterface>(kInfo, std::move(node));
+    mInterface = std::make_unique<TInterface>(kInfo, std::move(node));
   }
 
   ScriptedHidNode::SLog mLog;
   ScriptedHidNode* mNode = nullptr;
-  std::unique_ptr<CLinuxHIDFLDeviceInterface> mInterface;
+  std::unique_ptr<TInterface> mInterface;
 };
+using HidTransport = ScriptedTransport<CLinuxHIDFLDeviceInterface>;
 
 TEST_F(HidTransport, AStallPassesOnlyOnAWrite) {
   ASSERT_TRUE(mInterface->Open());
@@ -62,14 +65,11 @@ TEST_F(HidTransport, OpenKeepsALiveInterfaceAndRetriesABusyOneOnce) {
   EXPECT_EQ(mLog.opens, 4);
 }
 
-// A tunnel master whose answers a test scripts.
-class I2CTransport : public LabFixture {
+// The master answers what the test queues.
+class I2CTransport : public ScriptedTransport<CLinuxI2CFLDeviceInterface> {
  protected:
   void SetUp() override {
-    LabFixture::SetUp();
-    auto node = std::make_unique<ScriptedHidNode>(mLog);
-    mNode = node.get();
-    mInterface = std::make_unique<CLinuxI2CFLDeviceInterface>(kInfo, std::move(node));
+    ScriptedTransport::SetUp();
     mNode->onGet = [this](Bytes& report_IO) {
       if (mReplies.empty()) return EHidStatus::eOther;
       const Bytes reply = mReplies.front();
@@ -91,9 +91,6 @@ class I2CTransport : public LabFixture {
     return reply;
   }
 
-  ScriptedHidNode::SLog mLog;
-  ScriptedHidNode* mNode = nullptr;
-  std::unique_ptr<CLinuxI2CFLDeviceInterface> mInterface;
   std::deque<Bytes> mReplies;
 };
 
@@ -179,7 +176,6 @@ TEST_F(BulkTransport, VendorRequestsAndTheirGuards) {
   EXPECT_TRUE(mInterface->Write(alive));
   Bytes loaderCommand{0x14, 0, 0, 0, 0};
   EXPECT_FALSE(mInterface->Read(loaderCommand));
-  EXPECT_FALSE(mInterface->SwitchFromBLMode(true));
 
   mInterface->SetIsFlashLoader(true);
   const size_t seen = mTouch->GetTrace().size();
@@ -188,40 +184,32 @@ TEST_F(BulkTransport, VendorRequestsAndTheirGuards) {
   EXPECT_EQ(mTouch->GetTrace().size(), seen);
 }
 
-// A USB device whose vendor interface another holder keeps for a while.
-class HeldUsbControl : public CUsbControl {
+// The lab's touch controller, whose vendor interface another holder keeps
+// for a while.
+class HeldUsbControl : public CLabUsbControl {
  public:
-  explicit HeldUsbControl(int busyClaims_I) : mBusyClaims(busyClaims_I) {}
-  EUsbStatus Open(const DeviceInfo&) override {
-    mOpen = true;
-    return EUsbStatus::eSuccess;
-  }
+  HeldUsbControl(std::shared_ptr<CLabBus> bus_I, int busyClaims_I)
+      : CLabUsbControl(std::move(bus_I)), mBusyClaims(busyClaims_I) {}
   EUsbStatus ClaimVendorInterface() override {
     ++claims;
-    return mBusyClaims-- > 0 ? EUsbStatus::eBusy : EUsbStatus::eSuccess;
+    return mBusyClaims-- > 0 ? EUsbStatus::eBusy : CLabUsbControl::ClaimVendorInterface();
   }
-  uint16_t GetReleaseNumber() const override { return 0x0210; }
-  EUsbStatus ControlTransfer(uint8_t, uint8_t, uint16_t, uint16_t, Bytes&, size_t&) override {
-    return EUsbStatus::eStall;
-  }
-  void Close() override { mOpen = false; }
-  bool IsOpen() const override { return mOpen; }
   int claims = 0;
 
  private:
   int mBusyClaims;
-  bool mOpen = false;
 };
 
 TEST_F(BulkTransport, AHeldInterfaceIsWaitedForUpToFifteenMoreTries) {
-  auto held = std::make_unique<HeldUsbControl>(15);
+  auto held = std::make_unique<HeldUsbControl>(mBus, 15);
   HeldUsbControl* usb = held.get();
   CLinuxBulkFLDeviceInterface patient(Listed(*mTouch), std::move(held));
   EXPECT_TRUE(patient.Open());
   EXPECT_EQ(usb->claims, 16);
   EXPECT_NEAR(mClock->GetTotalSlept(), 30.0, 1e-9);
+  patient.Close();
 
-  auto forever = std::make_unique<HeldUsbControl>(100);
+  auto forever = std::make_unique<HeldUsbControl>(mBus, 100);
   HeldUsbControl* stuck = forever.get();
   CLinuxBulkFLDeviceInterface refused(Listed(*mTouch), std::move(forever));
   EXPECT_FALSE(refused.Open());
