@@ -65,11 +65,13 @@ std::shared_ptr<CFLDeviceInterface> Hid(const DeviceInfo& info_I) {
 
 }  // namespace
 
-TEST_F(DiscoveryRules, NoProductIsListedWithoutAnEntryOfItsVendorAndUsage) {
+TEST_F(DiscoveryRules, NoProductIsListedWithoutAnEntryOrAnyEntries) {
   mRegistry->AddHid({0x7A5D, 0x100, BehindHub(1), 1, 0xFF00});
   // The configured product under another vendor, and under another usage.
   mRegistry->AddHid({0x7A71, 0x200, BehindHub(2), 1, 0xFF00});
   mRegistry->AddHid({0x7A5D, 0x200, BehindHub(3), 2, 0xFF00});
+  // An empty table has no row to read a criterion from.
+  EXPECT_TRUE(Scan("[]").empty());
   EXPECT_TRUE(Scan(R"([{"name": "Other", "penBoard": {"pid": "200", "usageId": "1",
                                                        "usagePg": "FF00"}}])")
                   .empty());
