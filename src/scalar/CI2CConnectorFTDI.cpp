@@ -56,7 +56,8 @@ CFTDIExAPI32& Api() {
 
 void* ByValue(uint32_t value_I) { return reinterpret_cast<void*>(static_cast<uintptr_t>(value_I)); }
 
-void AppendPins(std::vector<uint8_t>& command_IO, uint8_t value_I, uint8_t direction_I, int times_I) {
+void AppendPins(std::vector<uint8_t>& command_IO, uint8_t value_I, uint8_t direction_I,
+                int times_I) {
   for (int i = 0; i < times_I; ++i) {
     command_IO.insert(command_IO.end(), {SET_DATA_BITS_LOW_BYTE, value_I, direction_I});
   }
@@ -173,8 +174,7 @@ FT_STATUS CI2CConnectorFTDI::OpenFTDIHandle(long index_I) {
     return fail(status);
   }
   SetI2CSpeed(FT_I2C_SPEED_100KHZ);
-  if ((status = I2CWrite({SET_DATA_BITS_HIGH_BYTE, kHighByteValue, kHighByteDirection})) !=
-      FT_OK) {
+  if ((status = I2CWrite({SET_DATA_BITS_HIGH_BYTE, kHighByteValue, kHighByteDirection})) != FT_OK) {
     return fail(status);
   }
   I2CReadAll();
@@ -190,9 +190,8 @@ void CI2CConnectorFTDI::CloseFTDIHandle() {
 
 long CI2CConnectorFTDI::DeviceLocation(long index_I) {
   uint32_t location = 0;
-  const FT_STATUS status =
-      Api().FT_ListDevices(ByValue(static_cast<uint32_t>(index_I)), &location,
-                           FT_LIST_BY_INDEX | FT_OPEN_BY_LOCATION);
+  const FT_STATUS status = Api().FT_ListDevices(ByValue(static_cast<uint32_t>(index_I)), &location,
+                                                FT_LIST_BY_INDEX | FT_OPEN_BY_LOCATION);
   if (status != FT_OK) {
     SCALAR_TRACE(Error, "FT_ListDevices failed for device %ldi (%i)\n", index_I, status);
     return -1;
@@ -237,8 +236,8 @@ long CI2CConnectorFTDI::I2CQueryStatus() {
 }
 
 FT_STATUS CI2CConnectorFTDI::SetI2CSpeed(FT_I2C_SPEED speed_I) {
-  const FT_STATUS status = I2CWrite({SET_CLK_DIVISOR, static_cast<uint8_t>(speed_I & 0xFF),
-                                     static_cast<uint8_t>(speed_I >> 8)});
+  const FT_STATUS status = I2CWrite(
+      {SET_CLK_DIVISOR, static_cast<uint8_t>(speed_I & 0xFF), static_cast<uint8_t>(speed_I >> 8)});
   if (status == FT_OK) TavSleep(kClockSettleSeconds);
   return FT_OK;
 }
@@ -249,8 +248,7 @@ FT_STATUS CI2CConnectorFTDI::SendBadCommand(bool check_I) {
   const auto [readStatus, answer] = I2CRead(2);
   if (readStatus != FT_OK) return readStatus;
   if (!check_I) return FT_OK;
-  return answer[0] == BAD_COMMAND_ANSWER || answer[1] == BAD_COMMAND ? FT_OK
-                                                                      : kStatusShortTransfer;
+  return answer[0] == BAD_COMMAND_ANSWER || answer[1] == BAD_COMMAND ? FT_OK : kStatusShortTransfer;
 }
 
 FT_STATUS CI2CConnectorFTDI::WriteAndCheckQueueEmpty(uint8_t command_I) {
@@ -299,11 +297,19 @@ FT_STATUS CI2CConnectorFTDI::I2CStop() {
 FT_STATUS CI2CConnectorFTDI::I2CSendByte(uint8_t byte_I, bool wait_I) {
   std::vector<uint8_t> command;
   command.reserve(13);
-  command = {MSB_FALLING_EDGE_CLOCK_BYTE_OUT, 0x00, 0x00, byte_I,
-             SET_DATA_BITS_LOW_BYTE, 0x00, SCL,  // SCL driven low, SDA released
-             MSB_RISING_EDGE_CLOCK_BIT_IN, 0x00,  // the acknowledge bit
+  command = {MSB_FALLING_EDGE_CLOCK_BYTE_OUT,
+             0x00,
+             0x00,
+             byte_I,
+             SET_DATA_BITS_LOW_BYTE,
+             0x00,
+             SCL,  // SCL driven low, SDA released
+             MSB_RISING_EDGE_CLOCK_BIT_IN,
+             0x00,  // the acknowledge bit
              SEND_ANSWER_BACK_IMMEDIATE,
-             SET_DATA_BITS_LOW_BYTE, 0x00, BOTH_LINES};
+             SET_DATA_BITS_LOW_BYTE,
+             0x00,
+             BOTH_LINES};
   FT_STATUS status = I2CWrite(command);
   if (status != FT_OK) {
     SCALAR_TRACE(Error, "I2CSendByte write failed (%i)\n", status);
@@ -326,10 +332,17 @@ FT_STATUS CI2CConnectorFTDI::I2CSendByte(uint8_t byte_I, bool wait_I) {
 std::pair<FT_STATUS, uint8_t> CI2CConnectorFTDI::I2CGetByte(bool ack_I) {
   std::vector<uint8_t> command;
   command.reserve(13);
-  command = {SET_DATA_BITS_LOW_BYTE, 0x00, SCL,  // SDA released
-             MSB_FALLING_EDGE_CLOCK_BYTE_IN, 0x00, 0x00,
-             SET_DATA_BITS_LOW_BYTE, 0x00, BOTH_LINES,
-             MSB_FALLING_EDGE_CLOCK_BIT_OUT, 0x00,
+  command = {SET_DATA_BITS_LOW_BYTE,
+             0x00,
+             SCL,  // SDA released
+             MSB_FALLING_EDGE_CLOCK_BYTE_IN,
+             0x00,
+             0x00,
+             SET_DATA_BITS_LOW_BYTE,
+             0x00,
+             BOTH_LINES,
+             MSB_FALLING_EDGE_CLOCK_BIT_OUT,
+             0x00,
              static_cast<uint8_t>(ack_I ? 0x00 : 0x80)};  // the master's acknowledge
   const FT_STATUS status = I2CWrite(command);
   if (status != FT_OK) return {status, 0};

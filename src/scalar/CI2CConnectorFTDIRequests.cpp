@@ -152,9 +152,8 @@ std::vector<uint8_t> CI2CConnectorFTDI::SendRequest(const std::vector<uint8_t>& 
     }
   }
 
-  if (inBuffer.size() != 2 || (inBuffer[1] & DDCFrame::kLengthFlag) == 0x00) {
-    TAVASSERT_TEXT("inBuffer.size() == 2 && (inBuffer[1] & 0x80) != 0x00");
-  }
+  if (inBuffer.size() != 2) TAVASSERT_TEXT("inBuffer.size() == 2");
+  if ((inBuffer[1] & DDCFrame::kLengthFlag) == 0x00) TAVASSERT_TEXT("(inBuffer[1] & 0x80) != 0x00");
   const int bytesToRead = (inBuffer[1] & 0x7F) + 1;  // payload and checksum
   for (int i = 0; i < bytesToRead; ++i) {
     // Every byte is acknowledged, the last one too.
@@ -212,7 +211,8 @@ std::vector<uint8_t> CI2CConnectorFTDI::ReadEDIDByOffset(SENSOR_ID sid_I) {
     if (DDCFrame::IsOffsetEcho(reply, offset)) return edid;
 
     std::vector<uint8_t> data = reply;
-    CheckAndDropChecksum(data, "ReadEDID: read checksum mismatch", "ReadEDID:Read checksum failed\n");
+    CheckAndDropChecksum(data, "ReadEDID: read checksum mismatch",
+                         "ReadEDID:Read checksum failed\n");
     AppendFrom(edid, data, kOffsetReplyData);
     offset = static_cast<uint16_t>(edid.size());
   }
@@ -228,7 +228,8 @@ std::vector<uint8_t> CI2CConnectorFTDI::ReadEDIDGreyOwl24() {
       break;
     }
     if (reply.size() != kEDIDBlockReplySize) break;
-    CheckAndDropChecksum(reply, "ReadEDID read checksum mismatch", "ReadEDID:Read checksum failed\n");
+    CheckAndDropChecksum(reply, "ReadEDID read checksum mismatch",
+                         "ReadEDID:Read checksum failed\n");
     AppendFrom(edid, reply, 2);
   }
   ConditionalFunction(g_DebugTrace != 0)([&] {
@@ -355,13 +356,15 @@ std::string GatherCapabilities(BuildRequest build_I, SendFunction send_I, bool r
 }  // namespace
 
 std::string CI2CConnectorFTDI::CapabilitiesStringLinnet() {
-  return GatherCapabilities(DDCFrame::CapabilitiesStringLinnet,
-                            [this](const DDCFrame::SRequest& r_I) { return Send(r_I); }, false);
+  return GatherCapabilities(
+      DDCFrame::CapabilitiesStringLinnet,
+      [this](const DDCFrame::SRequest& r_I) { return Send(r_I); }, false);
 }
 
 std::string CI2CConnectorFTDI::CapabilitiesStringGreyowl() {
-  return GatherCapabilities(DDCFrame::CapabilitiesStringGreyowl,
-                            [this](const DDCFrame::SRequest& r_I) { return Send(r_I); }, true);
+  return GatherCapabilities(
+      DDCFrame::CapabilitiesStringGreyowl,
+      [this](const DDCFrame::SRequest& r_I) { return Send(r_I); }, true);
 }
 
 FileVersion CI2CConnectorFTDI::FWVersion() {
@@ -372,7 +375,8 @@ FileVersion CI2CConnectorFTDI::FWVersion() {
     reply = Send(request);
   }
   if (!reply.empty()) {
-    CheckAndDropChecksum(reply, "FWVersion read checksum mismatch", "FWVersion:Read checksum failed\n");
+    CheckAndDropChecksum(reply, "FWVersion read checksum mismatch",
+                         "FWVersion:Read checksum failed\n");
   }
   if (reply.size() <= 9) {
     if (reply.size() <= 1) {

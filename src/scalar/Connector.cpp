@@ -16,10 +16,13 @@ namespace {
 constexpr double kSaveSettleSeconds = 0.2;
 
 bool StartsWith(const std::vector<uint8_t>& bytes_I, std::initializer_list<uint8_t> start_I) {
-  return bytes_I.size() >= start_I.size() && std::equal(start_I.begin(), start_I.end(), bytes_I.begin());
+  return bytes_I.size() >= start_I.size() &&
+         std::equal(start_I.begin(), start_I.end(), bytes_I.begin());
 }
 
-bool IsAcknowledgeByte(uint8_t byte_I) { return byte_I == 0x80 || byte_I == 0x6E || byte_I == 0xBE; }
+bool IsAcknowledgeByte(uint8_t byte_I) {
+  return byte_I == 0x80 || byte_I == 0x6E || byte_I == 0xBE;
+}
 
 }  // namespace
 

@@ -24,8 +24,8 @@ struct SIdentity {
 };
 
 bool HasEDIDHeader(const std::vector<uint8_t>& edid_I) {
-  return edid_I.size() >= 12 && std::equal(std::begin(kEDIDHeader), std::end(kEDIDHeader),
-                                           edid_I.begin());
+  return edid_I.size() >= 12 &&
+         std::equal(std::begin(kEDIDHeader), std::end(kEDIDHeader), edid_I.begin());
 }
 
 SIdentity IdentityOf(const SDisplay& display_I) {

@@ -72,8 +72,7 @@ constexpr std::array<uint8_t, 256> kCRCTable = MakeCRCTable();
 }  // namespace
 
 RTDISP::RTDISP(std::shared_ptr<CI2CConnectorFTDI> connector_I, const std::vector<uint8_t>& data_I,
-               CInterfaceNotifier* notifier_I, bool quantaFirmware_I,
-               bool qisdaVenusScalarBoard_I)
+               CInterfaceNotifier* notifier_I, bool quantaFirmware_I, bool qisdaVenusScalarBoard_I)
     : mConnector(std::move(connector_I)),
       mNotifier(notifier_I),
       mQuantaFirmware(quantaFirmware_I),
@@ -196,8 +195,10 @@ bool RTDISP::SerialFlashIntoISP() {
   Log("SerialFlashIntoISP()", false);
   WriteMCUReg(kISPControl, kISPMode);
   if (!WaitBitChange(kISPControl, kISPMode, kISPMode, kISPWaitReads)) return false;
-  WriteMCURegs({{kIndirectAddress, 0x9F}, {kIndirectData, 0x06},
-                {kIndirectAddress, 0xA0}, {kIndirectData, 0x74}});
+  WriteMCURegs({{kIndirectAddress, 0x9F},
+                {kIndirectData, 0x06},
+                {kIndirectAddress, 0xA0},
+                {kIndirectData, 0x74}});
   return true;
 }
 
@@ -209,10 +210,22 @@ FT_STATUS RTDISP::SerialFlashExitISP() {
 void RTDISP::SetDefaultReg() {
   Log("SetDefaultReg()", false);
   if (mQuantaFirmware) {
-    WriteMCURegs({{0x1E, 2}, {0x1F, 0}, {0x20, 0x1C}, {0x2C, 2}, {0x2D, 0}, {0x2E, 0x1C},
-                  {0x1B, 2}, {0x1C, 0x30}, {0x1D, 0x1C}});
+    WriteMCURegs({{0x1E, 2},
+                  {0x1F, 0},
+                  {0x20, 0x1C},
+                  {0x2C, 2},
+                  {0x2D, 0},
+                  {0x2E, 0x1C},
+                  {0x1B, 2},
+                  {0x1C, 0x30},
+                  {0x1D, 0x1C}});
   }
-  WriteMCURegs({{0x6A, 3}, {0x6B, 0x0B}, {0x6C, 0}, {0x62, 6}, {0x63, 0x50}, {0xED, 0x88},
+  WriteMCURegs({{0x6A, 3},
+                {0x6B, 0x0B},
+                {0x6C, 0},
+                {0x62, 6},
+                {0x63, 0x50},
+                {0xED, 0x88},
                 {kRunControl, 4}});
 }
 
@@ -224,8 +237,12 @@ bool RTDISP::QuantaCheckFlash() {
   for (uint8_t reg : {kFlashCommand, kFlashResult0, kFlashResult1, kFlashResult2}) {
     ReadMCUReg(reg);
   }
-  WriteMCURegs({{kFlashCommand, 0x5A}, {kFlashOpcode, 0xAB}, {kFlashAddressHigh, 0},
-                {kFlashAddressMiddle, 0}, {kFlashAddressLow, 0}, {kFlashCommand, 0x5B}});
+  WriteMCURegs({{kFlashCommand, 0x5A},
+                {kFlashOpcode, 0xAB},
+                {kFlashAddressHigh, 0},
+                {kFlashAddressMiddle, 0},
+                {kFlashAddressLow, 0},
+                {kFlashCommand, 0x5B}});
   const bool idle = WaitFlashIdle();
   ReadMCUReg(kFlashCommand);
   ReadMCUReg(kFlashResult0);
@@ -260,37 +277,55 @@ void RTDISP::DisableHardwareFlashWriteProtect() {
     const uint8_t v = ReadMCUReg(kIndirectData);
     WriteMCURegs({{kIndirectAddress, first},
                   {kIndirectData, static_cast<uint8_t>((v & 0xF8) + 1)},
-                  {kIndirectAddress, 0x9F}, {kIndirectData, 0xFE},
-                  {kIndirectAddress, second}, {kIndirectData, 1}});
+                  {kIndirectAddress, 0x9F},
+                  {kIndirectData, 0xFE},
+                  {kIndirectAddress, second},
+                  {kIndirectData, 1}});
   } else if (mQisdaVenusScalarBoard) {
-    WriteMCURegs({{kIndirectAddress, 0x95}, {kIndirectData, 0x10}, {kIndirectAddress, 0xD4},
-                  {kIndirectData, 1}, {0xCD, 0},
-                  {kIndirectAddress, 0x95}, {kIndirectData, 0x10}, {kIndirectAddress, 0xD8},
-                  {kIndirectData, 1}, {0xA0, 1},
-                  {kIndirectAddress, 0x95}, {kIndirectData, 0x10}, {kIndirectAddress, 0xEE},
-                  {kIndirectData, 1}, {0xD7, 1}});
+    WriteMCURegs({{kIndirectAddress, 0x95},
+                  {kIndirectData, 0x10},
+                  {kIndirectAddress, 0xD4},
+                  {kIndirectData, 1},
+                  {0xCD, 0},
+                  {kIndirectAddress, 0x95},
+                  {kIndirectData, 0x10},
+                  {kIndirectAddress, 0xD8},
+                  {kIndirectData, 1},
+                  {0xA0, 1},
+                  {kIndirectAddress, 0x95},
+                  {kIndirectData, 0x10},
+                  {kIndirectAddress, 0xEE},
+                  {kIndirectData, 1},
+                  {0xD7, 1}});
   } else {
     WriteMCURegs({{kIndirectAddress, 0x9F}, {kIndirectData, 0x10}, {kIndirectAddress, 0x38}});
     const uint8_t v = ReadMCUReg(kIndirectData);
     WriteMCURegs({{kIndirectAddress, 0x38},
                   {kIndirectData, static_cast<uint8_t>((v & 0xF8) + 1)},
-                  {kIndirectAddress, 0x9F}, {kIndirectData, 0xFE},
-                  {kIndirectAddress, 0x28}, {kIndirectData, 1}});
+                  {kIndirectAddress, 0x9F},
+                  {kIndirectData, 0xFE},
+                  {kIndirectAddress, 0x28},
+                  {kIndirectData, 1}});
   }
 }
 
 bool RTDISP::EnableSoftwareFlashWriteProtect(bool enable_I) {
   Log("EnableSoftwareFlashWriteProtect()", false);
   // Write the flash's status register: every block protected, or none.
-  WriteMCURegs({{kFlashCommand, 0x68}, {kFlashOpcode, 0x01},
+  WriteMCURegs({{kFlashCommand, 0x68},
+                {kFlashOpcode, 0x01},
                 {kFlashAddressHigh, static_cast<uint8_t>(enable_I ? 0xFF : 0x00)},
                 {kFlashCommand, 0x69}});
   if (mQuantaFirmware) {
     WaitFlashIdle();
-    WriteMCURegs({{kFlashCommand, 0x68}, {kFlashOpcode, 0x31}, {kFlashAddressHigh, 0x00},
+    WriteMCURegs({{kFlashCommand, 0x68},
+                  {kFlashOpcode, 0x31},
+                  {kFlashAddressHigh, 0x00},
                   {kFlashCommand, 0x69}});
     WaitFlashIdle();
-    WriteMCURegs({{kFlashCommand, 0x68}, {kFlashOpcode, 0x11}, {kFlashAddressHigh, 0x60},
+    WriteMCURegs({{kFlashCommand, 0x68},
+                  {kFlashOpcode, 0x11},
+                  {kFlashAddressHigh, 0x60},
                   {kFlashCommand, 0x69}});
   }
   return WaitFlashIdle();
@@ -299,8 +334,11 @@ bool RTDISP::EnableSoftwareFlashWriteProtect(bool enable_I) {
 bool RTDISP::BlockErase(unsigned int block_I) {
   Log("BlockErase()", false);
   WriteMCURegs({{kFlashAddressHigh, static_cast<uint8_t>(block_I & 0xFF)},
-                {kFlashAddressMiddle, 0}, {kFlashAddressLow, 0},
-                {kFlashCommand, 0xB8}, {kFlashOpcode, kBlockEraseOpcode}, {kFlashCommand, 0xB9}});
+                {kFlashAddressMiddle, 0},
+                {kFlashAddressLow, 0},
+                {kFlashCommand, 0xB8},
+                {kFlashOpcode, kBlockEraseOpcode},
+                {kFlashCommand, 0xB9}});
   if (!WaitFlashIdle()) return false;
   if (ReadCRC(block_I * FLASH_UINT_SIZE, FLASH_UINT_SIZE) != kBlankBlockCRC) {
     Error("Block erase check failed");
@@ -311,9 +349,11 @@ bool RTDISP::BlockErase(unsigned int block_I) {
 
 bool RTDISP::SerialFlashWriteCode(unsigned int block_I) {
   Log("SerialFlashWriteCode()", false);
-  WriteMCURegs({{kProgramOpcode, kPageProgramOpcode}, {kProgramControl, 0xFF},
+  WriteMCURegs({{kProgramOpcode, kPageProgramOpcode},
+                {kProgramControl, 0xFF},
                 {kFlashAddressHigh, static_cast<uint8_t>(block_I & 0xFF)},
-                {kFlashAddressMiddle, 0}, {kFlashAddressLow, 0}});
+                {kFlashAddressMiddle, 0},
+                {kFlashAddressLow, 0}});
   const std::vector<uint8_t>& data = mBlocks[block_I];
   // The MCU moves the flash address on by itself after every page.
   for (size_t page = 0; page < data.size(); page += kPageSize) {
@@ -389,8 +429,7 @@ bool RTDISP::WaitFlashIdle() {
   return WaitBitChange(kFlashCommand, kFlashBusy, 0, kFlashWaitReads);
 }
 
-bool RTDISP::WaitBitChange(uint8_t reg_I, uint8_t mask_I, uint8_t target_I,
-                           unsigned int tries_I) {
+bool RTDISP::WaitBitChange(uint8_t reg_I, uint8_t mask_I, uint8_t target_I, unsigned int tries_I) {
   Log("WaitBitChange()", false);
   for (unsigned int read = 0; read < tries_I; ++read) {
     if (((ReadMCUReg(reg_I) ^ target_I) & mask_I) == 0) return true;

@@ -20,8 +20,8 @@ constexpr bool IS_VENUS_L(SENSOR_ID sid_I) { return sid_I == 0x7A5D0391; }
 constexpr bool IS_VENUS_BSU(SENSOR_ID sid_I) { return sid_I == 0x7A5D0396; }
 constexpr bool IS_VENUS_BSU_VAVE(SENSOR_ID sid_I) { return sid_I == 0x7A5D03B0; }
 constexpr bool IS_VENUS(SENSOR_ID sid_I) {
-  return IS_VENUS_M(sid_I) || IS_VENUS_M_VAVE(sid_I) || IS_VENUS_L(sid_I) ||
-         IS_VENUS_BSU(sid_I) || IS_VENUS_BSU_VAVE(sid_I);
+  return IS_VENUS_M(sid_I) || IS_VENUS_M_VAVE(sid_I) || IS_VENUS_L(sid_I) || IS_VENUS_BSU(sid_I) ||
+         IS_VENUS_BSU_VAVE(sid_I);
 }
 
 constexpr bool IS_BRODICK10_13(SENSOR_ID sid_I) {

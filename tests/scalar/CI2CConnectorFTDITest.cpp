@@ -1,11 +1,10 @@
-#include "scalar/CI2CConnectorFTDI.h"
-
 #include <gtest/gtest.h>
 
 #include <functional>
 #include <tuple>
 
 #include "common/CVirtualClock.h"
+#include "scalar/CI2CConnectorFTDI.h"
 #include "scalar/RecordingFTDIExAPI32.h"
 #include "support/LogCapture.h"
 
@@ -52,6 +51,7 @@ TEST_F(CI2CConnectorFTDITest, OpeningProbesTheEngineAndSetsUpI2CAt100kHz) {
 
 TEST_F(CI2CConnectorFTDITest, OpenFailsClosedOrSucceedsAfterTheResetRetries) {
   // name, set-up, opens, found but not openable, resets
+  // clang-format off
   const std::vector<std::tuple<const char*, std::function<void(Fake&)>, bool, bool, int>> rows = {
       {"no bridge", [](Fake& f) { f.bridges = 0; }, false, false, 0},
       {"held by another", [](Fake& f) { f.openStatus = FT_DEVICE_NOT_OPENED; }, false, true, 0},
@@ -61,6 +61,7 @@ TEST_F(CI2CConnectorFTDITest, OpenFailsClosedOrSucceedsAfterTheResetRetries) {
       {"probe not answered as bad", [](Fake& f) { f.probeAnswer = {0x00, 0x00}; }, false, false, 1},
       {"probe echo only", [](Fake& f) { f.probeAnswer = {0x00, 0xAA}; }, true, false, 1},
   };
+  // clang-format on
   for (const auto& [name, setUp, opens, notOpenable, resets] : rows) {
     SCOPED_TRACE(name);
     Fake api;
@@ -88,10 +89,10 @@ TEST_F(CI2CConnectorFTDITest, PrimitivesAreOneTransferEachOfTheirExactStrings) {
   EXPECT_EQ(mLink.GetByte(true), std::make_pair(FT_STATUS{FT_OK}, uint8_t{0x5A}));
   EXPECT_EQ(mLink.GetByte(false), std::make_pair(FT_STATUS{FT_OK}, uint8_t{0xA5}));
   EXPECT_EQ(mLink.Stop(), FT_OK);
-  EXPECT_EQ(mApi.writes,
-            (std::vector<Bytes>{Fake::kStart, Fake::SendByteString(0x94), Fake::kReleaseSDA,
-                                Fake::SendByteString(0x6F), Fake::kReleaseSDA,
-                                Fake::GetByteString(true), Fake::GetByteString(false), Fake::kStop}));
+  EXPECT_EQ(mApi.writes, (std::vector<Bytes>{Fake::kStart, Fake::SendByteString(0x94),
+                                             Fake::kReleaseSDA, Fake::SendByteString(0x6F),
+                                             Fake::kReleaseSDA, Fake::GetByteString(true),
+                                             Fake::GetByteString(false), Fake::kStop}));
   EXPECT_EQ(Fake::kStart.size(), 36u);
   EXPECT_EQ(Fake::kStop.size(), 27u);
   const double slept = mClock->GetTotalSlept();
@@ -103,12 +104,14 @@ TEST_F(CI2CConnectorFTDITest, SendRequestFindsTheHeaderAndReadsPayloadAndChecksu
   const Bytes request{0x6E, 0x51, 0x82, 0x01, 0xC9, 0x75};
   const std::string written = "B S 6E 51 82 01 C9 75 P S 6F";
   // reads answered, reply, bus traffic after the read address
+  // clang-format off
   const std::vector<std::tuple<const char*, Bytes, Bytes, std::string>> rows = {
       {"a zero header is the null reply", {0x00}, {0x6E, 0x80, 0xBE}, "R P"},
       {"junk before the header", {0x12, 0x34, 0x6E, 0x82, 0xAA, 0xBB, 0xCC},
        {0x6E, 0x82, 0xAA, 0xBB, 0xCC}, "R R R R R R R P"},
       {"0xFF header is nothing", {0x12, 0xFF}, {}, "R R P"},
   };
+  // clang-format on
   for (const auto& [name, reads, reply, traffic] : rows) {
     SCOPED_TRACE(name);
     OpenQuietly();
@@ -123,12 +126,14 @@ TEST_F(CI2CConnectorFTDITest, SendRequestFindsTheHeaderAndReadsPayloadAndChecksu
 
 TEST_F(CI2CConnectorFTDITest, SendRequestWritesAgainOnlyAsDeepAsAsked) {
   // acknowledges, depth, bus traffic
+  // clang-format off
   const std::vector<std::tuple<Bytes, int, std::string>> rows = {
       {{0, 0, 1}, 1, "B S 6E 51 81 P B S 6E 51 81 0C B2 P S 6F R R R P"},
       {{1, 1, 1}, 1, "B S 6E P B S 6E P B S 6E P"},
       {{1, 1}, 0, "B S 6E P B S 6E P"},
       {{1}, -1, "B S 6E P"},
   };
+  // clang-format on
   for (const auto& [acks, depth, traffic] : rows) {
     SCOPED_TRACE(depth);
     OpenQuietly();
@@ -142,7 +147,7 @@ TEST_F(CI2CConnectorFTDITest, SendRequestWritesAgainOnlyAsDeepAsAsked) {
 
 TEST_F(CI2CConnectorFTDITest, AFailedProbeBeforeARequestClosesTheBridge) {
   OpenQuietly();
-  mApi.failWrites = {0};
+  mApi.failWrite = 0;
   EXPECT_TRUE(mLink.SendRequest({0x6E, 0x51, 0x81, 0x0C, 0xB2}, 0.0, 38, 1).empty());
   EXPECT_FALSE(mLink.IsOpen());
   EXPECT_FALSE(mApi.open);

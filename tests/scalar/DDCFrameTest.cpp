@@ -1,9 +1,8 @@
-#include "scalar/DDCFrame.h"
-
 #include <gtest/gtest.h>
 
 #include <tuple>
 
+#include "scalar/DDCFrame.h"
 #include "scalar/SensorFamilies.h"
 
 namespace {
@@ -11,6 +10,7 @@ namespace {
 using Bytes = std::vector<uint8_t>;
 
 TEST(DDCFrame, EveryRequestIsSentByteForByteWithItsWaitSizeAndRetries) {
+  // clang-format off
   const std::vector<std::tuple<const char*, DDCFrame::SRequest, Bytes, unsigned long, int, double>>
       rows = {
           {"EDID at 0x0120", DDCFrame::ReadEDID(0x0120),
@@ -34,6 +34,7 @@ TEST(DDCFrame, EveryRequestIsSentByteForByteWithItsWaitSizeAndRetries) {
           {"save settings", DDCFrame::SaveSettingsToScalar(),
            {0x6E, 0x51, 0x81, 0x0C, 0x6E ^ 0x51 ^ 0x81 ^ 0x0C}, 38, 0, 0.22},
       };
+  // clang-format on
   for (const auto& [name, request, bytes, sizeHint, depth, delay] : rows) {
     SCOPED_TRACE(name);
     EXPECT_EQ(request.bytes, bytes);
@@ -44,25 +45,21 @@ TEST(DDCFrame, EveryRequestIsSentByteForByteWithItsWaitSizeAndRetries) {
 }
 
 TEST(DDCFrame, AReplyIsGoodWhenItsSumSeededWith0x50IsZero) {
+  // clang-format off
   const std::vector<std::tuple<Bytes, bool>> rows = {
       {DDCFrame::NullReply(), true},
       {{0x6E, 0x82, 0x10, 0x20, 0x50 ^ 0x6E ^ 0x82 ^ 0x10 ^ 0x20}, true},
       {{0x6E, 0x82, 0x10, 0x20, 0x6E ^ 0x82 ^ 0x10 ^ 0x20}, false},  // summed without the seed
       {{0x6E, 0x82, 0x10, 0x21, 0x50 ^ 0x6E ^ 0x82 ^ 0x10 ^ 0x20}, false},
   };
+  // clang-format on
   for (const auto& [reply, good] : rows) EXPECT_EQ(DDCFrame::IsChecksumGood(reply), good);
   EXPECT_EQ(DDCFrame::Checksum({}, 0x50), 0x50);
 }
 
-TEST(DDCFrame, AnOffsetEchoIsThreePayloadBytesCarryingTheOffset) {
-  EXPECT_TRUE(DDCFrame::IsOffsetEcho({0x6E, 0x83, 0xE3, 0x01, 0x20, 0x00}, 0x0120));
-  EXPECT_FALSE(DDCFrame::IsOffsetEcho({0x6E, 0x83, 0xE3, 0x01, 0x21, 0x00}, 0x0120));
-  EXPECT_FALSE(DDCFrame::IsOffsetEcho({0x6E, 0x84, 0xE3, 0x01, 0x20, 0x41, 0x00}, 0x0120));
-  EXPECT_FALSE(DDCFrame::IsOffsetEcho({0x6E, 0x83}, 0));
-}
-
 TEST(SensorFamilies, PredicatesTellTheBoardFamilies) {
   // id, Venus, Brodick 13, Brodick 16, GreyOwl, 16R, 24
+  // clang-format off
   const std::vector<std::tuple<SENSOR_ID, bool, bool, bool, bool, bool, bool>> rows = {
       {0x7A5D0390, true, false, false, false, false, false},
       {0x7A5D03B0, true, false, false, false, false, false},
@@ -78,6 +75,7 @@ TEST(SensorFamilies, PredicatesTellTheBoardFamilies) {
       {0x12340390, false, false, false, false, false, false},  // another vendor's product half
       {-1, false, false, false, false, false, false},
   };
+  // clang-format on
   for (const auto& [sid, venus, brodick13, brodick16, greyowl, greyowl16r, greyowl24] : rows) {
     SCOPED_TRACE(sid);
     EXPECT_EQ(IS_VENUS(sid), venus);

@@ -1,9 +1,8 @@
-#include "scalar/DisplayUtils.h"
-
 #include <gtest/gtest.h>
 
 #include <tuple>
 
+#include "scalar/DisplayUtils.h"
 #include "scalar/HelperUtils.h"
 
 namespace {
@@ -62,8 +61,8 @@ std::vector<std::tuple<int64_t, int64_t, std::string>> Rows(
 TEST_F(DisplayUtilsTest, ListsTheFamilysDisplaysFromTheirEDIDOrWhatTheStackKnows) {
   using Row = std::tuple<int64_t, int64_t, std::string>;
   EXPECT_EQ(Rows(DisplayUtils::TavikDisplayAttributes()),
-            (std::vector<Row>{{23335, 0x0390, "PEN16A"}, {23335, 0x0391, "NOEDID7"},
-                              {23335, 0x0391, "PEN24B"}}));
+            (std::vector<Row>{
+                {23335, 0x0390, "PEN16A"}, {23335, 0x0391, "NOEDID7"}, {23335, 0x0391, "PEN24B"}}));
   EXPECT_EQ(Rows(DisplayUtils::TavikDisplayAttributesWithPID(0x0391)),
             (std::vector<Row>{{23335, 0x0391, "NOEDID7"}, {23335, 0x0391, "PEN24B"}}));
   EXPECT_TRUE(DisplayUtils::TavikDisplayAttributesWithPID(0x0999).empty());
@@ -87,11 +86,13 @@ TEST_F(DisplayUtilsTest, ADisplayWithoutEDIDGetsABlockTheSearchesRead) {
 
 TEST_F(DisplayUtilsTest, SyntheticBlockDefaultsAndALongNameOverrunningTheSerialPattern) {
   // name, serial, name read back, serial read back
+  // clang-format off
   const std::vector<std::tuple<std::string, std::string, std::string, std::string>> rows = {
       {"", "", "-", "0"},
       {"Fourteen chars", "S1", "Fourteen chars", "S1"},
       {"Fifteen chars!!", "S1", "Fifteen chars!!", ""},
   };
+  // clang-format on
   for (const auto& [name, serial, nameBack, serialBack] : rows) {
     SCOPED_TRACE(name);
     mDisplays.displays[2].productName = name;

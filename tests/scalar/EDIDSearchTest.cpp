@@ -23,6 +23,7 @@ const Bytes kNameTag{0x00, 0x00, 0xFC, 0x00};
 
 TEST(EDIDSearch, SerialAndNameComeFromTheirDescriptors) {
   // edid, ExtractSerialNumber, ExtractMonitorName, findEDIDValue serial, findEDIDValue name
+  // clang-format off
   const std::vector<std::tuple<const char*, Bytes, std::string, std::string, std::string, std::string>>
       rows = {
           {"no descriptors", Text("abcdefgh"), "", "", "", ""},
@@ -36,6 +37,7 @@ TEST(EDIDSearch, SerialAndNameComeFromTheirDescriptors) {
            "SN9", "Disp", "SN9", "Disp"},
           {"pattern at the very end", kSerialTag, "", "", "", ""},
       };
+  // clang-format on
   for (const auto& [name, edid, serial, monitor, foundSerial, foundName] : rows) {
     SCOPED_TRACE(name);
     EXPECT_EQ(ExtractSerialNumber(edid), serial);
@@ -45,19 +47,15 @@ TEST(EDIDSearch, SerialAndNameComeFromTheirDescriptors) {
   }
 }
 
-TEST(EDIDSearch, PatternPositionIsTheFirstOccurrence) {
-  EXPECT_EQ(PosOfPatternInBuffer(Concat({Text("xy"), kNameTag, kNameTag}), kNameTag), 2);
-  EXPECT_EQ(PosOfPatternInBuffer(Text("xy"), kNameTag), -1);
-  EXPECT_EQ(PosOfPatternInBuffer({0x00, 0x00, 0xFC}, kNameTag), -1);
-}
-
 TEST(CapabilitiesString, KeepsTheTextUpToTheParenthesisClosingTheFirst) {
+  // clang-format off
   const std::vector<std::tuple<std::string, std::string>> rows = {
       {"(abc)xyz", "(abc)"},
       {"(prot(monitor)type(lcd))(junk)", "(prot(monitor)type(lcd))"},
       {"(unclosed(", "(unclosed("},
       {"abc(d)", "a"},
   };
+  // clang-format on
   for (const auto& [text, kept] : rows) {
     EXPECT_EQ(Connector::ValidateCapabilitiesString(Text(text)), kept) << text;
   }

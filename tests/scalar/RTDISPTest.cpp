@@ -1,10 +1,9 @@
-#include "scalar/RTDISP.h"
-
 #include <gtest/gtest.h>
 
 #include <tuple>
 
 #include "common/CVirtualClock.h"
+#include "scalar/RTDISP.h"
 #include "scalar/RecordingFTDIExAPI32.h"
 #include "support/RecordingNotifier.h"
 
@@ -57,6 +56,7 @@ TEST_F(RTDISPTest, FlowsEndWithTheirReportsAndLeaveISPOnFailure) {
   lateEntry.push_back(0x80);
 
   // name, image size, register reads, succeeds, errors, progress
+  // clang-format off
   const std::vector<std::tuple<const char*, size_t, std::deque<uint8_t>, bool, Strings,
                                std::vector<unsigned int>>>
       rows = {
@@ -64,6 +64,7 @@ TEST_F(RTDISPTest, FlowsEndWithTheirReportsAndLeaveISPOnFailure) {
           {"a block that never erases blank", 65536, {0x80}, false, tenEraseFailures, {100}},
           {"ISP entered at the tenth try", 0, lateEntry, false, enteredLate, {}},
       };
+  // clang-format on
   for (const auto& [name, size, reads, succeeds, errors, progress] : rows) {
     SCOPED_TRACE(name);
     RecordingNotifier notifier;
@@ -78,16 +79,6 @@ TEST_F(RTDISPTest, FlowsEndWithTheirReportsAndLeaveISPOnFailure) {
     // A good run hands control to the new firmware, a failed one leaves ISP.
     EXPECT_TRUE(trace.ends_with(succeeds ? "S 94 EE 02 P" : "S 94 6F 00 P")) << trace;
   }
-}
-
-TEST_F(RTDISPTest, PlainBoardOpensItsWriteProtectPinFromTheValueItRead) {
-  RTDISP programmer(mLink, {}, &mNotifier, false, false);
-  mApi.reads = {0x5F};
-  programmer.DisableHardwareFlashWriteProtect();
-  const std::string readF5 = "S 94 F5 S 95 R- P";
-  EXPECT_EQ(mApi.Trace(), "S 94 F4 9F P S 94 F5 10 P S 94 F4 38 P " + readF5 +
-                              " S 94 F4 38 P S 94 F5 59 P S 94 F4 9F P S 94 F5 FE P"
-                              " S 94 F4 28 P S 94 F5 01 P");
 }
 
 TEST(RTDISPData, TheImageIsCutInto64KiBBlocksAndAPartialBlockIsDropped) {

@@ -6,6 +6,7 @@
 // `defaultRead` once they run out). It knows the primitives only by their
 // exact byte strings, so Trace() shows any other string as "?".
 
+#include <cstdint>
 #include <deque>
 #include <string>
 #include <vector>
@@ -18,9 +19,9 @@ class RecordingFTDIExAPI32 : public CFTDIExAPI32 {
   static inline const std::vector<uint8_t> kStart = {
       0x80, 3, 3, 0x80, 3, 3, 0x80, 3, 3, 0x80, 3, 3, 0x80, 1, 3, 0x80, 1, 3,
       0x80, 1, 3, 0x80, 1, 3, 0x80, 0, 3, 0x80, 0, 3, 0x80, 0, 3, 0x80, 0, 3};
-  static inline const std::vector<uint8_t> kStop = {
-      0x80, 1, 3, 0x80, 1, 3, 0x80, 1, 3, 0x80, 1, 3, 0x80, 3, 3,
-      0x80, 3, 3, 0x80, 3, 3, 0x80, 3, 3, 0x80, 2, 3};
+  static inline const std::vector<uint8_t> kStop = {0x80, 1, 3, 0x80, 1, 3, 0x80, 1, 3,
+                                                    0x80, 1, 3, 0x80, 3, 3, 0x80, 3, 3,
+                                                    0x80, 3, 3, 0x80, 3, 3, 0x80, 2, 3};
   static inline const std::vector<uint8_t> kReleaseSDA = {0x80, 0x02, 0x03};
   static std::vector<uint8_t> SendByteString(uint8_t byte_I) {
     return {0x11, 0, 0, byte_I, 0x80, 0, 1, 0x22, 0, 0x87, 0x80, 0, 3};
@@ -35,8 +36,8 @@ class RecordingFTDIExAPI32 : public CFTDIExAPI32 {
   std::deque<uint8_t> acks;
   std::deque<uint8_t> reads;
   uint8_t defaultRead = 0xFF;
-  // FT_Write fails with FT_IO_ERROR at these call numbers (0 first).
-  std::vector<size_t> failWrites;
+  // FT_Write fails with FT_IO_ERROR at this call number (0 first).
+  size_t failWrite = SIZE_MAX;
   // What the engine answers to the bad-command probe.
   std::vector<uint8_t> probeAnswer{0xFA, 0xAA};
   // Bytes the bridge holds before anything is written.
@@ -52,7 +53,8 @@ class RecordingFTDIExAPI32 : public CFTDIExAPI32 {
       return FT_OK;
     }
     if (reinterpret_cast<uintptr_t>(arg1_IO) >= bridges) return FT_DEVICE_NOT_FOUND;
-    *static_cast<uint32_t*>(arg2_IO) = 0x01200000 + static_cast<uint32_t>(reinterpret_cast<uintptr_t>(arg1_IO));
+    *static_cast<uint32_t*>(arg2_IO) =
+        0x01200000 + static_cast<uint32_t>(reinterpret_cast<uintptr_t>(arg1_IO));
     return FT_OK;
   }
   FT_STATUS FT_OpenEx(void*, uint32_t, FT_HANDLE* handle_O) override {
@@ -81,12 +83,12 @@ class RecordingFTDIExAPI32 : public CFTDIExAPI32 {
     const auto* bytes = static_cast<const uint8_t*>(buffer_I);
     const size_t call = writes.size();
     writes.emplace_back(bytes, bytes + size_I);
-    for (size_t failing : failWrites) {
-      if (failing == call) return FT_IO_ERROR;
-    }
+    if (call == failWrite) return FT_IO_ERROR;
     const std::vector<uint8_t>& written = writes.back();
-    if (written == std::vector<uint8_t>{0xAA}) pending.insert(pending.end(), probeAnswer.begin(), probeAnswer.end());
-    if (written.size() == 13 && written == SendByteString(written[3])) pending.push_back(Next(acks, 0));
+    if (written == std::vector<uint8_t>{0xAA})
+      pending.insert(pending.end(), probeAnswer.begin(), probeAnswer.end());
+    if (written.size() == 13 && written == SendByteString(written[3]))
+      pending.push_back(Next(acks, 0));
     if (written == GetByteString(true) || written == GetByteString(false)) {
       pending.push_back(Next(reads, defaultRead));
     }
@@ -116,14 +118,22 @@ class RecordingFTDIExAPI32 : public CFTDIExAPI32 {
     for (size_t i = first_I; i < writes.size(); ++i) {
       const std::vector<uint8_t>& w = writes[i];
       std::string word;
-      if (w == kStart) word = "S";
-      else if (w == kStop) word = "P";
-      else if (w == kReleaseSDA) continue;
-      else if (w.size() == 13 && w == SendByteString(w[3])) word = StringUtilities::Format("%02X", w[3]);
-      else if (w == GetByteString(true)) word = "R";
-      else if (w == GetByteString(false)) word = "R-";
-      else if (w == std::vector<uint8_t>{0xAA}) word = "B";
-      else word = "?";
+      if (w == kStart)
+        word = "S";
+      else if (w == kStop)
+        word = "P";
+      else if (w == kReleaseSDA)
+        continue;
+      else if (w.size() == 13 && w == SendByteString(w[3]))
+        word = StringUtilities::Format("%02X", w[3]);
+      else if (w == GetByteString(true))
+        word = "R";
+      else if (w == GetByteString(false))
+        word = "R-";
+      else if (w == std::vector<uint8_t>{0xAA})
+        word = "B";
+      else
+        word = "?";
       if (!trace.empty()) trace += ' ';
       trace += word;
     }
