@@ -89,7 +89,6 @@ TEST_F(DisplayUtilsTest, SyntheticBlockDefaultsAndALongNameOverrunningTheSerialP
   // clang-format off
   const std::vector<std::tuple<std::string, std::string, std::string, std::string>> rows = {
       {"", "", "-", "0"},
-      {"Fourteen chars", "S1", "Fourteen chars", "S1"},
       {"Fifteen chars!!", "S1", "Fifteen chars!!", ""},
   };
   // clang-format on

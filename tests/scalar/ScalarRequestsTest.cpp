@@ -101,17 +101,6 @@ TEST_F(ScalarRequestsTest, SerialNumberFallsBackToTheDisplayInformationInUpperCa
   EXPECT_EQ(mScalar.requests.size(), 3u);  // both answers come from what was kept
 }
 
-TEST_F(ScalarRequestsTest, CapabilitiesAreGatheredAndCutAtTheClosingParenthesis) {
-  mScalar.replies = {Chunk(0xE3, 0, "(ab"), Chunk(0xE3, 3, "c)xyz"), Chunk(0xE3, 8, "")};
-  EXPECT_EQ(mScalar.CapabilitiesString(), "(abc)");
-  EXPECT_EQ(mScalar.requests[1], DDCFrame::CapabilitiesStringLinnet(3).bytes);
-
-  CScriptedConnector greyowl;  // Linnet form unanswered; the GreyOwl form retries an empty reply
-  greyowl.replies = {DDCFrame::NullReply(), {}, Chunk(0xF3, 0, "(v)"), Chunk(0xF3, 3, "")};
-  EXPECT_EQ(greyowl.CapabilitiesString(), "(v)");
-  EXPECT_EQ(greyowl.requests[1], DDCFrame::CapabilitiesStringGreyowl(0).bytes);
-}
-
 TEST_F(ScalarRequestsTest, FirmwareVersionIsTheLastThreeBytesOfAGoodReply) {
   const FileVersion none;
   // clang-format off
