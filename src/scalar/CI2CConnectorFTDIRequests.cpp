@@ -52,11 +52,6 @@ void AppendFrom(std::vector<uint8_t>& gathered_IO, const std::vector<uint8_t>& r
   }
 }
 
-bool StartsWith(const std::vector<uint8_t>& bytes_I, std::initializer_list<uint8_t> start_I) {
-  return bytes_I.size() >= start_I.size() &&
-         std::equal(start_I.begin(), start_I.end(), bytes_I.begin());
-}
-
 // With tracing on, what is wrong with a version reply, before the checks.
 void TraceFWVersionReply(const std::vector<uint8_t>& reply_I) {
   ConditionalFunction(g_DebugTrace != 0)([&] {
@@ -254,7 +249,8 @@ std::vector<uint8_t> CI2CConnectorFTDI::ReadDisplayInformation(SENSOR_ID sid_I) 
     if (reply.size() < 6) TAVASSERT_TEXT("break");
   }
   // The answer of a scalar that does not keep this record.
-  if (reply.size() == 11 && StartsWith(reply, {0x6E, 0x88, 0x02, 0x01, 0xF2, 0x00})) return {};
+  if (reply.size() == 11 && DDCFrame::StartsWith(reply, {0x6E, 0x88, 0x02, 0x01, 0xF2, 0x00}))
+    return {};
   CheckAndDropChecksum(reply, "ReadDisplayInformation read checksum mismatch",
                        "ReadDisplayInformation:Read checksum failed\n");
   if (reply.size() != kDisplayInformationSize) return {};
@@ -381,7 +377,7 @@ FileVersion CI2CConnectorFTDI::FWVersion() {
   if (reply.size() <= 9) {
     if (reply.size() <= 1) {
       TavLog::Error("Send request failed\n");
-    } else if (StartsWith(reply, {0x6E, 0x80})) {
+    } else if (DDCFrame::StartsWith(reply, {0x6E, 0x80})) {
       TavLog::Error("Send request no data\n");
     } else {
       TavLog::Error("Send request unknown response\n");

@@ -1,8 +1,5 @@
 #include "scalar/Connector.h"
 
-#include <algorithm>
-#include <initializer_list>
-
 #include "common/CClock.h"
 #include "common/TavAssert.h"
 #include "common/TavLog.h"
@@ -15,11 +12,7 @@ namespace {
 // How long the scalar needs to commit its settings once it acknowledged.
 constexpr double kSaveSettleSeconds = 0.2;
 
-bool StartsWith(const std::vector<uint8_t>& bytes_I, std::initializer_list<uint8_t> start_I) {
-  return bytes_I.size() >= start_I.size() &&
-         std::equal(start_I.begin(), start_I.end(), bytes_I.begin());
-}
-
+// The bytes a scalar answers a save with when it took it.
 bool IsAcknowledgeByte(uint8_t byte_I) {
   return byte_I == 0x80 || byte_I == 0x6E || byte_I == 0xBE;
 }
@@ -62,8 +55,9 @@ bool Connector::ScalarReset() {
   // The scalar's own reset answer is not always summed right; the words
   // of it are what count.
   if (sum != expected) TavLog::Error("ScalarReset:Read checksum failed %i %i\n", sum, expected);
-  if (StartsWith(reply, {0x80, 0xBE, 0x6E}) || StartsWith(reply, {0xBE, 0x6E, 0x80}) ||
-      StartsWith(reply, {0x6E, 0x88, 0x02})) {
+  if (DDCFrame::StartsWith(reply, {0x80, 0xBE, 0x6E}) ||
+      DDCFrame::StartsWith(reply, {0xBE, 0x6E, 0x80}) ||
+      DDCFrame::StartsWith(reply, {0x6E, 0x88, 0x02})) {
     return true;
   }
   TavLog::Error("response was one we don't recognize\n");

@@ -1,5 +1,7 @@
 #include "scalar/DDCFrame.h"
 
+#include <algorithm>
+
 namespace DDCFrame {
 
 namespace {
@@ -42,6 +44,11 @@ bool IsNullReply(const std::vector<uint8_t>& reply_I) {
 
 bool IsChecksumGood(const std::vector<uint8_t>& reply_I) {
   return Checksum(reply_I, kReplySeed) == 0;
+}
+
+bool StartsWith(const std::vector<uint8_t>& bytes_I, std::initializer_list<uint8_t> start_I) {
+  return bytes_I.size() >= start_I.size() &&
+         std::equal(start_I.begin(), start_I.end(), bytes_I.begin());
 }
 
 bool IsOffsetEcho(const std::vector<uint8_t>& reply_I, uint16_t offset_I) {

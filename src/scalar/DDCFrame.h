@@ -6,6 +6,7 @@
 // payload, checksum, good when the XOR of it all seeded with 0x50 is 0.
 
 #include <cstdint>
+#include <initializer_list>
 #include <vector>
 
 namespace DDCFrame {
@@ -19,8 +20,8 @@ inline constexpr uint8_t kLengthFlag = 0x80;
 inline constexpr uint8_t kReplySeed = 0x50;
 
 // One request with the way it is sent: the wait between write and read,
-// the reply size to reserve, and how many times a failed write is sent
-// again beyond the first attempt plus one.
+// the reply size to reserve, and the retry depth (a failed write is tried
+// again depth + 1 times).
 struct SRequest {
   std::vector<uint8_t> bytes;
   double delay = 0;
@@ -39,6 +40,8 @@ const std::vector<uint8_t>& NullReply();
 bool IsNullReply(const std::vector<uint8_t>& reply_I);
 // Checksum included, the seeded sum is 0.
 bool IsChecksumGood(const std::vector<uint8_t>& reply_I);
+// `bytes_I` begins with `start_I`.
+bool StartsWith(const std::vector<uint8_t>& bytes_I, std::initializer_list<uint8_t> start_I);
 // A reply to a read by offset that carries only the offset back: the end
 // of the data.
 bool IsOffsetEcho(const std::vector<uint8_t>& reply_I, uint16_t offset_I);
