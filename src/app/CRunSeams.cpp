@@ -2,6 +2,8 @@
 
 #include "lab/CLabBus.h"
 #include "lab/CLabDeviceRegistry.h"
+#include "lab/CLabDisplays.h"
+#include "lab/CLabFTDIExAPI32.h"
 #include "lab/CLabHidNode.h"
 #include "lab/CLabOptions.h"
 #include "lab/CLabProducts.h"
@@ -16,6 +18,7 @@ std::unique_ptr<CRunSeams> CRunSeams::MakeLinux() {
   seams->mRegistry = registry;
   seams->mMakeHidNode = [registry] { return std::make_unique<CLinuxHidNode>(registry); };
   seams->mMakeUsbControl = [] { return std::make_unique<CLinuxUsbControl>(); };
+  // mFTDI and mDisplays stay null until the Linux forms land.
   return seams;
 }
 
@@ -42,6 +45,10 @@ std::unique_ptr<CRunSeams> CRunSeams::MakeLab(const std::string& product_I,
   seams->mRegistry = std::make_shared<CLabDeviceRegistry>(bus);
   seams->mMakeHidNode = [bus] { return std::make_unique<CLabHidNode>(bus); };
   seams->mMakeUsbControl = [bus] { return std::make_unique<CLabUsbControl>(bus); };
+  seams->mFTDI = std::make_shared<CLabFTDIExAPI32>(bus);
+  auto displays = std::make_shared<CLabDisplays>(bus);
+  for (const SDisplay& display : CLabProducts::OtherDisplays(product)) displays->Add(display);
+  seams->mDisplays = displays;
   return seams;
 }
 

@@ -9,6 +9,8 @@
 
 #include "platform/linux/CLinuxDiscovery.h"
 #include "seams/CDeviceRegistry.h"
+#include "seams/CDisplays.h"
+#include "seams/CFTDIExAPI32.h"
 
 class CLabBus;
 
@@ -26,6 +28,10 @@ class CRunSeams {
   const std::shared_ptr<CLabBus>& GetLabBus() const { return mLabBus; }
 
   const std::shared_ptr<CDeviceRegistry>& GetRegistry() const { return mRegistry; }
+  // The FTDI bridges and the attached displays of the scalar path. Null in
+  // a Linux run until the libftdi1 and DRM forms exist.
+  const std::shared_ptr<CFTDIExAPI32>& GetFTDI() const { return mFTDI; }
+  const std::shared_ptr<CDisplays>& GetDisplays() const { return mDisplays; }
   std::unique_ptr<CLinuxDiscovery> MakeDiscovery() const;
 
  private:
@@ -33,6 +39,8 @@ class CRunSeams {
 
   std::shared_ptr<CLabBus> mLabBus;
   std::shared_ptr<CDeviceRegistry> mRegistry;
+  std::shared_ptr<CFTDIExAPI32> mFTDI;
+  std::shared_ptr<CDisplays> mDisplays;
   CLinuxDiscovery::HidNodeFactory mMakeHidNode;
   CLinuxDiscovery::UsbControlFactory mMakeUsbControl;
 };

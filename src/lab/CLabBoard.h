@@ -74,6 +74,7 @@ class CLabBoard {
   uint64_t GetReportCount() const { return mReportCount; }
   // Rules of the protocol or of the flash that the host broke.
   virtual std::vector<std::string> GetViolations() const { return mViolations; }
+  void ClearViolations() { mViolations.clear(); }
 
   // The board's file in a state folder.
   std::string StatePath(const std::string& folder_I) const;
@@ -107,12 +108,13 @@ class CLabBoard {
   bool IsReenumerating() const { return mReenumerating; }
   void Violation(const std::string& text_I) { mViolations.push_back(text_I); }
   double Now() const;
+  // After each report: a board whose vanish fault is due drops off the bus.
+  void AfterReport();
 
  private:
   friend class CLabBus;
   void Trace(SLabTraceEntry::EKind kind_I, std::vector<uint8_t> bytes_I, size_t length_I,
              bool ok_I);
-  void AfterReport();
 
   std::string mName;
   CLabFaults mFaults;

@@ -305,3 +305,14 @@ EUsbStatus CLabBus::Control(const SBinding& binding_I, uint8_t requestType_I, ui
   DeliverEvents();
   return status;
 }
+
+bool CLabBus::WithBoard(const SBinding& binding_I, const std::function<void(CLabBoard&)>& work_I) {
+  bool held = false;
+  {
+    std::lock_guard<std::recursive_mutex> guard(mLock);
+    held = Holds(binding_I);
+    if (held) work_I(*binding_I.board);
+  }
+  DeliverEvents();
+  return held;
+}

@@ -80,6 +80,11 @@ class CLabBus : public std::enable_shared_from_this<CLabBus> {
   EUsbStatus Control(const SBinding& binding_I, uint8_t requestType_I, uint8_t request_I,
                      uint16_t value_I, uint16_t index_I, std::vector<uint8_t>& data_IO,
                      size_t& transferred_O);
+  // For seam forms whose traffic is not reports (the FTDI bridge): runs
+  // `work_I` on the bound board with the lock held, and delivers the events
+  // it caused after. False, without running it, once the binding no longer
+  // holds.
+  bool WithBoard(const SBinding& binding_I, const std::function<void(CLabBoard&)>& work_I);
 
  private:
   friend class CLabBoard;

@@ -18,7 +18,26 @@ constexpr SKindName kKindNames[] = {
     {ELabFaultKind::eRefuseSwitch, "refuse-switch"},
     {ELabFaultKind::eBadCrc, "bad-crc"},
     {ELabFaultKind::eFlaky, "flaky"},
+    {ELabFaultKind::eNak, "nak"},
+    {ELabFaultKind::eStuckBusy, "stuck-busy"},
+    {ELabFaultKind::eCrcMismatch, "crc-mismatch"},
+    {ELabFaultKind::eRefuseOpen, "refuse-open"},
 };
+
+bool TakesCount(ELabFaultKind kind_I) {
+  return kind_I != ELabFaultKind::eRefuseSwitch && kind_I != ELabFaultKind::eStuckBusy &&
+         kind_I != ELabFaultKind::eRefuseOpen;
+}
+
+// Counts each countdown down; true when one of them reaches 0.
+bool CountDown(std::vector<uint32_t>& countdowns_IO) {
+  bool due = false;
+  for (uint32_t& countdown : countdowns_IO) {
+    if (countdown != 0 && --countdown == 0) due = true;
+  }
+  std::erase(countdowns_IO, 0u);
+  return due;
+}
 
 }  // namespace
 
@@ -43,9 +62,9 @@ bool ParseLabFault(const std::string& text_I, SLabFault& fault_O, std::string& e
     return false;
   }
   fault.kind = kind->kind;
-  if (fault.kind == ELabFaultKind::eRefuseSwitch) {
+  if (!TakesCount(fault.kind)) {
     if (at != std::string::npos) {
-      error_O = "refuse-switch takes no count";
+      error_O = name + " takes no count";
       return false;
     }
   } else {
@@ -70,7 +89,7 @@ std::string LabFaultText(const SLabFault& fault_I) {
   for (const SKindName& entry : kKindNames) {
     if (entry.kind == fault_I.kind) text = entry.name;
   }
-  if (fault_I.kind != ELabFaultKind::eRefuseSwitch) {
+  if (TakesCount(fault_I.kind)) {
     text.push_back('@');
     text.append(std::to_string(fault_I.count));
   }
@@ -91,6 +110,10 @@ void CLabFaults::Add(const SLabFault& fault_I) {
     case ELabFaultKind::eRefuseSwitch: mRefuseSwitch = true; break;
     case ELabFaultKind::eBadCrc: mBadDataReports.push_back(fault_I.count); break;
     case ELabFaultKind::eFlaky: mFlakyOneIn = fault_I.count; break;
+    case ELabFaultKind::eNak: mNakBytes.push_back(fault_I.count); break;
+    case ELabFaultKind::eStuckBusy: mStuckBusy = true; break;
+    case ELabFaultKind::eCrcMismatch: mBadCrcs.push_back(fault_I.count); break;
+    case ELabFaultKind::eRefuseOpen: mRefuseOpen = true; break;
   }
 }
 
@@ -101,23 +124,22 @@ void CLabFaults::Clear() {
   mRefuseSwitch = false;
   mBadDataReports.clear();
   mFlakyOneIn = 0;
+  mNakBytes.clear();
+  mStuckBusy = false;
+  mBadCrcs.clear();
+  mRefuseOpen = false;
 }
 
 bool CLabFaults::Empty() const {
   return mVanishAfter == 0 && !mVanishDue && mFailReads == 0 && mFailWrites == 0 && mStalls == 0 &&
-         mBusy == 0 && !mRefuseSwitch && mBadDataReports.empty() && mFlakyOneIn == 0;
+         mBusy == 0 && !mRefuseSwitch && mBadDataReports.empty() && mFlakyOneIn == 0 &&
+         mNakBytes.empty() && !mStuckBusy && mBadCrcs.empty() && !mRefuseOpen;
 }
 
 ELabFaultAction CLabFaults::OnReport(bool isRead_I, bool isData_I, bool ownBusy_I) {
   if (mVanishAfter != 0 && --mVanishAfter == 0) mVanishDue = true;
 
-  bool corrupt = false;
-  if (isData_I) {
-    for (uint32_t& countdown : mBadDataReports) {
-      if (countdown != 0 && --countdown == 0) corrupt = true;
-    }
-    std::erase(mBadDataReports, 0u);
-  }
+  const bool corrupt = isData_I && CountDown(mBadDataReports);
   if (isRead_I && mFailReads != 0) {
     --mFailReads;
     return ELabFaultAction::eFail;
@@ -147,3 +169,7 @@ bool CLabFaults::TakeBusy() {
 size_t CLabFaults::CorruptOffset(size_t size_I) {
   return size_I == 0 ? 0 : static_cast<size_t>(mRandom() % size_I);
 }
+
+bool CLabFaults::TakeNak() { return CountDown(mNakBytes); }
+
+bool CLabFaults::TakeCrcMismatch() { return CountDown(mBadCrcs); }

@@ -20,6 +20,19 @@
 //   flaky@N       each report fails with a chance of 1 in N, drawn from
 //                 the wrapper's seeded generator
 //
+// On an FTDI bridge each FT_Write and FT_Read counts as one report, so
+// vanish@N there cuts the bridge off after N transfers, mid-block if N says
+// so; every call after that fails, and the next run finds the flash as the
+// cut left it. Faults of the bridge's scalar:
+//   nak@N         the Nth byte the host writes on the bridge's I2C bus
+//                 (address bytes too) is not acknowledged, and the device
+//                 takes nothing more of that transaction
+//   stuck-busy    the scalar MCU's flash busy bit (0x60 bit 0) never
+//                 clears once an instruction has run
+//   crc-mismatch@N  the Nth CRC the MCU's engine computes is wrong, once
+//   refuse-open   FT_OpenEx finds the bridge but cannot open it
+//                 (FT_DEVICE_NOT_OPENED)
+//
 // A fault may name its board: KIND@N:board. The generator is seeded, so a
 // run with the same faults and seed fails the same reports.
 
@@ -37,6 +50,10 @@ enum class ELabFaultKind {
   eRefuseSwitch,
   eBadCrc,
   eFlaky,
+  eNak,
+  eStuckBusy,
+  eCrcMismatch,
+  eRefuseOpen,
 };
 
 struct SLabFault {
@@ -47,7 +64,8 @@ struct SLabFault {
   bool operator==(const SLabFault&) const = default;
 };
 
-// Parses "KIND@N" or "KIND@N:board" ("refuse-switch" takes no number).
+// Parses "KIND@N" or "KIND@N:board" ("refuse-switch", "stuck-busy" and
+// "refuse-open" take no number).
 // False, with a reason, on anything else.
 bool ParseLabFault(const std::string& text_I, SLabFault& fault_O, std::string& error_O);
 std::string LabFaultText(const SLabFault& fault_I);
@@ -79,6 +97,12 @@ class CLabFaults {
   bool TakeBusy();
   // Which payload byte to change, below `size_I`.
   size_t CorruptOffset(size_t size_I);
+  // One byte on a bridge's I2C bus: true when it is to be refused.
+  bool TakeNak();
+  bool StuckBusy() const { return mStuckBusy; }
+  // One CRC computed: true when it is to come out wrong.
+  bool TakeCrcMismatch();
+  bool RefuseOpen() const { return mRefuseOpen; }
 
  private:
   uint32_t mVanishAfter = 0;  // 0: no vanish fault
@@ -90,5 +114,9 @@ class CLabFaults {
   bool mRefuseSwitch = false;
   std::vector<uint32_t> mBadDataReports;  // countdowns, one per bad-crc fault
   uint32_t mFlakyOneIn = 0;
+  std::vector<uint32_t> mNakBytes;  // countdowns, one per nak fault
+  bool mStuckBusy = false;
+  std::vector<uint32_t> mBadCrcs;  // countdowns, one per crc-mismatch fault
+  bool mRefuseOpen = false;
   std::mt19937_64 mRandom{0x7A5Cu};
 };

@@ -3,6 +3,7 @@
 #include <algorithm>
 
 #include "lab/CLabBluetooth.h"
+#include "lab/CLabFTDIBridge.h"
 #include "lab/CLabI2CMaster.h"
 #include "lab/CLabPenController.h"
 #include "lab/CLabScalarHid.h"
@@ -21,6 +22,10 @@ constexpr unsigned kPenPort = 1;
 constexpr unsigned kTouchPort = 2;
 constexpr unsigned kBluetoothPort = 3;
 constexpr unsigned kScalarPort = 4;
+constexpr unsigned kBridgePort = 5;
+
+// The name a pen display gives in its EDID and display information.
+constexpr const char* kPanelName = "Lab Display";
 
 std::shared_ptr<CLabBoard> Pen(const std::string& product_I, uint16_t productId_I,
                                ELabProtocol protocol_I) {
@@ -49,6 +54,21 @@ std::shared_ptr<CLabBoard> TouchHex(const std::string& product_I, uint16_t produ
 std::shared_ptr<CLabBoard> Bluetooth(const std::string& product_I, CLabBluetooth::EChip chip_I,
                                      uint16_t productId_I) {
   return std::make_shared<CLabBluetooth>(chip_I, product_I + "-bluetooth", ModuleIds(productId_I));
+}
+
+// The scalar board behind a pen display's FTDI bridge. `scalarProductId_I`
+// is the scalar's id in the device configuration, which the panel's EDID
+// carries as its product code.
+std::shared_ptr<CLabBoard> Bridge(const std::string& product_I, ELabScalarVariant variant_I,
+                                  uint16_t scalarProductId_I, const char* serial_I) {
+  SLabFTDIDescription description;
+  description.name = product_I + "-scalar";
+  description.variant = variant_I;
+  description.panel.connector = "lab-" + product_I;
+  description.panel.productCode = scalarProductId_I;
+  description.panel.name = kPanelName;
+  description.panel.serial = serial_I;
+  return std::make_shared<CLabFTDIBridge>(description);
 }
 
 struct SPlacedBoard {
@@ -84,9 +104,16 @@ std::vector<SPlacedBoard> Build(const std::string& name_I) {
             {kScalarPort, std::make_shared<CLabScalarHid>(name_I + "-scalar", ModuleIds(0x0631))}};
   }
   if (name_I == "display-ftdi") {
-    // The scalar sits behind the display's FTDI bridge, which is not on the
-    // lab bus.
-    return {{kPenPort, Pen(name_I, 0x0701, ELabProtocol::eLoader)}};
+    return {{kPenPort, Pen(name_I, 0x0701, ELabProtocol::eLoader)},
+            {kBridgePort, Bridge(name_I, ELabScalarVariant::ePlain, 0x1060, "LABFT0701")}};
+  }
+  if (name_I == "display-ftdi-quanta") {
+    return {{kPenPort, Pen(name_I, 0x0711, ELabProtocol::eLoader)},
+            {kBridgePort, Bridge(name_I, ELabScalarVariant::eQuanta, 0x1061, "LABFQ0711")}};
+  }
+  if (name_I == "display-ftdi-venus") {
+    return {{kPenPort, Pen(name_I, 0x0721, ELabProtocol::eLoader)},
+            {kBridgePort, Bridge(name_I, ELabScalarVariant::eQisdaVenus, 0x1062, "LABFV0721")}};
   }
   if (name_I == "tunnel-tablet") {
     SLabI2CDescription master;
@@ -111,6 +138,9 @@ const std::vector<SLabProduct>& CLabProducts::All() {
       {"wireless-tablet-1122", "tablet: pen and an AB1122 Bluetooth module"},
       {"display-hid", "pen display: pen, touch and a scalar programmed over HID"},
       {"display-ftdi", "pen display: pen and a scalar behind an FTDI bridge"},
+      {"display-ftdi-quanta", "pen display: pen and a Quanta scalar board behind an FTDI bridge"},
+      {"display-ftdi-venus",
+       "pen display: pen and a Qisda Venus scalar board behind an FTDI bridge"},
       {"tunnel-tablet", "tablet: pen controller reached through an I2C tunnel"},
   };
   return products;
@@ -135,4 +165,16 @@ std::vector<std::shared_ptr<CLabBoard>> CLabProducts::Plug(CLabBus& bus_I,
     boards.push_back(placed.board);
   }
   return boards;
+}
+
+std::vector<SDisplay> CLabProducts::OtherDisplays(const std::string& name_I) {
+  if (name_I != "display-hid") return {};
+  // Its display stack gives no EDID, only what it knows of the monitor.
+  SDisplay display;
+  display.connector = "lab-display-hid";
+  display.manufacturerId = kLabDisplayManufacturer;
+  display.productId = 0x0631;
+  display.serialNumber = "LABHD0601";
+  display.productName = kPanelName;
+  return {display};
 }

@@ -11,6 +11,13 @@
 // product whose pen does not speak the non-BL protocol and stay where they
 // are. Every board answers its updates on the vendor collection (0xFF00,
 // 0x0001); pens also show their digitizer collection.
+//
+// A pen display with its scalar behind an FTDI bridge has the bridge on
+// hub port 5 (CLabFTDIBridge): display-ftdi with the plain scalar board,
+// display-ftdi-quanta with the Quanta board, display-ftdi-venus with the
+// Qisda Venus board. Each panel's EDID carries the scalar's product id of
+// the device configuration (0x1060, 0x1061, 0x1062) and the serial the
+// scalar gives in its display information.
 
 #include <cstdint>
 #include <memory>
@@ -19,6 +26,7 @@
 
 #include "lab/CLabBoard.h"
 #include "lab/CLabBus.h"
+#include "seams/CDisplays.h"
 
 struct SLabProduct {
   std::string name;     // the short name of --lab NAME
@@ -36,4 +44,7 @@ class CLabProducts {
   static std::vector<std::shared_ptr<CLabBoard>> Plug(CLabBus& bus_I, const std::string& name_I,
                                                       unsigned rootPort_I = 1);
   static uint32_t HubLocation(unsigned rootPort_I);
+  // The product's displays that are not the panel of a bridge's scalar
+  // board (CLabDisplays lists those): display-hid's, which gives no EDID.
+  static std::vector<SDisplay> OtherDisplays(const std::string& name_I);
 };

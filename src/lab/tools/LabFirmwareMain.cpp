@@ -4,8 +4,10 @@
 //
 // Every image fits the lab board it is meant for: pen images cover the
 // pen's unprotected blocks, the vendor-class touch image the unprotected
-// blocks of its second CPU, the others are plain images of a few pages. The
-// bytes are a pattern with no 0xFF, so that every word is written.
+// blocks of its second CPU, the scalars behind an FTDI bridge take images
+// of whole 64 KiB blocks of their serial flash, the others are plain images
+// of a few pages. The bytes are a pattern with no 0xFF, so that every word
+// is written.
 
 #include <algorithm>
 #include <cstdint>
@@ -112,6 +114,8 @@ constexpr size_t kTouchBytes = 23 * 2048;
 // protected.
 constexpr uint32_t kTunnelStart = 1024;
 constexpr size_t kTunnelBytes = 23 * 1024;
+// A scalar behind an FTDI bridge: four blocks of its serial flash.
+constexpr size_t kBridgeScalarBytes = 4 * 65536;
 
 }  // namespace
 
@@ -126,10 +130,12 @@ int main(int argc, char** argv) {
 
   // Each a release newer than the board ships with: pens 1.20, the
   // vendor-class touch 2.10, the other boards and the tunnel's bridge 1.00.
+  // The scalars behind an FTDI bridge ship with 1.00 too.
   bool ok = true;
   uint32_t seed = 1;
-  for (const char* product : {"classic-tablet", "wireless-tablet", "wireless-tablet-1122",
-                              "display-hid", "display-ftdi"}) {
+  for (const char* product :
+       {"classic-tablet", "wireless-tablet", "wireless-tablet-1122", "display-hid", "display-ftdi",
+        "display-ftdi-quanta", "display-ftdi-venus"}) {
     ok &= Write(folder / (std::string(product) + ".pen"),
                 SRecordText(kPenStart, Released(Pattern(kPenBytes, seed++), 0x0130)));
   }
@@ -146,6 +152,9 @@ int main(int argc, char** argv) {
   ok &= Write(folder / "wireless-tablet-1122.airoflash",
               AsText(Released(Pattern(40 * 1024, seed++), 0x0110)));
   ok &= Write(folder / "display-hid.bin", AsText(Released(Pattern(8 * 1024, seed++), 0x0110)));
-  ok &= Write(folder / "display-ftdi.bin", AsText(Released(Pattern(8 * 1024, seed++), 0x0110)));
+  for (const char* product : {"display-ftdi", "display-ftdi-quanta", "display-ftdi-venus"}) {
+    ok &= Write(folder / (std::string(product) + ".bin"),
+                AsText(Released(Pattern(kBridgeScalarBytes, seed++), 0x0110)));
+  }
   return ok ? 0 : 1;
 }

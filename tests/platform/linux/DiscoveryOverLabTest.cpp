@@ -4,9 +4,12 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
+
 #include "devices/IOUtils.h"
 #include "flash/CFLDeviceInterface.h"
 #include "lab/CLabDeviceRegistry.h"
+#include "lab/CLabFTDIBridge.h"
 #include "lab/CLabHidNode.h"
 #include "lab/CLabProducts.h"
 #include "lab/CLabTouchHex.h"
@@ -75,6 +78,10 @@ TEST_F(DiscoveryOverLab, ProductsSideBySideAreOneDeviceEachWithTheirOwnBoardsInT
       {"display-hid", EHID_INTERFACE, 1, EHID_INTERFACE, EINVALID_INTERFACE, EHID_INTERFACE, false},
       {"display-ftdi", EHID_INTERFACE, 1, EINVALID_INTERFACE, EINVALID_INTERFACE,
        EINVALID_INTERFACE, true},
+      {"display-ftdi-quanta", EHID_INTERFACE, 1, EINVALID_INTERFACE, EINVALID_INTERFACE,
+       EINVALID_INTERFACE, true},
+      {"display-ftdi-venus", EHID_INTERFACE, 1, EINVALID_INTERFACE, EINVALID_INTERFACE,
+       EINVALID_INTERFACE, true},
       {"tunnel-tablet", EI2C_INTERFACE, 0, EINVALID_INTERFACE, EINVALID_INTERFACE,
        EINVALID_INTERFACE, true},
   };
@@ -117,7 +124,11 @@ TEST_F(DiscoveryOverLab, ProductsSideBySideAreOneDeviceEachWithTheirOwnBoardsInT
       }
       EXPECT_TRUE(ours) << interface->GetPath();
     }
-    EXPECT_EQ(attached, boards[k].size());
+    // A scalar behind a display's FTDI bridge is not searched by discovery.
+    const auto searched = std::count_if(boards[k].begin(), boards[k].end(), [](const auto& board) {
+      return dynamic_cast<const CLabFTDIBridge*>(board.get()) == nullptr;
+    });
+    EXPECT_EQ(attached, static_cast<size_t>(searched));
   }
 }
 
