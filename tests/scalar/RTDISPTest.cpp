@@ -30,16 +30,6 @@ class RTDISPTest : public ::testing::Test {
   RecordingNotifier mNotifier;
 };
 
-TEST_F(RTDISPTest, EnteringISPSetsTheModeBitWaitsForItAndUnlocksTheIndirectPages) {
-  RTDISP programmer(mLink, {}, &mNotifier, false, false);
-  mApi.reads = {0x00, 0x00, 0x80};
-  EXPECT_TRUE(programmer.SerialFlashIntoISP());
-  const std::string readISP = "S 94 6F S 95 R- P";
-  EXPECT_EQ(mApi.Trace(), "S 94 6F 80 P " + readISP + " " + readISP + " " + readISP +
-                              " S 94 F4 9F P S 94 F5 06 P S 94 F4 A0 P S 94 F5 74 P");
-  EXPECT_TRUE(mNotifier.errors.empty());
-}
-
 TEST_F(RTDISPTest, FlowsEndWithTheirReportsAndLeaveISPOnFailure) {
   const Strings tenEraseFailures = [] {
     Strings errors;
