@@ -79,27 +79,6 @@ TEST_F(CI2CConnectorFTDITest, OpenFailsClosedOrSucceedsAfterTheResetRetries) {
   EXPECT_FALSE(CI2CConnectorFTDI().Open(0));
 }
 
-TEST_F(CI2CConnectorFTDITest, PrimitivesAreOneTransferEachOfTheirExactStrings) {
-  OpenQuietly();
-  mApi.acks = {0x00, 0x01};
-  mApi.reads = {0x5A, 0xA5};
-  EXPECT_EQ(mLink.Start(), FT_OK);
-  EXPECT_EQ(mLink.SendByte(0x94, false), FT_OK);
-  EXPECT_EQ(mLink.SendByte(0x6F, false), 4u);  // no acknowledge
-  EXPECT_EQ(mLink.GetByte(true), std::make_pair(FT_STATUS{FT_OK}, uint8_t{0x5A}));
-  EXPECT_EQ(mLink.GetByte(false), std::make_pair(FT_STATUS{FT_OK}, uint8_t{0xA5}));
-  EXPECT_EQ(mLink.Stop(), FT_OK);
-  EXPECT_EQ(mApi.writes, (std::vector<Bytes>{Fake::kStart, Fake::SendByteString(0x94),
-                                             Fake::kReleaseSDA, Fake::SendByteString(0x6F),
-                                             Fake::kReleaseSDA, Fake::GetByteString(true),
-                                             Fake::GetByteString(false), Fake::kStop}));
-  EXPECT_EQ(Fake::kStart.size(), 36u);
-  EXPECT_EQ(Fake::kStop.size(), 27u);
-  const double slept = mClock->GetTotalSlept();
-  mLink.SendByte(0x00, true);
-  EXPECT_NEAR(mClock->GetTotalSlept() - slept, 0.02, 1e-9);
-}
-
 TEST_F(CI2CConnectorFTDITest, SendRequestFindsTheHeaderAndReadsPayloadAndChecksum) {
   const Bytes request{0x6E, 0x51, 0x82, 0x01, 0xC9, 0x75};
   const std::string written = "B S 6E 51 82 01 C9 75 P S 6F";

@@ -113,15 +113,4 @@ TEST_F(ScalarOverLabTest, FlashFaultsAreReportedRetriedOrFatal) {
   }
 }
 
-TEST_F(ScalarOverLabTest, ABridgeHeldElsewhereIsFoundButNotOpenable) {
-  Plug("display-ftdi");
-  SLabFault fault;
-  std::string error;
-  ASSERT_TRUE(ParseLabFault("refuse-open", fault, error));
-  mBridge->Faults().Add(fault);
-  CI2CConnectorFTDI link;
-  EXPECT_FALSE(link.Open(0));
-  EXPECT_TRUE(link.GetFoundButNotOpenable());
-}
-
 }  // namespace

@@ -101,25 +101,6 @@ TEST_F(ScalarRequestsTest, SerialNumberFallsBackToTheDisplayInformationInUpperCa
   EXPECT_EQ(mScalar.requests.size(), 3u);  // both answers come from what was kept
 }
 
-TEST_F(ScalarRequestsTest, FirmwareVersionIsTheLastThreeBytesOfAGoodReply) {
-  const FileVersion none;
-  // clang-format off
-  const std::vector<std::tuple<Bytes, FileVersion>> rows = {
-      {Reply({0x02, 0x00, 0xC9, 0x01, 0x00, 0x02, 0x07, 0x10}),
-       FileVersion(2, 7, 16, FileVersion::EFinalVersion, 0)},
-      {Reply({0x02, 0x00, 0xC9, 0x02, 0x00, 0x02, 0x07, 0x10}), none},  // bad code type
-      {Reply({0x02, 0x00, 0xC8, 0x01, 0x00, 0x02, 0x07, 0x10}), none},  // another query's
-      {DDCFrame::NullReply(), none},
-  };
-  // clang-format on
-  for (const auto& [reply, version] : rows) {
-    CScriptedConnector scalar;
-    scalar.replies = {reply};
-    EXPECT_TRUE(scalar.FWVersion() == version);
-    EXPECT_EQ(scalar.requests, std::vector<Bytes>{DDCFrame::FWVersion().bytes});
-  }
-}
-
 TEST_F(ScalarRequestsTest, ResetAndSaveAcceptOnlyTheKnownAnswers) {
   // reply, reset done, save done
   // clang-format off
