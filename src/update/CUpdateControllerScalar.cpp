@@ -7,12 +7,10 @@
 #include "firmware/CScalarRTDISP.h"
 #include "scalar/CI2CConnectorFTDI.h"
 #include "scalar/RTDISP.h"
+#include "scalar/SensorFamilies.h"
 #include "update/CUpdateController.h"
 
 namespace {
-
-// The scalar answers to the family's vendor half with the pen's product id.
-constexpr SENSOR_ID kScalarVendorHalf = 0x7A5D0000;
 
 // A pattern that is no regular expression matches nothing.
 bool MatchesWhole(const std::string& text_I, const std::string& pattern_I) {
@@ -43,8 +41,7 @@ bool CUpdateController::UpdateScalar(const std::string& serial_I, unsigned char 
     connector = std::make_shared<CI2CConnectorFTDI>();
     if (!connector->Open(static_cast<long>(index_I))) connector.reset();
   } else {
-    const SENSOR_ID sid =
-        static_cast<SENSOR_ID>(kScalarVendorHalf | (device->GetPenProductId() & 0xFFFF));
+    const SENSOR_ID sid = ScalarSensorId(device->GetPenProductId());
     const long count = CI2CConnectorFTDI::NumberOfDevices();
     for (long index = 0; index < count && !connector; ++index) {
       auto candidate = std::make_shared<CI2CConnectorFTDI>();
