@@ -1,11 +1,10 @@
 #include <gtest/gtest.h>
 
-#include "support/LogCapture.h"
-
 #include <stdexcept>
 
 #include "devices/CDeviceList.h"
 #include "devices/CFakeInterface.h"
+#include "support/LogCapture.h"
 
 namespace {
 
@@ -81,8 +80,8 @@ TEST(CDeviceListTest, FindsByTheInterfacePathOfAnyBoard) {
   CDeviceList list;
   list.AddDevice(MakeDevice("no interface", 2));
   list.AddDevice(device);
-  for (const char* path : {"31325:768:19922944:2:13", "31325:769:19922944:1:65280",
-                           "31325:770:19922944:1:65281"}) {
+  for (const char* path :
+       {"31325:768:19922944:2:13", "31325:769:19922944:1:65280", "31325:770:19922944:1:65281"}) {
     EXPECT_EQ(FindQuietly(list, path), device) << path;
   }
   EXPECT_EQ(FindQuietly(list, "31325:768:19922944:2:14"), nullptr);

@@ -266,4 +266,3 @@ TEST(CSupportedDeviceInfoTest, OnlyAnArrayOfProductsParsesAndEachParseStartsFrom
   EXPECT_FALSE(info.ParseConfig());
   EXPECT_FALSE(info.IsValid());
 }
-
