@@ -5,7 +5,6 @@
 
 #include <gtest/gtest.h>
 
-#include <cstdlib>
 #include <filesystem>
 
 #include "firmware/FirmwareFiles.h"
@@ -87,9 +86,7 @@ TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
   ASSERT_EQ(trace.size(), sequence);
   ASSERT_LT(firstCommit, lastCommit);
 
-  uint64_t keptOld = 0;
   uint64_t leftInLoader = 0;
-  uint64_t keptNew = 0;
   for (uint64_t cut = 1; cut <= sequence; ++cut) {
     SCOPED_TRACE("cut after report " + std::to_string(cut));
     std::filesystem::remove_all(mFolder);
@@ -108,7 +105,6 @@ TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
       EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eNormal);
       EXPECT_TRUE(pen->GetLoader().IsImageValid());
       EXPECT_EQ(content, oldImage);
-      ++keptOld;
     } else if (cut < lastCommit) {
       EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eLoader);
       EXPECT_FALSE(pen->GetLoader().IsImageValid());
@@ -119,7 +115,6 @@ TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
       EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eNormal);
       EXPECT_TRUE(pen->GetLoader().IsImageValid());
       EXPECT_EQ(content, newImage);
-      ++keptNew;
     }
 
     // A second full update brings the new image in every case.
@@ -131,12 +126,7 @@ TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
     if (HasFailure()) break;
   }
 
-  // Where each cut left the board, for the test's report.
-  RecordProperty("interruption_points", static_cast<int>(sequence));
-  RecordProperty("kept_old_image", static_cast<int>(keptOld));
-  RecordProperty("left_in_loader", static_cast<int>(leftInLoader));
-  RecordProperty("new_image_committed", static_cast<int>(keptNew));
-  EXPECT_EQ(keptOld + leftInLoader + keptNew, sequence);
+  // The board is invalidated early and made valid only at the very end.
   EXPECT_GT(leftInLoader, sequence / 2);
 }
 
