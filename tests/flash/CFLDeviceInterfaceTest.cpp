@@ -203,6 +203,39 @@ TEST_F(DeviceInterfaceBase, CommandsNeedAnOpenLoaderAndTheirSizes) {
   EXPECT_TRUE(mDevice.reads.empty());
 }
 
+// The commands no programming run sends. The ids and layouts of the others
+// are checked by the lab's loader, which decodes them on its own, in
+// SRecProgrammingTest.
+TEST_F(DeviceInterfaceBase, ReadingFlashAndBothResetsOnTheWire) {
+  BL_HID_REP_GET_BL_PARAMETERS params;
+  params.readSize = 4;
+  mDevice.SetParams(params);
+  uint8_t next = 0;
+  mDevice.onRead = [&](std::vector<uint8_t>& report_IO) {
+    for (size_t i = 5; i < report_IO.size(); ++i) report_IO[i] = next++;
+    return true;
+  };
+  // Set the address once, then each repeat reuses it.
+  ASSERT_TRUE(mDevice.FLProtSetReadAddr(0x08001234));
+  std::vector<uint8_t> data{0xEE};
+  ASSERT_TRUE(mDevice.FLProtReadData(data, 2));
+  EXPECT_EQ(data, (std::vector<uint8_t>{0xEE, 0, 1, 2, 3, 4, 5, 6, 7}));
+  ASSERT_EQ(mDevice.reads.size(), 2u);
+  EXPECT_EQ(mDevice.reads[0], (std::vector<uint8_t>{0x10, 0, 0, 0, 0, 0, 0, 0, 0}));
+
+  ASSERT_TRUE(mDevice.FLProtResetCPU(false));
+  ASSERT_TRUE(mDevice.FLProtResetCPU(true));
+  CFLProtocol::GetInstance()->SetProtocolType(EFL_PROTOCOL_NON_BL);
+  ASSERT_TRUE(mDevice.FLProtResetCPU(false));
+  ASSERT_TRUE(mDevice.FLProtResetCPU(true));
+  CFLProtocol::GetInstance()->SetProtocolType(EFL_PROTOCOL_LOADER);
+  EXPECT_EQ(mDevice.writes, (std::vector<std::vector<uint8_t>>{{0x13, 0x34, 0x12, 0x00, 0x08},
+                                                               {0x15, 0xA6, 0x50},
+                                                               {0x15, 0x01, 0, 0, 0},
+                                                               {0xCD, 0xA6, 0x50},
+                                                               {0xD6, 0x01, 0, 0, 0}}));
+}
+
 SContinuousDataBlock Filled(uint32_t start_I, size_t size_I, uint8_t value_I) {
   return SContinuousDataBlock{start_I, std::vector<uint8_t>(size_I, value_I)};
 }
