@@ -1,6 +1,7 @@
 // The binary readers: what each refuses, and how an image is cut into the
 // scalar's blocks. Their bytes on the wire are checked by the lab's boards
-// in ProgrammingReportTest.
+// in ProgrammingReportTest; what each reader holds, by the images the
+// inspect command writes in FirmwareReportCommandTest.
 
 #include <gtest/gtest.h>
 
@@ -56,14 +57,8 @@ TEST(BinaryAiroFlash, HoldsTheWholeFileAndRefusesAReadThatFailsMidway) {
   EXPECT_FALSE(image.IsLoaded()) << "the size read is larger than the image kept";
 }
 
-TEST(ScalarImages, RTDISPHoldsTheFileAndScalarBinaryCutsItIntoBlocks) {
+TEST(ScalarBinary, CutsTheImageIntoBlocksOf256Bytes) {
   CTempFolder folder;
-  CScalarRTDISP rtdisp;
-  ASSERT_TRUE(rtdisp.Load(folder.Write("s.bin", Bytes(300, 7))));
-  EXPECT_EQ(rtdisp.GetData(), Bytes(300, 7));
-  EXPECT_FALSE(rtdisp.Load(folder.Write("e.bin", "")));
-  EXPECT_FALSE(rtdisp.IsLoaded());
-
   const uint8_t check[] = {'1', '2', '3', '4', '5', '6', '7', '8', '9'};
   EXPECT_EQ(CScalarBinary::CRC8_ATM(check, 9, 0), 0xF4);
   CScalarBinary image;

@@ -4,6 +4,7 @@
 
 #include <gtest/gtest.h>
 
+#include <functional>
 #include <memory>
 
 #include "common/CClock.h"
@@ -71,6 +72,7 @@ TEST_F(DeviceInterfaceBase, ANestedSafeWriteMakesOnePlainAttempt) {
 TEST_F(DeviceInterfaceBase, LocationAndSourceCpuFollowPathAndFormat) {
   mDevice.SetLocation(0x14200000);
   EXPECT_EQ(mDevice.GetPath(), "337641472");
+  EXPECT_EQ(mDevice.GetLocation(), 0x14200000u);
   mDevice.SetPath("not a number");
   EXPECT_EQ(mDevice.GetLocation(), 0u);
 
@@ -133,40 +135,35 @@ TEST_F(DeviceInterfaceBase, CommandRetriesFollowTheirOwnTable) {
   params.blockSize = 16;
   params.numFlashBlocks = 2;
   mDevice.SetParams(params);
-  // Every transfer fails after its SafeRead/SafeWrite retries.
+  // Every transfer fails after its SafeRead/SafeWrite retries, each of
+  // which costs 7.05 s and one reopen.
   mDevice.onWrite = [](std::vector<uint8_t>&) { return false; };
   mDevice.onRead = [](std::vector<uint8_t>&) { return false; };
   const std::vector<uint8_t> data(16, 0xAB);
-
-  // Erase: five tries, no reopen of its own, no wait of its own.
-  EXPECT_FALSE(mDevice.FLProtEraseBlock(1));
-  EXPECT_EQ(mDevice.writes.size(), 5u * 101u);
-  EXPECT_EQ(mDevice.opens, 5);  // only SafeWrite's own reopens
-  EXPECT_EQ(mNotifier.errors, (std::vector<std::string>{"Failed erasing block from device"}));
-  EXPECT_NEAR(mClock->GetTotalSlept(), 5 * 7.05, 1e-6);
-
-  // Write block: five tries, a reopen and half a second after tries 2 to 5.
-  mDevice.writes.clear();
-  mDevice.opens = 0;
-  const double before = mClock->GetTotalSlept();
-  EXPECT_FALSE(mDevice.FLProtWriteBlock(data, 0x1000));
-  EXPECT_EQ(mDevice.writes.size(), 5u * 101u);
-  EXPECT_EQ(mDevice.opens, 5 + 4);
-  EXPECT_NEAR(mClock->GetTotalSlept() - before, 5 * 7.05 + 4 * 0.5, 1e-6);
-
-  // Write word: five tries; everything else: one try.
-  mDevice.writes.clear();
-  EXPECT_FALSE(mDevice.FLProtWriteWord(data, 0x1000));
-  EXPECT_EQ(mDevice.writes.size(), 5u * 101u);
-  mDevice.writes.clear();
-  EXPECT_FALSE(mDevice.FLProtSetReadAddr(0x1000));
-  EXPECT_EQ(mDevice.writes.size(), 101u);
-
-  // Read data: five tries per repeat, then the error.
   std::vector<uint8_t> out;
-  mDevice.reads.clear();
-  EXPECT_FALSE(mDevice.FLProtReadData(out, 3));
-  EXPECT_EQ(mDevice.reads.size(), 5u * 101u);
+  const struct {
+    const char* command;
+    std::function<bool()> run;
+    int tries;
+    int ownReopens;  // with a wait of their own
+    double ownWait;
+  } cases[] = {{"erase", [&] { return mDevice.FLProtEraseBlock(1); }, 5, 0, 0.0},
+               {"write block", [&] { return mDevice.FLProtWriteBlock(data, 0x1000); }, 5, 4, 0.5},
+               {"write word", [&] { return mDevice.FLProtWriteWord(data, 0x1000); }, 5, 0, 0.0},
+               {"set read address", [&] { return mDevice.FLProtSetReadAddr(0x1000); }, 1, 0, 0.0},
+               {"read data", [&] { return mDevice.FLProtReadData(out, 3); }, 5, 4, 0.5}};
+  for (const auto& c : cases) {
+    mDevice.writes.clear();
+    mDevice.reads.clear();
+    mDevice.opens = 0;
+    const double before = mClock->GetTotalSlept();
+    EXPECT_FALSE(c.run()) << c.command;
+    EXPECT_EQ(mDevice.writes.size() + mDevice.reads.size(), c.tries * 101u) << c.command;
+    EXPECT_EQ(mDevice.opens, c.tries + c.ownReopens) << c.command;
+    EXPECT_NEAR(mClock->GetTotalSlept() - before, c.tries * 7.05 + c.ownReopens * c.ownWait, 1e-6)
+        << c.command;
+  }
+  EXPECT_EQ(mNotifier.errors.front(), "Failed erasing block from device");
   EXPECT_EQ(mNotifier.errors.back(), "Failed reading from device");
 }
 
