@@ -21,10 +21,6 @@ TEST(SRecFrontEnd, ChoosesTheReaderFromExtensionAndInterface) {
       {"s.bin", EBULK_INTERFACE, EDS_UNKNOWN}, {"a.srec", EHID_INTERFACE, EDS_UNKNOWN}};
   // clang-format on
   for (const auto& c : cases) EXPECT_EQ(CSRec::FormatFor(c.path, c.interface), c.format) << c.path;
-  // The last dot of the whole path counts, also in a folder name.
-  EXPECT_EQ(CSRec::ExtensionOf("v1.pen/firmware"), "pen/firmware");
-  EXPECT_EQ(CSRec::ExtensionOf("noext"), "");
-
   CTempFolder folder;
   const std::string bin = folder.Write("scalar.bin", Bytes(4));
   LogCapture capture;
