@@ -145,11 +145,9 @@ TEST_F(SRecProgramming, AnImageOutsideTheFlashIsRefusedBeforeAnythingIsErased) {
 
 TEST_F(SRecProgramming, TransientFaultsAreRetriedAway) {
   Plug(SLabPenDescription());
-  for (const char* text : {"fail-write@3", "fail-read@2", "busy@4", "stall@2"}) {
-    SLabFault fault;
-    std::string error;
-    ASSERT_TRUE(ParseLabFault(text, fault, error)) << error;
-    mPen->Faults().Add(fault);
+  for (ELabFaultKind kind : {ELabFaultKind::eFailWrite, ELabFaultKind::eFailRead,
+                             ELabFaultKind::eBusy, ELabFaultKind::eStall}) {
+    mPen->Faults().Add({kind, 3, ""});
   }
   Update({Record(0x08002000, 5000, 8)}, EFL_PROTOCOL_LOADER, EDS_SREC_PEN);
   EXPECT_TRUE(mPen->Faults().Empty());
