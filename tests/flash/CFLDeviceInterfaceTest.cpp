@@ -203,7 +203,7 @@ TEST_F(DeviceInterfaceBase, CommandsNeedAnOpenLoaderAndTheirSizes) {
 // The commands no programming run sends. The ids and layouts of the others
 // are checked by the lab's loader, which decodes them on its own, in
 // SRecProgrammingTest.
-TEST_F(DeviceInterfaceBase, ReadingFlashAndBothResetsOnTheWire) {
+TEST_F(DeviceInterfaceBase, ReadingFlashResetsAndTheCpuSetOnTheWire) {
   BL_HID_REP_GET_BL_PARAMETERS params;
   params.readSize = 4;
   mDevice.SetParams(params);
@@ -220,17 +220,21 @@ TEST_F(DeviceInterfaceBase, ReadingFlashAndBothResetsOnTheWire) {
   ASSERT_EQ(mDevice.reads.size(), 2u);
   EXPECT_EQ(mDevice.reads[0], (std::vector<uint8_t>{0x10, 0, 0, 0, 0, 0, 0, 0, 0}));
 
-  ASSERT_TRUE(mDevice.FLProtResetCPU(false));
-  ASSERT_TRUE(mDevice.FLProtResetCPU(true));
-  CFLProtocol::GetInstance()->SetProtocolType(EFL_PROTOCOL_NON_BL);
-  ASSERT_TRUE(mDevice.FLProtResetCPU(false));
-  ASSERT_TRUE(mDevice.FLProtResetCPU(true));
+  // Only multi-CPU loaders, which the lab runs do not use, get a CPU set.
+  for (EFLProtocolType protocol : {EFL_PROTOCOL_LOADER, EFL_PROTOCOL_NON_BL}) {
+    CFLProtocol::GetInstance()->SetProtocolType(protocol);
+    ASSERT_TRUE(mDevice.FLProtResetCPU(false));
+    ASSERT_TRUE(mDevice.FLProtResetCPU(true));
+    ASSERT_TRUE(mDevice.FLProtSetCurrentCPU(1));
+  }
   CFLProtocol::GetInstance()->SetProtocolType(EFL_PROTOCOL_LOADER);
   EXPECT_EQ(mDevice.writes, (std::vector<std::vector<uint8_t>>{{0x13, 0x34, 0x12, 0x00, 0x08},
                                                                {0x15, 0xA6, 0x50},
                                                                {0x15, 0x01, 0, 0, 0},
+                                                               {0x20, 0x01, 0x00},
                                                                {0xCD, 0xA6, 0x50},
-                                                               {0xD6, 0x01, 0, 0, 0}}));
+                                                               {0xD6, 0x01, 0, 0, 0},
+                                                               {0xE1, 0x01, 0x00}}));
 }
 
 SContinuousDataBlock Filled(uint32_t start_I, size_t size_I, uint8_t value_I) {
