@@ -145,13 +145,12 @@ TEST_F(DeviceInterfaceBase, CommandRetriesFollowTheirOwnTable) {
     const char* command;
     std::function<bool()> run;
     int tries;
-    int ownReopens;  // with a wait of their own
-    double ownWait;
-  } cases[] = {{"erase", [&] { return mDevice.FLProtEraseBlock(1); }, 5, 0, 0.0},
-               {"write block", [&] { return mDevice.FLProtWriteBlock(data, 0x1000); }, 5, 4, 0.5},
-               {"write word", [&] { return mDevice.FLProtWriteWord(data, 0x1000); }, 5, 0, 0.0},
-               {"set read address", [&] { return mDevice.FLProtSetReadAddr(0x1000); }, 1, 0, 0.0},
-               {"read data", [&] { return mDevice.FLProtReadData(out, 3); }, 5, 4, 0.5}};
+    int ownReopens;  // each with half a second of its own
+  } cases[] = {{"erase", [&] { return mDevice.FLProtEraseBlock(1); }, 5, 0},
+               {"write block", [&] { return mDevice.FLProtWriteBlock(data, 0x1000); }, 5, 4},
+               {"write word", [&] { return mDevice.FLProtWriteWord(data, 0x1000); }, 5, 0},
+               {"set read address", [&] { return mDevice.FLProtSetReadAddr(0x1000); }, 1, 0},
+               {"read data", [&] { return mDevice.FLProtReadData(out, 3); }, 5, 4}};
   for (const auto& c : cases) {
     mDevice.writes.clear();
     mDevice.reads.clear();
@@ -160,7 +159,7 @@ TEST_F(DeviceInterfaceBase, CommandRetriesFollowTheirOwnTable) {
     EXPECT_FALSE(c.run()) << c.command;
     EXPECT_EQ(mDevice.writes.size() + mDevice.reads.size(), c.tries * 101u) << c.command;
     EXPECT_EQ(mDevice.opens, c.tries + c.ownReopens) << c.command;
-    EXPECT_NEAR(mClock->GetTotalSlept() - before, c.tries * 7.05 + c.ownReopens * c.ownWait, 1e-6)
+    EXPECT_NEAR(mClock->GetTotalSlept() - before, c.tries * 7.05 + c.ownReopens * 0.5, 1e-6)
         << c.command;
   }
   EXPECT_EQ(mNotifier.errors.front(), "Failed erasing block from device");

@@ -189,8 +189,10 @@ TEST_F(ProgrammingReports, EachProcedureRefusesMissingData) {
     EXPECT_NE(mNotifier.errors.back().find(": No "), std::string::npos) << format;
   }
   interface->SetBinaryAiroFlashData(std::make_shared<CBinaryAiroFlash>());
-  interface->SetDataSourceFormat(EDS_AIROFLASH);
-  EXPECT_FALSE(interface->ProgramBoard()) << "data that is not loaded";
+  for (EDataSourceFormat format : {EDS_AIROFLASH, EDS_SCALAR_RTDISP, EDS_UNKNOWN}) {
+    interface->SetDataSourceFormat(format);
+    EXPECT_FALSE(interface->ProgramBoard()) << "data not loaded, or no procedure: " << format;
+  }
   EXPECT_TRUE(touch->GetTrace().empty()) << "nothing reached the device";
 }
 
