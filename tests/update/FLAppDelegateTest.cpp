@@ -9,35 +9,24 @@
 #include "common/CMainThreadLoop.h"
 #include "host/CLanguageManager.h"
 #include "host/CLinuxLanguageManager.h"
+#include "ui/terminal/CTerminalWindowController.h"
 #include "update/UpdateDoubles.h"
 
 namespace update_test {
 namespace {
 
-// Journals what a user can see of the window, on the thread that asks; a
-// terminal shows no colours, header, board panel or buttons. Tasks for later
-// wait for RunDelayed.
-class CFakeWindow : public CWindowController {
+// The terminal window, the program's own, with what a user can see of it
+// journaled instead of drawn, on the thread that asks; the rest (colours,
+// header, board panel, buttons) it shows nothing of. Tasks for later wait
+// for RunDelayed.
+class CFakeWindow : public CTerminalWindowController {
  public:
-  void initForDialog(bool) override {}
-  void showWindow() override {}
+  CFakeWindow() : CTerminalWindowController(stdout, stdin) {}
   void enableClose(bool enable_I) override { mCalls.Add("close:", enable_I); }
-  void SetCloseHandler(std::function<void()>) override {}
   void setStatusText(const std::string& text_I) override { mCalls.Add("text:" + text_I); }
   void setStatusProgress(double percent_I) override {
     mCalls.Add("progress:", static_cast<int>(percent_I));
   }
-  void setStatusColor(ESTATUS_COLOR) override {}
-  void setTabletName(const std::string&) override {}
-  void setBoardArray(const std::vector<std::string>&) override {}
-  void setPenFirmwareVersion(uint32_t) override {}
-  void setPenOldChecksum(uint32_t) override {}
-  void setPenNewChecksum(uint32_t) override {}
-  void setTouchFirmwareVersion(uint32_t) override {}
-  void setTouchOldChecksum(uint32_t) override {}
-  void setTouchNewChecksum(uint32_t) override {}
-  void enableUIElements(bool) override {}
-  void enableProgramButton(bool) override {}
   int ShowAlert(const SAlert& alert_I) override {
     mCalls.Add("alert:" + alert_I.message + "|" + alert_I.informativeText);
     mLastAlert = alert_I;
@@ -47,8 +36,6 @@ class CFakeWindow : public CWindowController {
     mCalls.Add("ask");
     return mAnswerYes;
   }
-  void RunMainLoop() override {}
-  void QuitMainLoop() override {}
   void PostToMainLoop(std::function<void()> task_I) override { task_I(); }
   void PostToMainLoopAfter(double delay_I, std::function<void()> task_I) override {
     mDelayed.emplace_back(delay_I, std::move(task_I));
