@@ -53,7 +53,6 @@ class CLog {
     return found == mItems.end() ? -1 : static_cast<int>(found - mItems.begin());
   }
   bool Has(const T& item_I) const { return At(item_I) >= 0; }
-  long Count(const T& item_I) const { return std::count(mItems.begin(), mItems.end(), item_I); }
   void Clear() { mItems.clear(); }
 
  private:
@@ -100,11 +99,8 @@ class CFakeInterface : public CFLDeviceInterface {
     mBLParams.numFlashBlocks = mBlocks;
     return Call("Init", "(" + std::to_string(bytes) + " bytes)");
   }
-  // Says which binary image, if any, was handed over before it.
   bool ProgramBoard() override {
-    const bool ok = Call("ProgramBoard", GetAiroFlashData()      ? "(airoflash)"
-                                         : GetScalarBinaryData() ? "(scalar binary)"
-                                                                 : "");
+    const bool ok = Call("ProgramBoard");
     if (mNotifier != nullptr) mNotifier->InterfaceProgress(50);
     if (!ok && mNotifier != nullptr) mNotifier->InterfaceError("lab: write failed");
     if (ok) CFLDeviceInterface::UpdateChecksums(0x1111, 0x2222, 0x3333);
