@@ -134,6 +134,9 @@ TEST(TerminalWindow, InterruptIsRefusedWhileClosingIsDisabledAndClosesOtherwise)
   InputText in("");
   CTerminalWindowController window(out.Stream(), in.Stream());
   window.SetOutputIsTerminal(false);
+  // What was there before (ignored under nohup) comes back afterwards.
+  const auto interrupt = CurrentAction(SIGINT).sa_handler,
+             hangUp = CurrentAction(SIGHUP).sa_handler;
   ASSERT_TRUE(window.SetCatchSignals(true));
   CTerminalWindowController other(out.Stream(), in.Stream());
   EXPECT_FALSE(other.SetCatchSignals(true));
@@ -158,8 +161,8 @@ TEST(TerminalWindow, InterruptIsRefusedWhileClosingIsDisabledAndClosesOtherwise)
   EXPECT_EQ(closes, 1);
 
   EXPECT_TRUE(window.SetCatchSignals(false));
-  EXPECT_EQ(CurrentAction(SIGINT).sa_handler, SIG_DFL);
-  EXPECT_EQ(CurrentAction(SIGHUP).sa_handler, SIG_DFL);
+  EXPECT_EQ(CurrentAction(SIGINT).sa_handler, interrupt);
+  EXPECT_EQ(CurrentAction(SIGHUP).sa_handler, hangUp);
 }
 
 TEST(TerminalWindow, InterruptDuringAQuestionAnswersNo) {
