@@ -112,15 +112,6 @@ TEST(TerminalWindow, YesNoQuestionsReadAnswersAndDefaultToNo) {
     window.SetInputIsTerminal(true);
     EXPECT_EQ(window.AskYesNo(kQuestion), entry.answer) << entry.input;
   }
-
-  OutputCapture out;
-  InputText in("maybe\nyes\n");
-  CTerminalWindowController window(out.Stream(), in.Stream());
-  window.SetInputIsTerminal(true);
-  EXPECT_TRUE(window.AskYesNo(kQuestion));
-  EXPECT_EQ(out.Take(),
-            "Tavik Firmware Update Utility\nDo you want to continue?\n"
-            "[y/N] Please answer y or n.\n[y/N] ");
 }
 
 struct sigaction CurrentAction(int signal_I) {
