@@ -2,6 +2,8 @@
 // how status and progress reach the application.
 #include "update/UpdateDoubles.h"
 
+#include "scalar/DisplayUtils.h"
+
 namespace update_test {
 namespace {
 
@@ -187,6 +189,32 @@ TEST_F(Updater, ProgressIsOneBarAndOnlyTheLastSuccessIsShown) {
   updater->callBackProgress(50);
   updater->callBackStatus(ESTATE_SUCCESS);
   EXPECT_EQ(mDelegate.mJournal.Get(), (Words{"bar:25.000000", "bar:75.000000", "state:5"}));
+}
+
+TEST_F(Updater, AutoConfigBuildsArgumentsForTheNamedBoardsOfTheNamedProducts) {
+  AttachPen();
+  mBus->devices[0]->SetScalarProductId(0x1060);
+  // Two of the family's displays; only the first is this product's.
+  struct : CDisplays {
+    std::vector<SDisplay> List() const override {
+      return {{"a", {}, 0x5B27, 0x1060, "SER1", "Lab"}, {"b", {}, 0x5B27, 0x1061, "SER2", "Lab"}};
+    }
+  } displays;
+  DisplayUtils::SetDisplays(&displays);
+  OFLUpdater* updater = Make({"prog", "-p", ""});
+  EXPECT_EQ(updater->createArgumentsFromAutoConfig(), Words{});  // no watch yet
+  ASSERT_TRUE(updater->setupUpdate());
+  EXPECT_EQ(updater->createArgumentsFromAutoConfig(), Words{});  // no rule file
+
+  std::ofstream(mFolder / "bin" / "autoconfig.ini")
+      << R"({"auto": ["touch", "pen", 7, "scalar"], "product": ["0x100", "FFFF", 3]})";
+  // The touch board is absent; the pen and the display match product 0x100.
+  EXPECT_EQ(updater->createArgumentsFromAutoConfig(),
+            (Words{(mFolder / "bin" / "tavik-fwupdater").string(), "-p", kNormalPath, "-s",
+                   "23335:4192:SER1:255"}));
+  std::ofstream(mFolder / "bin" / "autoconfig.ini") << R"({"auto": ["pen"]})";
+  EXPECT_EQ(updater->createArgumentsFromAutoConfig(), Words{});
+  DisplayUtils::SetDisplays(nullptr);
 }
 
 TEST_F(Updater, UpdateDeviceListMakesUpForAMissedReEnumeration) {
