@@ -183,8 +183,14 @@ TEST_F(LinuxFTDI, ReadsTimeOutShortAndTheBridgeServesOneHandle) {
   EXPECT_EQ(mApi->FT_SetUSBParameters(mHandle, 65536, 100), FT_INVALID_PARAMETER);
 }
 
-TEST_F(LinuxFTDI, AnUnpluggedBridgeFailsItsHandleAndIsNoLongerFound) {
+TEST_F(LinuxFTDI, FailedTransfersGiveIOErrorsAndAnUnpluggedBridgeIsNoLongerFound) {
   Open();
+  // A transfer the bridge fails is an I/O error; the handle goes on.
+  mBus->AddFaults({SLabFault{ELabFaultKind::eFailWrite, 1, ""}}, 1);
+  Send({0xAA}, FT_IO_ERROR);
+  Send({0xAA});
+  EXPECT_EQ(Take(2), (Bytes{0xFA, 0xAA}));
+
   mBus->AddFaults({SLabFault{ELabFaultKind::eVanish, 1, ""}}, 1);
   Send({0x87});  // the last transfer before it drops off
   Send({0x87}, FT_IO_ERROR);

@@ -41,12 +41,12 @@ class UmockdevFTDI : public CEmulatedUsbBus {
     const std::string hubPort = std::to_string((location >> 20) & 0xF);
     const std::string port = hubPort + "." + std::to_string((location >> 16) & 0xF);
     const std::string root = AddRootHub(1);
-    mHubPath = root + "/1-" + hubPort;
-    AddUsbNode(mHubPath, hubPort, 2, 0x7A5D, 0x00F0, 0x0100, Descriptors(0x09, {}));
+    const std::string hubPath = root + "/1-" + hubPort;
+    AddUsbNode(hubPath, hubPort, 2, 0x7A5D, 0x00F0, 0x0100, Descriptors(0x09, {}));
     mHandler = umockdev_ioctl_base_new();
     g_signal_connect(mHandler, "handle-ioctl", G_CALLBACK(&UmockdevFTDI::HandleIoctl), this);
     umockdev_testbed_attach_ioctl(GetTestbed(), "/dev/bus/usb/001/003", mHandler, nullptr);
-    mPath = mHubPath + "/1-" + port;
+    mPath = hubPath + "/1-" + port;
     AddUsbNode(mPath, port, 3, CLabFTDIBridge::kVendorId, CLabFTDIBridge::kProductId,
                CLabFTDIBridge::kBridgeRelease, Descriptors(0xFF, {0x81, 0x02}));
   }
@@ -189,7 +189,8 @@ class UmockdevFTDI : public CEmulatedUsbBus {
     return TRUE;
   }
 
-  // FTDI's vendor requests; the rest of the serial settings are taken.
+  // FTDI's vendor requests that reach the engine; the serial port's
+  // settings (baud rate, latency, characters) are taken and change nothing.
   bool Control(usbdevfs_urb& urb_IO, uint8_t* buffer_IO) {
     const uint8_t request = buffer_IO[1];
     const uint16_t value = static_cast<uint16_t>(buffer_IO[2] | (buffer_IO[3] << 8));
@@ -201,21 +202,21 @@ class UmockdevFTDI : public CEmulatedUsbBus {
       if (request == 0x00 && value == 1) bridge_I.Purge(FT_PURGE_TX);
       if (request == 0x00 && value == 2) bridge_I.Purge(FT_PURGE_RX);
       if (request == 0x0B) bridge_I.SetBitMode(value & 0xFF, value >> 8);
-      if (request == 0x09) mLatency = static_cast<uint8_t>(value);
-      if (request == 0x0A && length >= 1) buffer_IO[8] = mLatency;
-      if (request == 0x05) std::copy_n(kModemStatus, std::min<size_t>(length, 2), buffer_IO + 8);
     });
   }
 
   bool Bulk(usbdevfs_urb& urb_IO, uint8_t* buffer_IO) {
     const size_t length = static_cast<size_t>(urb_IO.buffer_length);
-    urb_IO.status = 0;
+    // A transfer the bridge fails ends as one that lost its handshake.
+    FT_STATUS status = FT_OK;
     if ((urb_IO.endpoint & 0x80) == 0) {
       uint32_t written = 0;
-      urb_IO.actual_length = static_cast<int>(length);
-      return OnBridge([&](CLabFTDIBridge& bridge_I) {
-        bridge_I.Write(buffer_IO, static_cast<uint32_t>(length), written);
+      const bool answered = OnBridge([&](CLabFTDIBridge& bridge_I) {
+        status = bridge_I.Write(buffer_IO, static_cast<uint32_t>(length), written);
       });
+      urb_IO.status = status == FT_OK ? 0 : -EPROTO;
+      urb_IO.actual_length = static_cast<int>(written);
+      return answered;
     }
     // As much as fits behind the status bytes of the packets the buffer holds.
     const size_t room = length / kPacketSize * (kPacketSize - 2) +
@@ -223,8 +224,9 @@ class UmockdevFTDI : public CEmulatedUsbBus {
     std::vector<uint8_t> data(room);
     uint32_t read = 0;
     const bool answered = OnBridge([&](CLabFTDIBridge& bridge_I) {
-      bridge_I.Read(data.data(), static_cast<uint32_t>(room), read);
+      status = bridge_I.Read(data.data(), static_cast<uint32_t>(room), read);
     });
+    urb_IO.status = status == FT_OK ? 0 : -EPROTO;
     size_t at = 0;
     size_t taken = 0;
     do {
@@ -262,12 +264,10 @@ class UmockdevFTDI : public CEmulatedUsbBus {
 
   std::shared_ptr<CLabBus> mBus;
   std::shared_ptr<CLabFTDIBridge> mBridge;
-  std::string mHubPath;
   std::string mPath;
   UMockdevIoctlBase* mHandler = nullptr;
   std::mutex mLock;
   bool mClaimed = false;
   CLabBus::SBinding mBinding;
   std::deque<UMockdevIoctlData*> mReapable;
-  uint8_t mLatency = 16;
 };
