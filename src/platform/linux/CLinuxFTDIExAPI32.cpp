@@ -19,7 +19,7 @@ constexpr uint32_t kDefaultTimeoutMs = 300;
 // ask already takes up to its latency timer.
 constexpr double kReadPollInterval = 0.001;
 constexpr int kReadAheadChunk = 4096;
-// Deepest USB port path: seven tiers below the root hub.
+// libusb gives at most seven port numbers, the deepest USB path.
 constexpr int kMaxPorts = 7;
 
 uint32_t FromPointer(void* value_I) {
