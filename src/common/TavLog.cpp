@@ -5,6 +5,8 @@
 #include <mutex>
 #include <vector>
 
+int g_DebugTrace = 0;
+
 namespace {
 
 bool gLogNewLine = true;

@@ -41,6 +41,11 @@ void ResetLineState();
 
 }  // namespace TavLog
 
+// Non-zero turns on the trace lines of the bridge link and the scalar
+// layer. Those lines are wrapped in a ConditionalFunction, so a normal run
+// does not even format them. Set once before threads start.
+extern int g_DebugTrace;
+
 // The single point where log lines leave the program. Returns the number
 // of characters handed to the outputs, or -1 when none is attached.
 int TavTraceD(int level_I, const char* format_I, va_list args_I);

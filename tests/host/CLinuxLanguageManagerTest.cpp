@@ -33,100 +33,48 @@ TEST(LinuxLanguageManager, LooksInTheApplicationDomainThenDevicesThenGivesTheKey
   EXPECT_FALSE(manager.FindLocalizedString("in neither domain", text));
 }
 
-TEST(LinuxLanguageManager, ALanguageWithoutCatalogsShowsKeysAndCountsAsLanguageZero) {
-  LogCapture capture;
-  LocaleEnvironment environment("fr");
-  CLinuxLanguageManager manager(kTestCatalogs);
-  EXPECT_EQ(manager.GetLocalizedString("in-both"), "in-both");
-  EXPECT_EQ(manager.GetCurrentLanguage(), 0u);
-  EXPECT_EQ(manager.GetISOLanguageCode(), "en");
-  EXPECT_TRUE(capture.Assertions().empty());
-}
-
+// The number comes from the "Language" key, the application domain's first;
+// a language without catalogs shows keys and counts as language zero.
 TEST(LinuxLanguageManager, CurrentLanguageComesFromTheLanguageKeyWithinTheTable) {
+  const struct {
+    const char* language;
+    uint32_t number;
+    bool refused;
+  } cases[] = {{"en", 12, false},  // "12" in the application domain, "3" in Devices
+               {"xc", 23, false},  // leading blanks and trailing words read past
+               {"fr", 0, false},   // no catalogs
+               {"xa", 0, true},    // beyond the table
+               {"xb", 0, true}};   // negative
   LocaleEnvironment environment("en");
-  {
-    // The application domain's "Language" wins over the one in Devices.
-    CLinuxLanguageManager manager(kTestCatalogs);
-    EXPECT_EQ(manager.GetCurrentLanguage(), 12u);
-    EXPECT_EQ(manager.GetISOLanguageCode(), "nl");
-  }
-  {
-    // Leading blanks and trailing words are read past, as an integer value.
-    environment.SetLanguage("xc");
+  for (const auto& entry : cases) {
+    environment.SetLanguage(entry.language);
     LogCapture capture;
     CLinuxLanguageManager manager(kTestCatalogs);
-    EXPECT_EQ(manager.GetCurrentLanguage(), 23u);
-    EXPECT_TRUE(capture.Assertions().empty());
+    EXPECT_EQ(manager.GetCurrentLanguage(), entry.number) << entry.language;
+    EXPECT_EQ(capture.Assertions().empty(), !entry.refused) << entry.language;
   }
-  for (const char* language : {"xa", "xb"}) {
-    environment.SetLanguage(language);
-    LogCapture capture;
-    CLinuxLanguageManager manager(kTestCatalogs);
-    EXPECT_EQ(manager.GetCurrentLanguage(), 0u) << language;
-    ASSERT_EQ(capture.Assertions().size(), 2u) << language;
-    EXPECT_TRUE(capture.AssertionContains("failed assertion: languageCode < LAST_ELANGUAGE"));
-    EXPECT_TRUE(capture.AssertionContains("failed assertion: \"BAD LANGUAGE CODE\""));
-  }
+  environment.SetLanguage("fr");
+  EXPECT_EQ(CLinuxLanguageManager(kTestCatalogs).GetLocalizedString("in-both"), "in-both");
 }
 
-TEST(LinuxLanguageManager, SharedInstanceFollowsLANGUAGEWithTheShippedCatalogs) {
-  LocaleEnvironment environment("de");
-  CLinuxLanguageManager::SetLocaleDirectory(kShippedCatalogs);
-  CLanguageManager::DisposeInstance();
-
-  EXPECT_EQ(TTCLocalizedNSString("Yes"), "Ja");
-  EXPECT_EQ(TTCLocalizedString("Do you want to continue?"), "Möchten Sie fortfahren?");
-  EXPECT_EQ(TTCLocalizedNSString("Pen"), "Stift");  // only in Devices
-  EXPECT_EQ(CLanguageManager::SharedInstance()->GetCurrentLanguage(), 5u);
-  EXPECT_EQ(CLanguageManager::SharedInstance()->GetISOLanguageCode(), "de");
-
-  // A preference list falls through to the first language that has catalogs.
-  environment.SetLanguage("fr:de");
-  CLanguageManager::DisposeInstance();
-  EXPECT_EQ(TTCLocalizedNSString("No"), "Nein");
-
-  environment.SetLanguage("en");
-  CLanguageManager::DisposeInstance();
-  EXPECT_EQ(TTCLocalizedNSString("Yes"), "Yes");
-  EXPECT_NE(TTCLocalizedNSString("200:250"), "200:250");
-  EXPECT_EQ(CLanguageManager::SharedInstance()->GetCurrentLanguage(), 0u);
-}
-
-// Every text the application shows, as it passes them to the catalogs.
-// clang-format off
-const char* const kShownKeys[] = {
-    "Tavik Firmware Update Utility", "You are about to update the firmware.",
-    "While programming do not disconnect or power down your device.", "Do you want to continue?",
-    "No", "Yes", "OK", "Try Again", "Waiting for Loader Mode", "Waiting for Device Mode",
-    "Updating, this may take several minutes", "Programming Successful", "Programming Failed",
-    "Firmware was successfully updated.",
-    "Error: No supported tablet is connected. Please connect a tablet.",
-    "Error: Invalid state resulted in updater termination.",
-    "Error: The specified file does not appear to be a valid firmware file.",
-    "200:250", "200:255", "200:257", "Pen", "Touch", "Bluetooth", "Scalar"};
-// clang-format on
-
-TEST(LinuxLanguageManager, EveryShippedLanguageHasEveryShownTextAndItsOwnNumber) {
+// The catalogs say their own language's number, and each has the texts of
+// both domains.
+TEST(LinuxLanguageManager, EveryShippedLanguageHasItsOwnNumber) {
   LocaleEnvironment environment("en");
-  std::vector<std::string> languages;
+  size_t languages = 0;
   for (const auto& entry : std::filesystem::directory_iterator(kShippedCatalogs)) {
     // The English catalogs filed again for the C locale are no language.
-    if (entry.path().filename() == "C.UTF-8") continue;
-    languages.push_back(entry.path().filename().string());
-  }
-  ASSERT_GE(languages.size(), 2u);
-
-  for (const std::string& language : languages) {
+    const std::string language = entry.path().filename().string();
+    if (language == "C.UTF-8") continue;
+    ++languages;
     environment.SetLanguage(language);
     CLinuxLanguageManager manager(kShippedCatalogs);
     EXPECT_EQ(manager.GetISOLanguageCode(), language);
-    for (const char* key : kShownKeys) {
-      std::string text;
-      EXPECT_TRUE(manager.FindLocalizedString(key, text)) << language << ": " << key;
-      EXPECT_FALSE(text.empty()) << language << ": " << key;
-    }
+    std::string text;
+    EXPECT_TRUE(manager.FindLocalizedString("Yes", text)) << language;
+    EXPECT_TRUE(manager.FindLocalizedString("Pen", text)) << language;
   }
+  EXPECT_GE(languages, 2u);
 }
 
 TEST(LinuxLanguageManager, LocaleFolderSearchPrefersTheProgramsSurroundings) {
@@ -156,19 +104,6 @@ TEST(LinuxLanguageManager, LocaleFolderSearchPrefersTheProgramsSurroundings) {
               locale.string());
   }
   fs::remove_all(root);
-}
-
-TEST(LinuxLanguageManager, AnExplicitLocaleFolderOverridesTheSearch) {
-  LocaleEnvironment environment("en");
-  CLinuxLanguageManager::SetLocaleDirectory(kTestCatalogs);
-  CLanguageManager::DisposeInstance();
-  EXPECT_EQ(TTCLocalizedNSString("in-both"), "from the application domain");
-
-  // Without it the search starts beside the running program, where this
-  // test program keeps its own catalogs.
-  CLinuxLanguageManager::SetLocaleDirectory("");
-  EXPECT_EQ(std::filesystem::path(CLinuxLanguageManager::GetLocaleDirectory()),
-            std::filesystem::path(kTestCatalogs).lexically_normal());
 }
 
 TEST(LinuxLanguageManager, NoLocaleOrAnUninstalledOneStillShowsTheEnglishTexts) {

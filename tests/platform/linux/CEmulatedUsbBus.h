@@ -53,6 +53,28 @@ class CEmulatedUsbBus {
     return path;
   }
 
+  // A device libusb can open, with its node, device number and one
+  // interface of `interfaceClass_I`. Returns the node.
+  std::string AddUsbfsDevice(const std::string& parentPath_I, const std::string& devpath_I,
+                             uint32_t productId_I, unsigned devnum_I, uint8_t interfaceClass_I) {
+    char node[32];
+    std::snprintf(node, sizeof(node), "/dev/bus/usb/001/%03u", devnum_I);
+    // Device descriptor, then one configuration with one interface.
+    std::vector<uint8_t> descriptors{0x12, 0x01, 0x00, 0x02, 0x00, 0x00, 0x00, 0x40, 0x71,
+                                     0x7A, 0x00, 0x00, 0x10, 0x02, 0x01, 0x02, 0x00, 0x01,
+                                     0x09, 0x02, 0x12, 0x00, 0x01, 0x01, 0x00, 0x80, 0x32,
+                                     0x09, 0x04, 0x00, 0x00, 0x00, 0x00, 0x00, 0x00, 0x00};
+    descriptors[10] = static_cast<uint8_t>(productId_I);
+    descriptors[11] = static_cast<uint8_t>(productId_I >> 8);
+    descriptors[32] = interfaceClass_I;
+    Add("P: " + parentPath_I + "/1-" + devpath_I + "\nN: " + std::string(node + 5) +
+        "=00\nE: SUBSYSTEM=usb\nE: DEVTYPE=usb_device\nE: DRIVER=usb\nE: BUSNUM=001\nE: DEVNAME=" +
+        node + "\n" + UsbAttributes(0x7A71, productId_I, 0x0210, 1, devpath_I) +
+        "A: devnum=" + std::to_string(devnum_I) + "\nA: speed=480\nA: bConfigurationValue=1\n" +
+        "A: dev=189:" + std::to_string(devnum_I) + "\nH: descriptors=" + Hex(descriptors) + "\n");
+    return node;
+  }
+
   SHidNode AddHidInterface(const std::string& usbPath_I, unsigned interface_I,
                            unsigned hidrawIndex_I, const std::vector<uint8_t>& descriptor_I) {
     SHidNode node;
