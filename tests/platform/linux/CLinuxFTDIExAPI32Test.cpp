@@ -9,6 +9,7 @@
 #include "lab/CLabProducts.h"
 #include "platform/linux/CLinuxFTDIExAPI32.h"
 #include "platform/linux/UmockdevFTDI.h"
+#include "scalar/CI2CConnectorFTDI.h"
 #include "support/LabFixture.h"
 
 namespace {
@@ -60,6 +61,7 @@ class LinuxFTDI : public LabFixture {
     mUsb = std::make_unique<UmockdevFTDI>(mBus, mBridge);
   }
   void TearDown() override {
+    CI2CConnectorFTDI::SetApi(nullptr);
     mApi.reset();
     mUsb.reset();
     LabFixture::TearDown();
@@ -154,6 +156,18 @@ TEST_F(LinuxFTDI, TheBridgeIsListedByLocationAndCarriesADisplayInformationReques
   EXPECT_STREQ(reinterpret_cast<const char*>(&reply[3 + 27]), "LABFT0701");
   EXPECT_EQ(mBridge->GetViolations(), std::vector<std::string>{});
   EXPECT_EQ(mApi->FT_Close(mHandle), FT_OK);
+}
+
+TEST_F(LinuxFTDI, TheScalarLinkOpensTheBridgeAndIdentifiesTheDisplay) {
+  CI2CConnectorFTDI::SetApi(mApi.get());
+  ASSERT_EQ(CI2CConnectorFTDI::NumberOfDevices(), 1);
+  CI2CConnectorFTDI link;
+  ASSERT_TRUE(link.Open(0));
+  EXPECT_EQ(link.SerialNumber(0x7A5D0701), "LABFT0701");
+  EXPECT_EQ(link.MonitorName(), "Lab Display");
+  EXPECT_TRUE(link.FWVersion() == FileVersion(1, 0, 0, FileVersion::EFinalVersion, 0));
+  EXPECT_EQ(mBridge->GetViolations(), std::vector<std::string>{});
+  EXPECT_TRUE(link.Close());
 }
 
 TEST_F(LinuxFTDI, ReadsTimeOutShortAndTheBridgeServesOneHandle) {
