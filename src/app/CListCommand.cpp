@@ -11,6 +11,9 @@
 #include "devices/IOUtils.h"
 #include "flash/CFLDeviceInterface.h"
 #include "lab/CLabProducts.h"
+#include "scalar/DisplayUtils.h"
+#include "scalar/ScalarProbe.h"
+#include "scalar/SensorFamilies.h"
 
 namespace {
 
@@ -99,6 +102,7 @@ int CListCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
 int CListCommand::Run(const CRunSeams& seams_I, const std::string& configPath_I, std::FILE* out_IO,
                       std::FILE* err_IO) {
   mConfigPath = configPath_I;
+  seams_I.ShareScalarSeams();
   std::unique_ptr<CLinuxDiscovery> discovery = seams_I.MakeDiscovery();
   discovery->SetConfig(mConfigPath);
   discovery->GenerateDeviceList();
@@ -132,9 +136,23 @@ std::vector<CListCommand::SProductLine> CListCommand::Describe(const CDeviceList
       line.path = interface_I->GetPath();
       line.version = VersionOf(line.path, hid, usb);
     }
-    // Scalars behind a display's bridge are not among the USB interfaces searched.
-    line.searched = interface_I || configured_I != EFTDI_INTERFACE;
     return line;
+  };
+  // A scalar behind a display's bridge has no interface of its own: it is
+  // the family's display of the scalar's product id whose scalar answers with
+  // that display's serial number, and the `-s` value is its path.
+  const auto bridgedScalar = [](const CDevice& device_I, SBoardLine& line_IO) {
+    for (const auto& display :
+         DisplayUtils::TavikDisplayAttributesWithPID(device_I.GetScalarProductId())) {
+      const SScalarProbe probe = ProbeScalar(
+          display->StringForKeyWithDefault(DisplayUtils::kAlphanumericSerialNumberKey, ""),
+          ScalarSensorId(device_I.GetPenProductId()));
+      if (probe.found) {
+        line_IO.path = DisplayUtils::ScalarArgument(*display);
+        line_IO.version = probe.version;
+        return;
+      }
+    }
   };
 
   std::vector<SProductLine> products;
@@ -165,6 +183,9 @@ std::vector<CListCommand::SProductLine> CListCommand::Describe(const CDeviceList
       product.boards.push_back(boardLine("scalar", device->GetScalarInterface(),
                                          device->GetScalarInterfaceType(),
                                          device->GetScalarUpdate()));
+      if (device->GetScalarInterfaceType() == EFTDI_INTERFACE) {
+        bridgedScalar(*device, product.boards.back());
+      }
     }
     products.push_back(product);
   }
@@ -184,9 +205,7 @@ void CListCommand::PrintText(const std::vector<SProductLine>& products_I, std::F
     std::fprintf(out_IO, "  %-10s %-5s %-34s %-8s %s\n", "board", "via", "interface path",
                  "version", "firmware file");
     for (const SBoardLine& board : product.boards) {
-      const std::string where = !board.path.empty() ? board.path
-                                : board.searched    ? "not found"
-                                                    : "behind the display's bridge";
+      const std::string where = board.path.empty() ? "not found" : board.path;
       std::fprintf(out_IO, "  %-10s %-5s %-34s %-8s %s\n", board.board.c_str(),
                    board.interface.c_str(), where.c_str(),
                    board.version.empty() ? "-" : board.version.c_str(),
@@ -207,7 +226,6 @@ void CListCommand::PrintJson(const std::vector<SProductLine>& products_I, std::F
       const SBoardLine& board = product.boards[j];
       json += std::string(j ? "," : "") + "{\"board\":" + JsonString(board.board) +
               ",\"found\":" + (board.path.empty() ? "false" : "true") +
-              ",\"searched\":" + (board.searched ? "true" : "false") +
               ",\"interface\":" + JsonString(board.interface) +
               ",\"path\":" + (board.path.empty() ? "null" : JsonString(board.path)) +
               ",\"version\":" + (board.version.empty() ? "null" : JsonString(board.version)) +

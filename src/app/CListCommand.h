@@ -38,7 +38,6 @@ class CListCommand {
     std::string interface;  // "HID", "BULK", "I2C", "FTDI", or "" for none configured
     std::string version;    // empty when unknown
     std::string firmware;
-    bool searched = true;  // false for a scalar behind the display's bridge
   };
   struct SProductLine {
     std::string name;

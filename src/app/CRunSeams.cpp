@@ -13,6 +13,8 @@
 #include "platform/linux/CLinuxFTDIExAPI32.h"
 #include "platform/linux/CLinuxHidNode.h"
 #include "platform/linux/CLinuxUsbControl.h"
+#include "scalar/CI2CConnectorFTDI.h"
+#include "scalar/DisplayUtils.h"
 
 std::unique_ptr<CRunSeams> CRunSeams::MakeLinux() {
   std::unique_ptr<CRunSeams> seams(new CRunSeams());
@@ -57,4 +59,9 @@ std::unique_ptr<CRunSeams> CRunSeams::MakeLab(const std::string& product_I,
 
 std::unique_ptr<CLinuxDiscovery> CRunSeams::MakeDiscovery() const {
   return std::make_unique<CLinuxDiscovery>(mRegistry, mMakeHidNode, mMakeUsbControl);
+}
+
+void CRunSeams::ShareScalarSeams() const {
+  CI2CConnectorFTDI::SetApi(mFTDI.get());
+  DisplayUtils::SetDisplays(mDisplays.get());
 }

@@ -32,6 +32,9 @@ class CRunSeams {
   const std::shared_ptr<CFTDIExAPI32>& GetFTDI() const { return mFTDI; }
   const std::shared_ptr<CDisplays>& GetDisplays() const { return mDisplays; }
   std::unique_ptr<CLinuxDiscovery> MakeDiscovery() const;
+  // The scalar path reaches the bridges and displays through process-wide
+  // pointers; these seams must outlive every use after this call.
+  void ShareScalarSeams() const;
 
  private:
   CRunSeams() = default;

@@ -17,8 +17,6 @@
 #include "lab/CLabSession.h"
 #include "platform/linux/CLinuxDesktop.h"
 #include "platform/linux/CLinuxPowerInhibitor.h"
-#include "scalar/CI2CConnectorFTDI.h"
-#include "scalar/DisplayUtils.h"
 #include "update/CApplicationDelegate.h"
 
 namespace {
@@ -67,10 +65,7 @@ int CUpdateCommand::Run() {
     return ERUN_USAGE;
   }
 
-  // The scalar path reaches the run's bridges and displays through these;
-  // the seams outlive the run.
-  CI2CConnectorFTDI::SetApi(seams->GetFTDI().get());
-  DisplayUtils::SetDisplays(seams->GetDisplays().get());
+  seams->ShareScalarSeams();
 
   // A lab run starts from the state the last one left and gives it back at
   // the end, whichever way the run ends.

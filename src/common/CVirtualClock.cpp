@@ -8,7 +8,7 @@ namespace {
 constexpr std::chrono::milliseconds kWorkWait{500};
 }  // namespace
 
-CVirtualClock::CVirtualClock() : mWorker([this] { RunTasks(); }) {}
+CVirtualClock::CVirtualClock(double start_I) : mNow(start_I), mWorker([this] { RunTasks(); }) {}
 
 CVirtualClock::~CVirtualClock() {
   {

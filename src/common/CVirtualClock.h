@@ -21,7 +21,9 @@
 
 class CVirtualClock : public CClock {
  public:
-  CVirtualClock();
+  // Time starts at `start_I`: a clock that takes over from another starts
+  // where that one stands, so times taken before the swap stay in the past.
+  explicit CVirtualClock(double start_I = 0.0);
   ~CVirtualClock() override;
   CVirtualClock(const CVirtualClock&) = delete;
   CVirtualClock& operator=(const CVirtualClock&) = delete;

@@ -10,7 +10,8 @@ CLabSession::CLabSession(std::shared_ptr<CLabBus> bus_I, CLabOptions options_I)
 CLabSession::~CLabSession() { Finish(); }
 
 int CLabSession::Start() {
-  if (mOptions.GetFast()) CClock::Set(std::make_shared<CVirtualClock>());
+  // The boards already took times from the clock they were plugged in under.
+  if (mOptions.GetFast()) CClock::Set(std::make_shared<CVirtualClock>(CClock::Get()->Now()));
   const int loaded = mBus->LoadState(mOptions.GetStateFolder());
   mBus->AddFaults(mOptions.GetFaults(), mOptions.GetSeed());
   for (const SLabFault& fault : mOptions.GetFaults()) {

@@ -111,3 +111,9 @@ std::vector<uint8_t> DisplayUtils::CreateEDIDOfARMDisplayID(uint32_t displayId_I
   place(serial, kSyntheticSerial);
   return edid;
 }
+
+std::string DisplayUtils::ScalarArgument(const CSettingsMap& display_I) {
+  return std::to_string(display_I.IntegerForKeyWithDefault(kLegacyManufacturerIDKey, 0)) + ":" +
+         std::to_string(display_I.IntegerForKeyWithDefault(kProductIDKey, 0)) + ":" +
+         display_I.StringForKeyWithDefault(kAlphanumericSerialNumberKey, std::string()) + ":255";
+}

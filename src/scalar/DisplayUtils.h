@@ -35,6 +35,10 @@ class DisplayUtils {
   static std::vector<std::shared_ptr<CSettingsMap>> TavikDisplayAttributesWithPID(
       int64_t productId_I);
 
+  // The `-s` value that updates the scalar of a display: manufacturer,
+  // product, serial number and the index 255, colon-separated.
+  static std::string ScalarArgument(const CSettingsMap& display_I);
+
   static std::string SerialNumberFrom(const std::vector<uint8_t>& edid_I);
   static std::string DisplayNameFrom(const std::vector<uint8_t>& edid_I);
 

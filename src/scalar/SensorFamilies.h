@@ -14,6 +14,12 @@ constexpr bool IsOneOf(SENSOR_ID sid_I, std::initializer_list<SENSOR_ID> ids_I) 
 }
 }  // namespace SensorFamilies
 
+// The identity a display's scalar is read with: the family's vendor half
+// and the product id of the display's pen, which serves for its scalar too.
+constexpr SENSOR_ID ScalarSensorId(uint32_t penProductId_I) {
+  return static_cast<SENSOR_ID>(0x7A5D0000u | (penProductId_I & 0xFFFFu));
+}
+
 constexpr bool IS_VENUS_M(SENSOR_ID sid_I) { return sid_I == 0x7A5D0390; }
 constexpr bool IS_VENUS_M_VAVE(SENSOR_ID sid_I) { return sid_I == 0x7A5D03AE; }
 constexpr bool IS_VENUS_L(SENSOR_ID sid_I) { return sid_I == 0x7A5D0391; }

@@ -73,6 +73,12 @@ class CUpdateController : public CInterfaceNotifier {
   bool UpdateDeviceList();
   bool CheckDeviceList();
   bool UpdateDevice();
+  // The update of a scalar behind a display's FTDI bridge: the bridge whose
+  // display has serial number `serial_I` (or, given a `pattern_I`, a serial
+  // that matches it whole), or with `openByIndex_I` and no pattern the
+  // bridge at `index_I`. Reports by state, like UpdateDevice.
+  bool UpdateScalar(const std::string& serial_I, unsigned char index_I, bool openByIndex_I,
+                    const std::string& pattern_I);
 
   // Attach and detach of the interface at `path_I`, from any thread.
   void DeviceAttach(const std::string& path_I);

@@ -16,6 +16,7 @@
 #include "devices/IOUtils.h"
 #include "firmware/FirmwareFileCheck.h"
 #include "host/CLanguageManager.h"
+#include "scalar/DisplayUtils.h"
 #include "settings/CSettingsArray.h"
 #include "settings/CSettingsMap.h"
 #include "settings/CSettingsString.h"
@@ -258,8 +259,14 @@ std::vector<std::string> OFLUpdater::createArgumentsFromAutoConfig() {
         if (kind == "bluetooth") {
           add("-b", device->GetBluetoothInterface(), device->GetBluetoothProductId());
         }
-        // "scalar" asks the attached displays, which come with the display
-        // path; until then it adds nothing.
+        if (kind == "scalar" && device->GetPenInterface() &&
+            device->GetPenProductId() == product) {
+          for (const auto& display :
+               DisplayUtils::TavikDisplayAttributesWithPID(device->GetScalarProductId())) {
+            arguments.push_back("-s");
+            arguments.push_back(DisplayUtils::ScalarArgument(*display));
+          }
+        }
       }
     }
   }
@@ -553,11 +560,7 @@ void OFLUpdater::runUpdateStep(const std::string& value_I) {
   const std::string serial = parts.size() > 2 ? parts[2] : std::string();
   const unsigned char index =
       parts.size() > 3 ? static_cast<unsigned char>(std::atoi(parts[3].c_str())) : 0;
-  if (mSetup.updateScalar) {
-    mSetup.updateScalar(*mUpdater, serial, index);
-  } else {
-    mResults.Finish(EBOARD_FAILED, "a scalar behind the display's bridge cannot be updated yet");
-  }
+  mUpdater->UpdateScalar(serial, index, false, std::string());
 }
 
 void OFLUpdater::callBackStatus(ECONTROLLER_STATE state_I) {

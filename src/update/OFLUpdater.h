@@ -31,10 +31,6 @@ struct SUpdaterSetup {
   std::string preferencesFolder;              // holds fwupdater.parm
   std::string executableFolder;               // fw_loader.ini beside the program
   std::string installedDataFolder;            // fw_loader.ini of the installation
-  // The scalar flow over the FTDI bridge; until it exists a scalar update of
-  // that kind is refused through this hook.
-  std::function<void(CUpdateController&, const std::string& serial, unsigned char index)>
-      updateScalar;
   // The application object, known at creation: whether it was launched by
   // the user decides where the arguments, and the configuration, come from.
   CApplicationDelegate* delegate = nullptr;
