@@ -9,12 +9,6 @@
 
 #include "app/CCommandLine.h"
 #include "app/CListCommand.h"
-#include "common/CClock.h"
-#include "common/CVirtualClock.h"
-#include "lab/CLabBus.h"
-#include "lab/CLabHidNode.h"
-#include "lab/CLabOptions.h"
-#include "lab/CLabProducts.h"
 
 namespace {
 
@@ -107,30 +101,6 @@ TEST_F(ListCommand, BoardsThatAreNotSearchedOrNotFoundSaySo) {
                 "\"firmware\":\"classic-tablet.touch\"}]}]}\n");
 }
 
-TEST_F(ListCommand, APenALabRunLeftInItsLoaderIsListedInLoaderMode) {
-  {
-    CClock::Set(std::make_shared<CVirtualClock>());
-    auto bus = CLabBus::Create();
-    const auto boards = CLabProducts::Plug(*bus, "classic-tablet");
-    DeviceInfo pen = boards[0]->GetInterfaces().at(1).info;
-    pen.locationId = boards[0]->GetLocationId();
-    CLabHidNode node(bus);
-    ASSERT_EQ(node.Open(pen), EHidStatus::eSuccess);
-    ASSERT_EQ(node.SetFeatureReport({0xCC, 0x05, 0x6A}), EHidStatus::eSuccess);
-    node.Close();
-    TavSleep(1.0);
-    ASSERT_TRUE(bus->SaveState(CLabOptions::DefaultStateFolder()));
-    CClock::Set(nullptr);
-  }
-  const SRun run = List({"--list", "--lab", "classic-tablet", "-f", mConfig});
-  EXPECT_EQ(run.status, 0);
-  EXPECT_NE(run.out.find("Lab Classic Tablet, in loader mode\n"), std::string::npos) << run.out;
-  EXPECT_NE(run.out.find("  pen        HID   31325:770:17891328:1:65280         0.03     "
-                         "classic-tablet.pen\n"),
-            std::string::npos)
-      << run.out;
-}
-
 TEST_F(ListCommand, NothingFoundIsSaidPlainlyWithStatusTwo) {
   SRun run = List({"--list", "--lab", "-f", mState.string() + "/missing.ini"});
   EXPECT_EQ(run.status, 2);
@@ -146,36 +116,4 @@ TEST_F(ListCommand, NothingFoundIsSaidPlainlyWithStatusTwo) {
   EXPECT_EQ(run.status, 1);
   EXPECT_EQ(run.out, "");
   EXPECT_NE(run.err.find("no lab product called no-such-product"), std::string::npos);
-}
-
-TEST_F(ListCommand, LabListNamesEveryProductOnce) {
-  const SRun run = List({"--list", "--lab", "list"});
-  EXPECT_EQ(run.status, 0);
-  size_t lines = 0;
-  for (const SLabProduct& product : CLabProducts::All()) {
-    EXPECT_NE(run.out.find(product.name + " "), std::string::npos) << product.name;
-    ++lines;
-  }
-  EXPECT_EQ(static_cast<size_t>(std::count(run.out.begin(), run.out.end(), '\n')), lines);
-  EXPECT_NE(run.out.find("(the default)"), std::string::npos);
-}
-
-TEST(ListCommandLine, TheLabNameIsOptionalAndJsonNeedsACommand) {
-  CCommandLine named;
-  ASSERT_TRUE(named.Parse({"--list", "--lab", "display-hid", "-f", "x.ini"}));
-  EXPECT_TRUE(named.GetList());
-  EXPECT_EQ(named.GetLabName(), "display-hid");
-  EXPECT_EQ(named.GetUpdaterArguments(), (std::vector<std::string>{"-f", "x.ini"}));
-  EXPECT_EQ(CListCommand::ConfigPath(named.GetUpdaterArguments()), "x.ini");
-
-  CCommandLine unnamed;
-  ASSERT_TRUE(unnamed.Parse({"--lab", "-f", "x.ini", "--list"}));
-  EXPECT_TRUE(unnamed.GetLab());
-  EXPECT_EQ(unnamed.GetLabName(), "");
-  EXPECT_EQ(unnamed.GetUpdaterArguments().size(), 2u);
-
-  CCommandLine json;
-  EXPECT_FALSE(json.Parse({"--json"}));
-  CCommandLine both;
-  EXPECT_FALSE(both.Parse({"--list", "--inspect", "file.pen"}));
 }

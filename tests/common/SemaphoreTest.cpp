@@ -70,37 +70,6 @@ TEST(CTavSemaphore, ReleaseWithoutHoldingAssertsAndLeavesTheLockAlone) {
   EXPECT_EQ(capture.Assertions().size(), 2u);
 }
 
-TEST(CTavReaderWriterSemaphore, ReadersShareWritersExclude) {
-  const auto semaphore = CTavReaderWriterSemaphore::New("settings");
-  ASSERT_NE(dynamic_cast<CLinuxReaderWriterSemaphore*>(semaphore.get()), nullptr);
-  EXPECT_EQ(semaphore->Init(), 0);
-
-  EXPECT_EQ(semaphore->RequestReader(), 0);
-  std::atomic<bool> secondReader{false};
-  std::thread reader([&] {
-    EXPECT_EQ(semaphore->RequestReader(), 0);
-    secondReader = true;
-    EXPECT_EQ(semaphore->ReleaseReader(), 0);
-  });
-  EXPECT_TRUE(BecomesTrue(secondReader));  // while the first still reads
-  reader.join();
-
-  std::atomic<bool> writing{false};
-  std::thread writer([&] {
-    EXPECT_EQ(semaphore->RequestWriter(), 0);
-    writing = true;
-    std::this_thread::sleep_for(50ms);
-    EXPECT_EQ(semaphore->ReleaseWriter(), 0);
-  });
-  EXPECT_TRUE(StaysFalse(writing));
-  EXPECT_EQ(semaphore->ReleaseReader(), 0);
-  EXPECT_TRUE(BecomesTrue(writing));
-  // The writer holds it now, so a reader waits until it is done.
-  EXPECT_EQ(semaphore->RequestReader(), 0);
-  EXPECT_EQ(semaphore->ReleaseReader(), 0);
-  writer.join();
-}
-
 TEST(CTavReaderWriterSemaphore, MisuseAssertsInsteadOfHanging) {
   LogCapture capture;
   const auto semaphore = CTavReaderWriterSemaphore::New("rw");

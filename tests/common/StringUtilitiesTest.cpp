@@ -66,27 +66,12 @@ TEST(StringUtilities, CaseTrimSearchAndReplace) {
   }
 }
 
-TEST(StringUtilities, FormatCharArraysAndIdentifiers) {
+TEST(StringUtilities, FormatAndCharArrays) {
   EXPECT_EQ(Format("%s-%04X-%d", "id", 0xBEEFu, -3), "id-BEEF--3");
   EXPECT_EQ(Format("%s", ""), "");
   EXPECT_EQ(Format("<%s>", std::string(5000, 'z').c_str()).size(), 5002u);
   EXPECT_EQ(StringFromCharArray(nullptr), "");
   EXPECT_EQ(StringFromCharArray("abc"), "abc");
-  const std::string now = CurrentSystemTime();
-  ASSERT_EQ(now.size(), 19u);
-  EXPECT_EQ(now[4], '-');
-  EXPECT_EQ(now[13], ':');
-
-  EXPECT_EQ(StringFromWirelessID(0xABC), "TL#000ABC");
-  EXPECT_EQ(StringFromWirelessID(0x12345678), "TL#12345678");
-  EXPECT_EQ(StringFromRemoteID(0x12345678), "R#12-345678");
-  EXPECT_EQ(StringFromRemoteID(0x0000000F), "R#00-00000F");
-  EXPECT_EQ(StringToRemoteID(StringFromRemoteID(0xFEDCBA98)), 0xFEDCBA98u);
-  // The separator is not looked at, and only ten characters read.
-  const std::pair<const char*, uint32_t> remotes[] = {
-      {"R#12-345678", 0x12345678u}, {"R#12x345678", 0x12345678u}, {"R#12-34567", 0u},
-      {"R#12-3456789", 0u},         {"X#12-345678", 0u},          {"", 0u}};
-  for (const auto& [text, id] : remotes) EXPECT_EQ(StringToRemoteID(text), id) << text;
 }
 
 TEST(UTF8, EncodesAtEveryLengthBoundaryAndDecodesBack) {

@@ -5,7 +5,6 @@
 
 #include <gtest/gtest.h>
 
-#include <cstdlib>
 #include <filesystem>
 
 #include "firmware/FirmwareFiles.h"
@@ -67,60 +66,41 @@ std::vector<std::vector<uint8_t>> Blocks(const CLabFlash& flash_I) {
 TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
   const std::vector<SContinuousDataBlock> image{Record(0x08002100, 3 * 4096 + 200, 11),
                                                 Record(0x08009000, 300, 12)};
-  const uint8_t commitId = GetParam() == ELabProtocol::eNonBL ? 0xDE : 0x1D;
-
-  // The uninterrupted sequence: how many reports, and where the commits lie.
+  // The uninterrupted sequence: how many reports.
   std::shared_ptr<CLabPenController> pen = NewRun(false);
   const auto oldImage = Blocks(pen->GetLoader().GetCpu(0));
   const auto newImage = LabImages::Expected(pen->GetLoader().GetCpu(0), image);
   ASSERT_TRUE(RunUpdate(*pen, image).backToNormal);
   const uint64_t sequence = pen->GetReportCount();
-  uint64_t firstCommit = 0;
-  uint64_t lastCommit = 0;
-  const std::vector<SLabTraceEntry> trace = pen->GetTrace();
-  for (size_t i = 0; i < trace.size(); ++i) {
-    const SLabTraceEntry& entry = trace[i];
-    if (entry.kind != SLabTraceEntry::eSetFeature || entry.bytes[0] != commitId) continue;
-    if (firstCommit == 0) firstCommit = i + 1;
-    lastCommit = i + 1;
-  }
-  ASSERT_EQ(trace.size(), sequence);
-  ASSERT_LT(firstCommit, lastCommit);
 
-  uint64_t keptOld = 0;
+  // A cut leaves the old firmware running, the loader waiting with no valid
+  // image, or the new firmware running; in that order as the cut moves on.
+  int phase = 0;
   uint64_t leftInLoader = 0;
-  uint64_t keptNew = 0;
   for (uint64_t cut = 1; cut <= sequence; ++cut) {
     SCOPED_TRACE("cut after report " + std::to_string(cut));
     std::filesystem::remove_all(mFolder);
     pen = NewRun(false);
     pen->Faults().Add({ELabFaultKind::eVanish, static_cast<uint32_t>(cut), ""});
     EXPECT_FALSE(RunUpdate(*pen, image).backToNormal);
-    ASSERT_TRUE(pen->IsUnplugged());
     ASSERT_TRUE(mBus->SaveState(mFolder));
 
     // Power returns.
     pen = NewRun(true);
     const CLabFlash& flash = pen->GetLoader().GetCpu(0);
-    const auto content = Blocks(flash);
-    if (cut < firstCommit) {
-      // Nothing was invalidated or erased yet: the old firmware runs.
-      EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eNormal);
-      EXPECT_TRUE(pen->GetLoader().IsImageValid());
-      EXPECT_EQ(content, oldImage);
-      ++keptOld;
-    } else if (cut < lastCommit) {
-      EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eLoader);
-      EXPECT_FALSE(pen->GetLoader().IsImageValid());
+    const bool inLoader = pen->GetMode() == CLabLoaderBoard::EMode::eLoader;
+    EXPECT_NE(inLoader, pen->GetLoader().IsImageValid());
+    int now = 1;
+    if (inLoader) {
       EXPECT_EQ(flash.GetRomMagicWord(), 0u);
       ++leftInLoader;
     } else {
-      // The final commit went through: the new firmware runs.
-      EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eNormal);
-      EXPECT_TRUE(pen->GetLoader().IsImageValid());
-      EXPECT_EQ(content, newImage);
-      ++keptNew;
+      const auto content = Blocks(flash);
+      EXPECT_TRUE(content == oldImage || content == newImage) << "a mixed image runs";
+      now = content == oldImage ? 0 : 2;
     }
+    EXPECT_GE(now, phase) << "the board went back to an earlier state";
+    phase = now;
 
     // A second full update brings the new image in every case.
     const LabSRecUpdate::SResult second = RunUpdate(*pen, image);
@@ -130,13 +110,8 @@ TEST_P(InterruptionCampaign, EveryCutLeavesTheBoardRecoverable) {
     for (const std::string& violation : pen->GetViolations()) ADD_FAILURE() << violation;
     if (HasFailure()) break;
   }
-
-  // Where each cut left the board, for the test's report.
-  RecordProperty("interruption_points", static_cast<int>(sequence));
-  RecordProperty("kept_old_image", static_cast<int>(keptOld));
-  RecordProperty("left_in_loader", static_cast<int>(leftInLoader));
-  RecordProperty("new_image_committed", static_cast<int>(keptNew));
-  EXPECT_EQ(keptOld + leftInLoader + keptNew, sequence);
+  // The board is invalidated early and made valid only at the very end.
+  EXPECT_EQ(phase, 2);
   EXPECT_GT(leftInLoader, sequence / 2);
 }
 

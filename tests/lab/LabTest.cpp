@@ -3,23 +3,18 @@
 
 #include <gtest/gtest.h>
 
-#include <cstdlib>
 #include <filesystem>
 #include <thread>
 
 #include "common/CClock.h"
-#include "common/CVirtualClock.h"
 #include "lab/CLabDeviceRegistry.h"
 #include "lab/CLabFlash.h"
 #include "lab/CLabHidNode.h"
-#include "lab/CLabI2CMaster.h"
 #include "lab/CLabOptions.h"
 #include "lab/CLabPenController.h"
 #include "lab/CLabScalarHid.h"
 #include "lab/CLabSession.h"
 #include "lab/CLabStateFile.h"
-#include "lab/CLabTouchBulk.h"
-#include "lab/CLabUsbControl.h"
 #include "lab/LabCrc.h"
 #include "support/LabFixture.h"
 
@@ -236,106 +231,37 @@ TEST_F(LabBus, AProgrammingBoardRefusesABadPageAndStaysInvalid) {
   EXPECT_EQ(scalar->GetInterfaces().at(0).info.productId, 0x0352u);
 }
 
-TEST_F(LabBus, BoardsReenumerateWithEventsAndStaleNodesAreGone) {
+TEST_F(LabBus, ASwitchReenumeratesUnlessRefusedAndStaleNodesAreGone) {
   auto pen = std::make_shared<CLabPenController>();
-  auto master = std::make_shared<CLabI2CMaster>();
   mBus->Plug(pen);
-  mBus->Plug(master);
   std::vector<std::pair<DeviceInfo, bool>> events;
   mBus->AddListener([&](const SLabInterface& interface_I, bool attached_I) {
     events.emplace_back(interface_I.info, attached_I);
   });
-
-  std::vector<SLabInterface> listed = mBus->ListInterfaces();
-  ASSERT_EQ(listed.size(), 3u) << "the pen shows two usages, the master one";
-  EXPECT_EQ(listed[0].info.locationId, 0x01100000u);
-  EXPECT_EQ(listed[2].info.locationId, 0x01200000u);
-
-  // Exclusive opening and the release number are checked through hidraw in
-  // UmockdevTest.
   CLabHidNode node(mBus);
-  ASSERT_EQ(node.Open(listed[0].info), EHidStatus::eSuccess);
-  CLabHidNode second(mBus);
-  EXPECT_EQ(second.Open(listed[1].info), EHidStatus::eSuccess) << "another usage";
+  ASSERT_EQ(node.Open(Listed(*pen)), EHidStatus::eSuccess);
+
+  pen->Faults().Add({ELabFaultKind::eRefuseSwitch, 0, ""});
+  EXPECT_EQ(node.SetFeatureReport({0xCC, 0x6A, 0x05}), EHidStatus::eSuccess);
+  TavSleep(2.0);
+  EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eNormal) << "acknowledged and ignored";
+  EXPECT_TRUE(events.empty());
+  pen->Faults().Clear();
 
   EXPECT_EQ(node.SetFeatureReport({0xCC, 0x05, 0x6A}), EHidStatus::eSuccess);
   EXPECT_TRUE(events.empty()) << "the board drops off a moment later";
   TavSleep(0.2);
-  ASSERT_EQ(events.size(), 2u);
+  ASSERT_EQ(events.size(), 2u) << "both usages of the pen";
   EXPECT_FALSE(events[0].second);
   EXPECT_EQ(node.SetFeatureReport({0x02, 0x00}), EHidStatus::eGone);
   TavSleep(0.5);
   ASSERT_EQ(events.size(), 3u);
   EXPECT_TRUE(events[2].second);
   EXPECT_EQ(events[2].first.productId, 0x0302u);
-  EXPECT_EQ(events[2].first.locationId, 0x01100000u) << "same port, same location";
+  EXPECT_EQ(events[2].first.locationId, events[0].first.locationId) << "same port";
   Bytes status{0x14, 0, 0, 0, 0};
   EXPECT_EQ(node.GetFeatureReport(status), EHidStatus::eGone);
   EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eLoader);
-}
-
-TEST_F(LabBus, TheRegistryListsAndWatchesWhatTheBusShows) {
-  auto pen = std::make_shared<CLabPenController>();
-  auto touch = std::make_shared<CLabTouchBulk>();
-  mBus->Plug(pen);
-  mBus->Plug(touch);
-  CLabDeviceRegistry registry(mBus);
-  const std::vector<SHidEntry> hid = registry.ListHidInterfaces(0x7A71);
-  ASSERT_EQ(hid.size(), 3u) << "the pen's two usages and the touch's HID touch input";
-  EXPECT_EQ(hid[0].nodePath, "lab:01100000:000D:0002");
-  EXPECT_EQ(hid[0].version, 0x0120);
-  EXPECT_TRUE(registry.ListHidInterfaces(0x1234).empty());
-  EXPECT_EQ(registry.ListUsbDevices(0).size(), 2u);
-
-  struct SWatcher : CRegistryWatcher {
-    std::mutex lock;
-    std::vector<std::string> seen;
-    void DeviceAdded(const DeviceInfo& info_I) override {
-      std::lock_guard<std::mutex> guard(lock);
-      seen.push_back("+" + std::to_string(info_I.productId));
-    }
-    void DeviceRemoved(const DeviceInfo& info_I) override {
-      std::lock_guard<std::mutex> guard(lock);
-      seen.push_back("-" + std::to_string(info_I.productId));
-    }
-  } watcher;
-  ASSERT_TRUE(registry.OpenWatch());
-  std::thread watch([&] { registry.RunWatch(watcher); });
-
-  // The touch controller leaves its vendor interface for a HID loader.
-  CLabUsbControl usb(mBus);
-  ASSERT_EQ(usb.Open(Listed(*touch)), EUsbStatus::eSuccess);
-  std::vector<uint8_t> none;
-  size_t transferred = 0;
-  ASSERT_EQ(usb.ControlTransfer(0x41, 0xF0, 0xFFFF, 0, none, transferred), EUsbStatus::eSuccess);
-  TavSleep(1.0);
-  for (int i = 0; i < 1000; ++i) {
-    std::lock_guard<std::mutex> guard(watcher.lock);
-    if (watcher.seen.size() >= 2) break;
-    std::this_thread::sleep_for(std::chrono::milliseconds(1));
-  }
-  registry.StopWatching();
-  watch.join();
-  // Its HID touch input goes, its HID loader comes; the vendor interface
-  // is not watched.
-  EXPECT_EQ(watcher.seen, (std::vector<std::string>{"-785", "+786"}));
-  EXPECT_EQ(registry.ListHidInterfaces(0).size(), 3u);
-
-  // A stop that came first ends the next watch at once.
-  registry.StopWatching();
-  registry.RunWatch(watcher);
-}
-
-TEST_F(LabBus, ARefusedSwitchIsAcknowledgedAndIgnored) {
-  auto pen = std::make_shared<CLabPenController>();
-  mBus->Plug(pen);
-  pen->Faults().Add({ELabFaultKind::eRefuseSwitch, 0, ""});
-  CLabHidNode node(mBus);
-  ASSERT_EQ(node.Open(Listed(*pen)), EHidStatus::eSuccess);
-  EXPECT_EQ(node.SetFeatureReport({0xCC, 0x6A, 0x05}), EHidStatus::eSuccess);
-  TavSleep(2.0);
-  EXPECT_EQ(pen->GetMode(), CLabLoaderBoard::EMode::eNormal);
-  EXPECT_EQ(node.SetFeatureReport({0x02, 0x00}), EHidStatus::eSuccess);
 }
 
 // A board cut off mid-update comes back from the folder power cycled: the
@@ -396,33 +322,6 @@ TEST(LabStateFile, ACorruptFileIsRefusedWhole) {
     EXPECT_FALSE(again.Has("mode"));
   }
   std::filesystem::remove(path);
-}
-
-TEST(LabOptions, StateFolderAndFastClock) {
-  const char* saved = std::getenv("XDG_STATE_HOME");
-  const std::string savedValue = saved != nullptr ? saved : "";
-  ::setenv("XDG_STATE_HOME", "/var/tmp/state", 1);
-  EXPECT_EQ(CLabOptions::DefaultStateFolder(), "/var/tmp/state/tavik/lab");
-  ::unsetenv("XDG_STATE_HOME");
-  ::setenv("HOME", ::getenv("HOME") != nullptr ? ::getenv("HOME") : "/home/u", 1);
-  EXPECT_EQ(CLabOptions::DefaultStateFolder(),
-            std::string(::getenv("HOME")) + "/.local/state/tavik/lab");
-  if (saved != nullptr) ::setenv("XDG_STATE_HOME", savedValue.c_str(), 1);
-
-  CLabOptions options;
-  std::string error;
-  EXPECT_TRUE(options.AddFault("stall@2", error));
-  EXPECT_FALSE(options.AddFault("stall", error));
-  EXPECT_EQ(options.GetFaults().size(), 1u);
-  options.SetStateFolder((std::filesystem::temp_directory_path() / "tavik-lab-fast").string());
-  options.SetFast(true);
-  {
-    CLabSession session(CLabBus::Create(), options);
-    session.Start();
-    EXPECT_NE(std::dynamic_pointer_cast<CVirtualClock>(CClock::Get()), nullptr);
-  }
-  CClock::Set(nullptr);
-  std::filesystem::remove_all(options.GetStateFolder());
 }
 
 }  // namespace

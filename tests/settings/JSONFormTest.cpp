@@ -103,6 +103,9 @@ TEST(JSONWriteTest, WriterIndentsWithTabsAndDoesNotEscape) {
   // The last two characters go unconditionally, the opening of an empty container with them.
   EXPECT_EQ(CSettingsMap::New()->GetJSONString(), "\n}");
   EXPECT_EQ(CSettingsArray::New()->GetJSONString(), "\n]");
+  auto outer = CSettingsArray::New();
+  outer->AddObject(inner);
+  EXPECT_EQ(outer->GetJSONString(), "[\n\t[\n\t\ttrue,\n\t\t\"x\"\n\t]\n]");
   EXPECT_EQ(CSettingsObject::ReadFromJSONBuffer("\n}"), nullptr);
   EXPECT_EQ(CSettingsInteger::New(3)->GetJSONString(), "");
 }

@@ -165,23 +165,4 @@ TEST_F(PersistentSettingsTest, LegacyFileStaysWhenItIsBadOrCannotBeMovedIn) {
   EXPECT_FALSE(blocked.SetKeyAndString("x", "y"));
 }
 
-TEST_F(PersistentSettingsTest, LoggingSwitchInTheRootIsAnnounced) {
-  CLinuxPersistentSettings store;
-  store.Init();
-  std::vector<bool> announced;
-  store.SetLoggingNotifier([&](bool enable_I) { announced.push_back(enable_I); });
-  store.SetKeyAndBool("LOGGING_ENABLED", true);
-  store.SetKeyAndBool("LOGGING_ENABLED", false, "Other");
-  store.SetKeyAndBool("LOGGING _ENABLED", false);
-  EXPECT_EQ(announced, (std::vector<bool>{true, false}));
-}
-
-TEST_F(PersistentSettingsTest, SharedInstanceIsTheLinuxStoreMadeOnce) {
-  CPersistentSettings* first = CPersistentSettings::SharedInstance();
-  ASSERT_NE(first, nullptr);
-  EXPECT_EQ(CPersistentSettings::SharedInstance(), first);
-  EXPECT_NE(dynamic_cast<CLinuxPersistentSettings*>(first), nullptr);
-  EXPECT_EQ(fs::path(first->GetFilePath()).filename(), "tdc.xml");
-}
-
 }  // namespace

@@ -50,23 +50,12 @@ TEST(XMLReadTest, DocumentsReadAsTheirTrees) {
     assertions.push_back(capture.Assertions().size());
   }
   EXPECT_EQ(assertions[0], 0u);  // the hand-written document reads cleanly
-  EXPECT_TRUE(
-      capture.LogContains("[E] CSettingsInteger::ReadFromXMLNode: ERROR: bad integer: 12abc"));
-  EXPECT_TRUE(capture.LogContains("Base64 exception"));
-  EXPECT_TRUE(capture.AssertionContains("Unknown node type"));
-  EXPECT_TRUE(capture.AssertionContains("version == \"1.0\""));
-  EXPECT_TRUE(capture.LogContains("[I] found date data. Converting to string"));
-  EXPECT_TRUE(capture.AssertionContains("Bad formed Plist data"));
-  EXPECT_TRUE(capture.LogContains("[E] Found unknown tag mystery"));
-  EXPECT_TRUE(capture.LogContains("[I] CSettingsMap::ReadFromPListNode got node with name orphan"));
 
-  // The later of two like keys wins; only an untyped root says so.
+  // The later of two like keys wins.
   const std::string twice = "<A type=\"integer\">1</A><A type=\"integer\">2</A></root>";
   EXPECT_EQ(ReadXmlMap("<root type=\"map\">" + twice)->IntegerForKeyWithDefault("A", int64_t{0}),
             2);
-  EXPECT_FALSE(capture.LogContains("duplicate key"));
   EXPECT_EQ(ReadXmlMap("<root>" + twice)->IntegerForKeyWithDefault("A", int64_t{0}), 2);
-  EXPECT_TRUE(capture.LogContains("[W] CSettingsMap::ReadFromXMLNode duplicate key A"));
 }
 
 TEST(XMLReadTest, FiltersDropNodesForOtherLanguagesAndPlatforms) {
@@ -88,7 +77,6 @@ TEST(XMLReadTest, UnusableDocumentsGiveEmptyResults) {
                           "<plist version=\"1.0\"/>", "<plist version=\"1.0\"><set/></plist>"}) {
     EXPECT_EQ(CSettingsObject::ReadFromXMLBuffer(bad), nullptr) << bad;
   }
-  EXPECT_TRUE(capture.LogContains("[E] TraceXmlError: "));
   std::string errorText = "untouched";
   EXPECT_EQ(CSettingsObject::ReadFromXMLFile("/nonexistent-folder/tdc.xml", errorText), nullptr);
   // The load traced and cleared the error before it could be reported here.
@@ -168,9 +156,6 @@ TEST(XMLWriteTest, InvalidKeysThrowFromTheStringAndFailTheSave) {
   const std::string path = (fs::temp_directory_path() / "settings-bad.xml").string();
   fs::remove(path);
   EXPECT_FALSE(map->SaveXMLToFile(path));
-  EXPECT_TRUE(capture.LogContains(
-      "[E] CSettingsObject::SaveXMLToFile: XmlUtils::CreateNode passed invalid node name: "
-      "\"1bad\""));
   EXPECT_FALSE(fs::exists(path));
 }
 

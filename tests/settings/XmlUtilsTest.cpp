@@ -1,8 +1,7 @@
-// The libxml2 layer: walking, building, XPath and merging.
+// The libxml2 layer: walking, building and merging.
 
 #include <gtest/gtest.h>
 
-#include <cmath>
 #include <stdexcept>
 
 #include "settings/XmlUtils.h"
@@ -95,36 +94,6 @@ TEST_F(XmlUtilsTest, BuildingEscapesAndValidates) {
   EXPECT_EQ(XmlUtils::CreateChildNode(nullptr, nullptr, "x", "y", true), nullptr);
 }
 
-TEST_F(XmlUtilsTest, XPathQueriesGiveCopiesNumbersAndText) {
-  xmlDocPtr doc = Load(
-      "<devices><device kind=\"pen\" id=\"3\">P</device><device kind=\"touch\" id=\"9\">T</device>"
-      "<device kind=\"\" id=\"1\"/></devices>");
-  EXPECT_TRUE(XmlUtils::XPathExists(doc, "/devices/device[@kind='touch']"));
-  EXPECT_FALSE(XmlUtils::XPathExists(doc, "/devices/scalar"));
-  EXPECT_EQ(XmlUtils::GetXPathAsNumber(doc, "sum(//device/@id)"), 13.0);
-  EXPECT_TRUE(std::isnan(XmlUtils::GetXPathAsNumber(doc, "/devices/none")));
-  EXPECT_EQ(XmlUtils::GetXPathAsString(doc, "//device[2]"), "T");
-
-  xmlXPathObjectPtr devices = XmlUtils::GetXPathObject(doc, "//device");
-  EXPECT_EQ(XmlUtils::NodeCount(devices), 3);
-  xmlNodePtr touch = XmlUtils::GetNodeByAttrib(devices, "kind", "touch");
-  ASSERT_NE(touch, nullptr);
-  EXPECT_EQ(XmlUtils::GetNodeAttribValue(touch, "id"), "9");
-  XmlUtils::FreeNode(touch);
-  EXPECT_EQ(XmlUtils::GetNodeByAttrib(devices, "kind", ""), nullptr);
-  EXPECT_EQ(XmlUtils::GetNodeByIndex(devices, 3), nullptr);
-  XmlUtils::FreeXPathObject(devices);
-
-  LogCapture capture;
-  EXPECT_EQ(XmlUtils::GetXPathObject(doc, "//device["), nullptr);
-  EXPECT_TRUE(capture.LogContains("TraceXmlError"));
-
-  xmlNodePtr pen = XmlUtils::GetXPathAsNode(doc, "//device[@kind='pen']");
-  ASSERT_NE(pen, nullptr);
-  EXPECT_EQ(XmlUtils::GetNodeValue(pen), "P");
-  XmlUtils::FreeNode(pen);
-}
-
 TEST_F(XmlUtilsTest, MergeMatchesByNameAndAttributesAndAppendsTheRest) {
   xmlDocPtr target = Load(
       "<Config version=\"1\" keep=\"k\">"
@@ -153,25 +122,6 @@ TEST_F(XmlUtilsTest, MergeMatchesByNameAndAttributesAndAppendsTheRest) {
 
   XmlUtils::MergeDocuments(nullptr, source2);
   XmlUtils::MergeNodes(xmlDocGetRootElement(target2), nullptr);
-}
-
-TEST_F(XmlUtilsTest, NodesMatchIgnoresCaseAndNeedsOnlyTheMarkerToExist) {
-  xmlDocPtr doc = Load(
-      "<r><a k=\"V\" matchUsingAttributes=\"1\"/><A k=\"v\" matchUsingAttributes=\"0\"/>"
-      "<a k=\"v\"/><a/></r>");
-  xmlNodePtr root = xmlDocGetRootElement(doc);
-  xmlNodePtr first = XmlUtils::GetChildNode(root, 0);
-  xmlNodePtr second = XmlUtils::GetChildNode(root, 1);
-  xmlNodePtr third = XmlUtils::GetChildNode(root, 2);
-  xmlNodePtr bare = XmlUtils::GetChildNode(root, 3);
-  EXPECT_TRUE(XmlUtils::NodesMatch(first, second, true));
-  EXPECT_FALSE(XmlUtils::NodesMatch(first, third, true));  // the marker must exist
-  EXPECT_TRUE(XmlUtils::NodesMatch(first, third, false));
-  EXPECT_TRUE(XmlUtils::NodesMatch(bare, first, true));  // no attributes to compare
-  EXPECT_FALSE(XmlUtils::NodesMatch(third, bare, true));
-  // Attribute values compare ignoring case, so the first child already matches.
-  EXPECT_EQ(XmlUtils::ChildMatchingNode(root, third), first);
-  EXPECT_EQ(XmlUtils::ChildMatchingNode(XmlUtils::GetChildNode(root, 3), third), nullptr);
 }
 
 }  // namespace

@@ -1,13 +1,14 @@
 #pragma once
 // Doubles of the seams an update works through, and the fixture every suite
 // of this folder builds on: the virtual clock, the attached products, one
-// journal of board calls and a folder of the test's own.
+// journal of board calls and a folder of the test's own. The application's
+// window and desktop are doubled in its own suite.
 
-#include <atomic>
 #include <gtest/gtest.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <atomic>
 #include <filesystem>
 #include <fstream>
 #include <map>
@@ -52,7 +53,6 @@ class CLog {
     return found == mItems.end() ? -1 : static_cast<int>(found - mItems.begin());
   }
   bool Has(const T& item_I) const { return At(item_I) >= 0; }
-  long Count(const T& item_I) const { return std::count(mItems.begin(), mItems.end(), item_I); }
   void Clear() { mItems.clear(); }
 
  private:
@@ -99,11 +99,8 @@ class CFakeInterface : public CFLDeviceInterface {
     mBLParams.numFlashBlocks = mBlocks;
     return Call("Init", "(" + std::to_string(bytes) + " bytes)");
   }
-  // Says which binary image, if any, was handed over before it.
   bool ProgramBoard() override {
-    const bool ok = Call("ProgramBoard", GetAiroFlashData()      ? "(airoflash)"
-                                         : GetScalarBinaryData() ? "(scalar binary)"
-                                                                 : "");
+    const bool ok = Call("ProgramBoard");
     if (mNotifier != nullptr) mNotifier->InterfaceProgress(50);
     if (!ok && mNotifier != nullptr) mNotifier->InterfaceError("lab: write failed");
     if (ok) CFLDeviceInterface::UpdateChecksums(0x1111, 0x2222, 0x3333);
@@ -170,119 +167,12 @@ class CFakePower : public CPowerInhibitor {
     ~SLease() override { --held; }
     std::atomic<int>& held;
   };
-  std::unique_ptr<CPowerAssertion> Create(const std::string& name_I) override {
-    mNames.Add(name_I);
+  std::unique_ptr<CPowerAssertion> Create(const std::string&) override {
+    ++mRequests;
     return mRefuse ? nullptr : std::make_unique<SLease>(mHeld);
   }
   bool mRefuse = false;
-  std::atomic<int> mHeld{0};
-  CJournal mNames;  // of each request
-};
-
-// Journals what the driver asks of the application.
-class CRecordingDelegate : public CApplicationDelegate {
- public:
-  bool userLaunched() const override { return mUserLaunched; }
-  void doStateMachine(ECONTROLLER_STATE state_I) override { mJournal.Add("state:", state_I); }
-  void updateProgressBar(double percent_I) override { mJournal.Add("bar:", percent_I); }
-  void notifyDialog(const std::string& text_I) override { mJournal.Add("dialog:" + text_I); }
-  void terminate(ERunOutcome outcome_I) override { mJournal.Add("terminate:", outcome_I); }
-  bool mUserLaunched = true;
-  CJournal mJournal;
-};
-
-// Journals what the application shows, on the thread that asks; tasks for
-// later wait for RunDelayed.
-class CFakeWindow : public CWindowController {
- public:
-  void initForDialog(bool commandLine_I) override { mCalls.Add("init:", commandLine_I); }
-  void showWindow() override { mCalls.Add("show"); }
-  void enableClose(bool enable_I) override { mCalls.Add("close:", enable_I); }
-  void SetCloseHandler(std::function<void()>) override {}
-  void setStatusText(const std::string& text_I) override { mCalls.Add("text:" + text_I); }
-  void setStatusProgress(double percent_I) override {
-    mCalls.Add("progress:", static_cast<int>(percent_I));
-  }
-  void setStatusColor(ESTATUS_COLOR color_I) override { mCalls.Add("color:", color_I); }
-  void setTabletName(const std::string& name_I) override { mCalls.Add("name:" + name_I); }
-  void setBoardArray(const std::vector<std::string>& boards_I) override {
-    std::string joined;
-    for (const std::string& board : boards_I) joined += board + ",";
-    mCalls.Add("boards:" + joined);
-  }
-  void setPenFirmwareVersion(uint32_t) override {}
-  void setPenOldChecksum(uint32_t) override {}
-  void setPenNewChecksum(uint32_t) override {}
-  void setTouchFirmwareVersion(uint32_t) override {}
-  void setTouchOldChecksum(uint32_t) override {}
-  void setTouchNewChecksum(uint32_t) override {}
-  void enableUIElements(bool enable_I) override { mCalls.Add("ui:", enable_I); }
-  void enableProgramButton(bool enable_I) override { mCalls.Add("button:", enable_I); }
-  int ShowAlert(const SAlert& alert_I) override {
-    mCalls.Add("alert:" + alert_I.message + "|" + alert_I.informativeText);
-    mLastAlert = alert_I;
-    return 0;
-  }
-  bool AskYesNo(const SAlert&) override {
-    mCalls.Add("ask");
-    return mAnswerYes;
-  }
-  void RunMainLoop() override {}
-  void QuitMainLoop() override {}
-  void PostToMainLoop(std::function<void()> task_I) override { task_I(); }
-  void PostToMainLoopAfter(double delay_I, std::function<void()> task_I) override {
-    mDelayed.emplace_back(delay_I, std::move(task_I));
-  }
-  bool IsMainLoopThread() const override { return true; }
-
-  // Runs the oldest task for later; -1 when there is none, else its delay.
-  double RunDelayed() {
-    if (mDelayed.empty()) return -1;
-    const auto [delay, task] = mDelayed.front();
-    mDelayed.erase(mDelayed.begin());
-    task();
-    return delay;
-  }
-
-  bool mAnswerYes = true;
-  SAlert mLastAlert;
-  CJournal mCalls;
-
- private:
-  std::vector<std::pair<double, std::function<void()>>> mDelayed;
-};
-
-// Quits and launches only in its journal; what runs is what a test sets.
-class CFakeDesktop : public CDesktop {
- public:
-  int GetLaunchSenderPid() override { return mSenderPid; }
-  std::string GetApplicationIdOfProcess(int) override { return mSenderId; }
-  bool IsApplicationProcess(int) override { return mSenderIsApplication; }
-  int GetProcessArgumentCount() override { return mArgumentCount; }
-  std::vector<int> RunningApplications(const std::string& id_I) override { return mRunning[id_I]; }
-  bool TerminateApplication(int pid_I) override {
-    mJournal.Add("quit:" + std::to_string(pid_I));
-    for (auto& [id, pids] : mRunning) std::erase(pids, pid_I);
-    return true;
-  }
-  bool IsTerminated(int) override { return true; }
-  bool LaunchApplication(const std::string& id_I) override {
-    mJournal.Add("launch:" + id_I);
-    return true;
-  }
-  void PostNotification(const std::string& name_I,
-                        const std::map<std::string, std::string>&) override {
-    mJournal.Add("notify:" + name_I);
-  }
-  bool RequestHidAccess() override { return mHidAccess; }
-
-  int mSenderPid = 1;
-  std::string mSenderId = "systemd";
-  bool mSenderIsApplication = false;
-  int mArgumentCount = 1;
-  bool mHidAccess = true;
-  std::map<std::string, std::vector<int>> mRunning;
-  CJournal mJournal;
+  std::atomic<int> mHeld{0}, mRequests{0};
 };
 
 class UpdateFixture : public ::testing::Test {
@@ -296,7 +186,6 @@ class UpdateFixture : public ::testing::Test {
   }
   void TearDown() override {
     OFLUpdater::DisposeInstance();
-    OUpdaterClient::SetFactory(nullptr);
     // The clock's thread before the controller: its tasks reach into it.
     CClock::Set(nullptr);
     mClock.reset();
