@@ -7,13 +7,17 @@
 #include "app/CCommandLine.h"
 #include "app/CRunSeams.h"
 #include "app/JsonString.h"
+#include "app/TavVersion.h"
 #include "common/LinuxPaths.h"
 #include "devices/IOUtils.h"
 #include "flash/CFLDeviceInterface.h"
+#include "lab/CLabBus.h"
+#include "lab/CLabOptions.h"
 #include "lab/CLabProducts.h"
 #include "scalar/DisplayUtils.h"
 #include "scalar/ScalarProbe.h"
 #include "scalar/SensorFamilies.h"
+#include "update/CApplicationDelegate.h"
 
 namespace {
 
@@ -65,6 +69,7 @@ CListCommand::CListCommand(const CCommandLine& commandLine_I)
       mLab(commandLine_I.GetLab()),
       mLabName(commandLine_I.GetLabName()),
       mLabState(commandLine_I.GetLabState()),
+      mLabFaults(commandLine_I.GetLabFaults()),
       mJson(commandLine_I.GetInspectJson()) {}
 
 std::string CListCommand::ConfigPath(const std::vector<std::string>& updaterArguments_I) {
@@ -96,6 +101,16 @@ int CListCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
     std::fprintf(err_IO, "%s\n", error.c_str());
     return 1;
   }
+  // Faults show what the listing makes of a board that misbehaves.
+  CLabOptions faults;
+  for (const std::string& fault : mLabFaults) {
+    if (!faults.AddFault(fault, error)) {
+      std::fprintf(err_IO, "%s: --lab-fault %s: %s\n", TAV_PROGRAM_NAME, fault.c_str(),
+                   error.c_str());
+      return ERUN_USAGE;
+    }
+  }
+  if (seams->GetLabBus()) seams->GetLabBus()->AddFaults(faults.GetFaults(), faults.GetSeed());
   return Run(*seams, mConfigPath, out_IO, err_IO);
 }
 

@@ -53,6 +53,7 @@ class CListCommand {
   bool mLab = false;
   std::string mLabName;
   std::string mLabState;  // as the last run left the boards; default when empty
+  std::vector<std::string> mLabFaults;
   bool mJson = false;
   bool mConfigRead = false;
 };

@@ -79,11 +79,19 @@ TEST_F(ListCommand, ShowsTheDefaultProductWithEveryBoard) {
                 "wireless-tablet.airoflash2\n");
 }
 
-TEST_F(ListCommand, BoardsThatAreNotSearchedOrNotFoundSaySo) {
+TEST_F(ListCommand, AScalarBehindItsBridgeIsListedWithItsDisplaysSValueAndVersion) {
   SRun run = List({"--list", "--lab", "display-ftdi", "-f", mConfig});
   EXPECT_EQ(run.status, 0);
-  EXPECT_NE(run.out.find("  scalar     FTDI  behind the display's bridge        -        "
+  EXPECT_NE(run.out.find("  scalar     FTDI  23335:4192:LABFT0701:255           1.0.0    "
                          "display-ftdi.bin\n"),
+            std::string::npos)
+      << run.out;
+
+  // A bridge nobody can open is a scalar not found.
+  run = List({"--list", "--lab", "display-ftdi", "--lab-fault", "refuse-open", "--json", "-f",
+              mConfig});
+  EXPECT_NE(run.out.find("{\"board\":\"scalar\",\"found\":false,\"interface\":\"FTDI\","
+                         "\"path\":null,\"version\":null,"),
             std::string::npos)
       << run.out;
 
@@ -93,10 +101,10 @@ TEST_F(ListCommand, BoardsThatAreNotSearchedOrNotFoundSaySo) {
             "{\"configuration\":\"" + mConfig +
                 "\",\"configurationRead\":true,\"products\":[{\"name\":\"Lab Classic Tablet\","
                 "\"loaderMode\":false,\"boards\":["
-                "{\"board\":\"pen\",\"found\":true,\"searched\":true,\"interface\":\"HID\","
+                "{\"board\":\"pen\",\"found\":true,\"interface\":\"HID\","
                 "\"path\":\"31325:769:17891328:1:65280\",\"version\":\"1.20\","
                 "\"firmware\":\"classic-tablet.pen\"},"
-                "{\"board\":\"touch\",\"found\":true,\"searched\":true,\"interface\":\"BULK\","
+                "{\"board\":\"touch\",\"found\":true,\"interface\":\"BULK\","
                 "\"path\":\"31325:785:17956864:0:0\",\"version\":\"2.10\","
                 "\"firmware\":\"classic-tablet.touch\"}]}]}\n");
 }
