@@ -10,7 +10,7 @@ PACKAGES=(
   libxml2-dev libxml2-utils zlib1g-dev
   libudev-dev libusb-1.0-0-dev libftdi1-dev libsystemd-dev
   qt6-base-dev gettext
-  umockdev libumockdev-dev libglib2.0-dev
+  umockdev libumockdev-dev libglib2.0-dev edid-decode
   srecord binutils python3 dbus-daemon
   openssl
 )

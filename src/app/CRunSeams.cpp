@@ -9,6 +9,8 @@
 #include "lab/CLabProducts.h"
 #include "lab/CLabUsbControl.h"
 #include "platform/linux/CLinuxDeviceRegistry.h"
+#include "platform/linux/CLinuxDisplays.h"
+#include "platform/linux/CLinuxFTDIExAPI32.h"
 #include "platform/linux/CLinuxHidNode.h"
 #include "platform/linux/CLinuxUsbControl.h"
 #include "scalar/CI2CConnectorFTDI.h"
@@ -20,7 +22,8 @@ std::unique_ptr<CRunSeams> CRunSeams::MakeLinux() {
   seams->mRegistry = registry;
   seams->mMakeHidNode = [registry] { return std::make_unique<CLinuxHidNode>(registry); };
   seams->mMakeUsbControl = [] { return std::make_unique<CLinuxUsbControl>(); };
-  // mFTDI and mDisplays stay null until the Linux forms land.
+  seams->mFTDI = std::make_shared<CLinuxFTDIExAPI32>();
+  seams->mDisplays = std::make_shared<CLinuxDisplays>();
   return seams;
 }
 

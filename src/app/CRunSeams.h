@@ -1,8 +1,8 @@
 #pragma once
-// The seams a run works through: the Linux ones (libudev, hidraw, libusb),
-// or the lab's, with one emulated product plugged into the lab bus. Only
-// the application chooses between the two; everything above the seams is
-// the same in both.
+// The seams a run works through: the Linux ones (libudev, hidraw, libusb,
+// libftdi1, DRM), or the lab's, with one emulated product plugged into the
+// lab bus. Only the application chooses between the two; everything above
+// the seams is the same in both.
 
 #include <memory>
 #include <string>
@@ -28,8 +28,7 @@ class CRunSeams {
   const std::shared_ptr<CLabBus>& GetLabBus() const { return mLabBus; }
 
   const std::shared_ptr<CDeviceRegistry>& GetRegistry() const { return mRegistry; }
-  // The FTDI bridges and the attached displays of the scalar path. Null in
-  // a Linux run until the libftdi1 and DRM forms exist.
+  // The FTDI bridges and the attached displays of the scalar path.
   const std::shared_ptr<CFTDIExAPI32>& GetFTDI() const { return mFTDI; }
   const std::shared_ptr<CDisplays>& GetDisplays() const { return mDisplays; }
   std::unique_ptr<CLinuxDiscovery> MakeDiscovery() const;
