@@ -38,30 +38,6 @@ const char* InterfaceWord(EINTERFACE_TYPE type_I) {
   }
 }
 
-// A USB release number is binary-coded decimal: 0x0120 is 1.20.
-std::string ReleaseText(uint16_t release_I) {
-  char text[16];
-  std::snprintf(text, sizeof(text), "%x.%02x", release_I >> 8, release_I & 0xFF);
-  return text;
-}
-
-// The release number the registry lists for the device behind an interface.
-std::string VersionOf(const std::string& path_I, const std::vector<SHidEntry>& hid_I,
-                      const std::vector<SUsbEntry>& usb_I) {
-  DeviceInfo info;
-  if (!IOUtils::DeviceInfoFromPath(path_I, info)) return std::string();
-  for (const SHidEntry& entry : hid_I) {
-    if (entry.info == info) return ReleaseText(entry.version);
-  }
-  for (const SUsbEntry& entry : usb_I) {
-    if (entry.vendorId == info.vendorId && entry.productId == info.productId &&
-        entry.locationId == info.locationId) {
-      return ReleaseText(entry.version);
-    }
-  }
-  return std::string();
-}
-
 }  // namespace
 
 CListCommand::CListCommand(const CCommandLine& commandLine_I)
@@ -139,8 +115,6 @@ int CListCommand::Run(const CRunSeams& seams_I, const std::string& configPath_I,
 
 std::vector<CListCommand::SProductLine> CListCommand::Describe(const CDeviceList& list_I,
                                                                CDeviceRegistry& registry_I) const {
-  const std::vector<SHidEntry> hid = registry_I.ListHidInterfaces(0);
-  const std::vector<SUsbEntry> usb = registry_I.ListUsbDevices(0);
   const auto boardLine = [&](const char* board_I, const CDevice::InterfacePtr& interface_I,
                              EINTERFACE_TYPE configured_I, const std::string& firmware_I) {
     SBoardLine line;
@@ -149,7 +123,7 @@ std::vector<CListCommand::SProductLine> CListCommand::Describe(const CDeviceList
     line.interface = InterfaceWord(interface_I ? interface_I->GetInterfaceType() : configured_I);
     if (interface_I) {
       line.path = interface_I->GetPath();
-      line.version = VersionOf(line.path, hid, usb);
+      line.version = IOUtils::FindReleaseText(registry_I, line.path);
     }
     return line;
   };

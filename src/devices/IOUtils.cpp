@@ -1,6 +1,7 @@
 #include "devices/IOUtils.h"
 
 #include <algorithm>
+#include <cstdio>
 #include <sstream>
 
 namespace {
@@ -108,6 +109,14 @@ bool FindReleaseNumber(CDeviceRegistry& registry_I, const std::string& path_I,
     }
   }
   return false;
+}
+
+std::string FindReleaseText(CDeviceRegistry& registry_I, const std::string& path_I) {
+  uint16_t release = 0;
+  if (!FindReleaseNumber(registry_I, path_I, release)) return std::string();
+  char text[16];
+  std::snprintf(text, sizeof(text), "%x.%02x", release >> 8, release & 0xFF);
+  return text;
 }
 
 std::vector<DeviceInfo> FindMatchedDevices(CDeviceRegistry& registry_I,

@@ -39,6 +39,9 @@ bool IsAcceptedEntry(const SUsbEntry& entry_I);
 // The release number (bcdDevice) of the USB device behind an interface
 // path, as the registry lists it; false when it is not attached.
 bool FindReleaseNumber(CDeviceRegistry& registry_I, const std::string& path_I, uint16_t& release_O);
+// The same as the user reads it: binary-coded decimal, 0x0120 is "1.20";
+// empty when the device is not attached.
+std::string FindReleaseText(CDeviceRegistry& registry_I, const std::string& path_I);
 
 // Every attached HID identity whose vendor id matches `criterion_I`, and
 // the further fields selected by `mask_I` (vendor is always compared).

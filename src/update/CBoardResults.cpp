@@ -29,13 +29,12 @@ void CBoardResults::Begin(size_t index_I) {
 }
 
 void CBoardResults::SetBoard(const std::string& product_I, const std::string& path_I,
-                             bool versionKnown_I, uint32_t version_I) {
+                             const std::string& version_I) {
   std::lock_guard<std::mutex> guard(mLock);
   if (mCurrent >= mResults.size()) return;
   SBoardResult& result = mResults[mCurrent];
   result.product = product_I;
   result.path = path_I;
-  result.versionKnown = versionKnown_I;
   result.versionBefore = version_I;
 }
 
@@ -58,10 +57,9 @@ void CBoardResults::NoteError(const std::string& text_I) {
   if (mFirstError.empty()) mFirstError = text_I;
 }
 
-void CBoardResults::SetVersionAfter(size_t index_I, uint32_t version_I) {
+void CBoardResults::SetVersionAfter(size_t index_I, const std::string& version_I) {
   std::lock_guard<std::mutex> guard(mLock);
   if (index_I >= mResults.size()) return;
-  mResults[index_I].versionAfterKnown = true;
   mResults[index_I].versionAfter = version_I;
 }
 

@@ -24,15 +24,13 @@ enum EBoardOutcome {
 };
 
 struct SBoardResult {
-  std::string kind;     // "pen", "touch", "bluetooth", "scalar"
-  std::string value;    // what followed the option
-  std::string product;  // the selected product's name
-  std::string path;     // the board's interface path
-  std::string file;     // the firmware file loaded for it
-  bool versionKnown = false;
-  uint32_t versionBefore = 0;
-  bool versionAfterKnown = false;
-  uint32_t versionAfter = 0;
+  std::string kind;           // "pen", "touch", "bluetooth", "scalar"
+  std::string value;          // what followed the option
+  std::string product;        // the selected product's name
+  std::string path;           // the board's interface path
+  std::string file;           // the firmware file loaded for it
+  std::string versionBefore;  // as the user reads it; empty when unknown
+  std::string versionAfter;
   EBoardOutcome outcome = EBOARD_NOT_REACHED;
   std::string reason;  // why it was not updated
 };
@@ -47,14 +45,14 @@ class CBoardResults {
   void Reset(const std::vector<std::pair<std::string, std::string>>& entries_I);
   // The entry at `index_I` is under way: later notes are about it.
   void Begin(size_t index_I);
-  void SetBoard(const std::string& product_I, const std::string& path_I, bool versionKnown_I,
-                uint32_t version_I);
+  void SetBoard(const std::string& product_I, const std::string& path_I,
+                const std::string& version_I);
   void SetFile(const std::string& file_I);
   // Ends the current entry; a later end of the same entry does not change it.
   void Finish(EBoardOutcome outcome_I, const std::string& reason_I = std::string());
   // The first error reported during the current entry, kept as its reason.
   void NoteError(const std::string& text_I);
-  void SetVersionAfter(size_t index_I, uint32_t version_I);
+  void SetVersionAfter(size_t index_I, const std::string& version_I);
 
   std::vector<SBoardResult> Get() const;
   SBoardResult GetCurrent() const;

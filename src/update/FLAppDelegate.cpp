@@ -40,11 +40,6 @@ const char* OutcomeText(ERunOutcome outcome_I) {
   return "Result: the update failed.";
 }
 
-// A release number as the device gives it: 0x0120 is "1.20".
-std::string VersionText(uint32_t version_I) {
-  return StringUtilities::Format("%x.%02x", (version_I >> 8) & 0xFF, version_I & 0xFF);
-}
-
 }  // namespace
 
 FLAppDelegate::FLAppDelegate(SApplicationSetup setup_I) : mSetup(std::move(setup_I)) {}
@@ -369,9 +364,8 @@ void FLAppDelegate::boardStarting(const SBoardResult& board_I) {
                                              T(CBoardResults::BoardName(board_I.kind)).c_str(),
                                              board_I.product.c_str());
   if (!board_I.path.empty()) line += " (" + board_I.path + ")";
-  if (board_I.versionKnown) {
-    line += StringUtilities::Format(T(", version %s found").c_str(),
-                                    VersionText(board_I.versionBefore).c_str());
+  if (!board_I.versionBefore.empty()) {
+    line += StringUtilities::Format(T(", version %s found").c_str(), board_I.versionBefore.c_str());
   }
   if (!board_I.file.empty()) {
     line += StringUtilities::Format(T(", from %s").c_str(), board_I.file.c_str());
@@ -398,11 +392,11 @@ void FLAppDelegate::PrintBoardResults() {
     std::string what;
     switch (result.outcome) {
       case EBOARD_UPDATED:
-        what = result.versionKnown && result.versionAfterKnown
-                   ? StringUtilities::Format(T("updated from version %s to %s").c_str(),
-                                             VersionText(result.versionBefore).c_str(),
-                                             VersionText(result.versionAfter).c_str())
-                   : T("updated");
+        what =
+            !result.versionBefore.empty() && !result.versionAfter.empty()
+                ? StringUtilities::Format(T("updated from version %s to %s").c_str(),
+                                          result.versionBefore.c_str(), result.versionAfter.c_str())
+                : T("updated");
         break;
       case EBOARD_FAILED: what = T("failed") + ": " + result.reason; break;
       case EBOARD_NOT_FOUND: what = T("not found") + ": " + result.reason; break;

@@ -17,6 +17,8 @@
 #include "firmware/FirmwareFileCheck.h"
 #include "host/CLanguageManager.h"
 #include "scalar/DisplayUtils.h"
+#include "scalar/ScalarProbe.h"
+#include "scalar/SensorFamilies.h"
 #include "settings/CSettingsArray.h"
 #include "settings/CSettingsMap.h"
 #include "settings/CSettingsString.h"
@@ -45,6 +47,12 @@ constexpr double kIntermediateSuccessHoldSeconds = 3.5;
 // On the way to the loader the normal identity is looked for under this
 // product id, which no product uses, so that any present one differs.
 constexpr uint32_t kLoaderSearchProductId = 0xFF00;
+
+// The serial number in a -s value, "manufacturer:product:serial:index".
+std::string ScalarSerialOf(const std::string& value_I) {
+  const std::vector<std::string> parts = StringUtilities::Tokenize(value_I, ":", false);
+  return parts.size() > 2 ? parts[2] : std::string();
+}
 
 const char* const kParmFileName = "fwupdater.parm";
 const char* const kConfigFileName = "fw_loader.ini";
@@ -259,8 +267,7 @@ std::vector<std::string> OFLUpdater::createArgumentsFromAutoConfig() {
         if (kind == "bluetooth") {
           add("-b", device->GetBluetoothInterface(), device->GetBluetoothProductId());
         }
-        if (kind == "scalar" && device->GetPenInterface() &&
-            device->GetPenProductId() == product) {
+        if (kind == "scalar" && device->GetPenInterface() && device->GetPenProductId() == product) {
           for (const auto& display :
                DisplayUtils::TavikDisplayAttributesWithPID(device->GetScalarProductId())) {
             arguments.push_back("-s");
@@ -437,12 +444,17 @@ bool OFLUpdater::prepareEntry(const std::string& kind_I, const std::string& valu
   const std::shared_ptr<CDevice> device = mUpdater->GetSelectedDevice();
   const std::string product = device ? device->GetDeviceName() : std::string();
   const CDevice::InterfacePtr board = mUpdater->GetActiveInterface();
-  if (device) {
+  if (device && mUpdater->GetUpdateType() == EUPDATE_SCALAR_FTDI) {
+    // A scalar behind its bridge has the display's description for a path.
+    mResults.SetBoard(
+        product, value_I,
+        ProbeScalar(ScalarSerialOf(value_I), ScalarSensorId(device->GetPenProductId())).version);
+  } else if (device) {
     // The interface knows its release only once opened; the registry always.
-    uint16_t release = 0;
-    const bool known = board && mSetup.registry &&
-                       IOUtils::FindReleaseNumber(*mSetup.registry, board->GetPath(), release);
-    mResults.SetBoard(product, board ? board->GetPath() : std::string(), known, release);
+    mResults.SetBoard(product, board ? board->GetPath() : std::string(),
+                      board && mSetup.registry
+                          ? IOUtils::FindReleaseText(*mSetup.registry, board->GetPath())
+                          : std::string());
   }
 
   if (mUpdater->PenAutoUpdateExists() || mUpdater->TouchAutoUpdateExists() ||
@@ -513,10 +525,11 @@ void OFLUpdater::refreshVersionsAfter() {
   std::unique_ptr<CDiscovery> discovery;
   for (size_t index = 0; index < results.size(); ++index) {
     const SBoardResult& result = results[index];
+    if (result.outcome != EBOARD_UPDATED) continue;
     DeviceInfo before;
-    if (result.outcome != EBOARD_UPDATED || !IOUtils::DeviceInfoFromPath(result.path, before)) {
-      continue;
-    }
+    // A scalar behind its bridge has no interface path; its bridge is still
+    // held by the update that reports here, so its new version is for --list.
+    if (!IOUtils::DeviceInfoFromPath(result.path, before)) continue;
     if (!discovery) {
       discovery = mSetup.makeDiscovery();
       discovery->SetConfig(mUpdater->getConfigPath());
@@ -531,12 +544,13 @@ void OFLUpdater::refreshVersionsAfter() {
                                               ? device->GetBluetoothInterface()
                                               : device->GetScalarInterface();
       DeviceInfo now;
-      uint16_t release = 0;
       if (board && IOUtils::DeviceInfoFromPath(board->GetPath(), now) &&
-          now.locationId == before.locationId && mSetup.registry &&
-          IOUtils::FindReleaseNumber(*mSetup.registry, board->GetPath(), release)) {
-        mResults.SetVersionAfter(index, release);
-        break;
+          now.locationId == before.locationId && mSetup.registry) {
+        const std::string version = IOUtils::FindReleaseText(*mSetup.registry, board->GetPath());
+        if (!version.empty()) {
+          mResults.SetVersionAfter(index, version);
+          break;
+        }
       }
     }
   }
@@ -557,10 +571,9 @@ void OFLUpdater::runUpdateStep(const std::string& value_I) {
     return;
   }
   const std::vector<std::string> parts = StringUtilities::Tokenize(value_I, ":", false);
-  const std::string serial = parts.size() > 2 ? parts[2] : std::string();
   const unsigned char index =
       parts.size() > 3 ? static_cast<unsigned char>(std::atoi(parts[3].c_str())) : 0;
-  mUpdater->UpdateScalar(serial, index, false, std::string());
+  mUpdater->UpdateScalar(ScalarSerialOf(value_I), index, false, std::string());
 }
 
 void OFLUpdater::callBackStatus(ECONTROLLER_STATE state_I) {
