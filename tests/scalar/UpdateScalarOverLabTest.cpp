@@ -120,7 +120,7 @@ class UpdateScalarOverLab : public LabFixture {
 };
 
 TEST_F(UpdateScalarOverLab, EachVariantEndsWithTheImageInFlashBlockForBlock) {
-  // product, pen, serial, faults, errors reported on the way
+  // product, pen, serial, fault, errors reported on the way
   // clang-format off
   const std::vector<std::tuple<std::string, uint16_t, std::string, std::string, Strings>> rows = {
       {"display-ftdi", 0x0701, "LABFT0701", "", {}},
@@ -184,7 +184,7 @@ TEST_F(UpdateScalarOverLab, OnlyTheBridgeWithTheSerialIsKeptOpen) {
 }
 
 TEST_F(UpdateScalarOverLab, NoBridgeWithTheSerialFailsBeforeAnythingIsProgrammed) {
-  // bridges the library sees, fault, serial asked for
+  // name, bridge listed, fault, serial asked for
   // clang-format off
   const std::vector<std::tuple<const char*, bool, std::string, std::string>> rows = {
       {"no bridge at all", false, "", "LABFT0701"},
