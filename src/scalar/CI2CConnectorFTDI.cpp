@@ -320,8 +320,11 @@ FT_STATUS CI2CConnectorFTDI::I2CSendByte(uint8_t byte_I, bool wait_I) {
   if (status != FT_OK) SCALAR_TRACE(Error, "I2CSendByte direction reset failed (%i)\n", status);
   if (wait_I) TavSleep(kByteWaitSeconds);
 
-  const auto [readStatus, ack] = I2CRead1();
-  if (readStatus != FT_OK) return readStatus;
+  // Plain locals, not a structured binding: the trace's lambda captures
+  // them, which clang before 16 refuses.
+  const std::pair<FT_STATUS, uint8_t> read = I2CRead1();
+  if (read.first != FT_OK) return read.first;
+  const uint8_t ack = read.second;
   if ((ack & 0x01) != 0) {
     SCALAR_TRACE(Error, "I2CSendByte ACK failed (%i)\n", ack);
     return kStatusShortTransfer;

@@ -118,7 +118,10 @@ std::vector<uint8_t> CI2CConnectorFTDI::SendRequest(const std::vector<uint8_t>& 
 
   // The scalar may clock out bytes of its own before the reply's header.
   while (inBuffer.empty()) {
-    const auto [status, byte] = I2CGetByte(true);
+    // Plain locals: the trace's lambda below captures `byte`.
+    const std::pair<FT_STATUS, uint8_t> read = I2CGetByte(true);
+    const FT_STATUS status = read.first;
+    const uint8_t byte = read.second;
     if (status != FT_OK) {
       I2CStop();
       SCALAR_TRACE(Error, "CI2CConnectorFTDI::SendRequest: Read I2CGetByte header failed\n");
