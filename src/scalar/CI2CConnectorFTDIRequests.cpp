@@ -30,6 +30,17 @@ constexpr uint16_t kEDIDBlocks = 16;
 constexpr size_t kEDIDBlockReplySize = 19;
 constexpr size_t kMultiPartReserve = 1024;
 
+// A read by offset goes on only while each reply adds data within what a
+// 16-bit offset can address: a scalar that answers without data, or without
+// end, would otherwise keep the update waiting for ever.
+bool Advances(size_t gathered_I, uint16_t offset_I) {
+  if (gathered_I > offset_I && gathered_I <= 0xFFFF) return true;
+  TavLog::Warning(
+      "Read by offset stopped at %u bytes: the scalar's reply added no data or ran past 64 KiB\n",
+      static_cast<unsigned int>(gathered_I));
+  return false;
+}
+
 constexpr double kSerialRetrySeconds = 1.0;
 constexpr double kFWVersionRetrySeconds = 0.05;
 
@@ -212,6 +223,7 @@ std::vector<uint8_t> CI2CConnectorFTDI::ReadEDIDByOffset(SENSOR_ID sid_I) {
     CheckAndDropChecksum(data, "ReadEDID: read checksum mismatch",
                          "ReadEDID:Read checksum failed\n");
     AppendFrom(edid, data, kOffsetReplyData);
+    if (!Advances(edid.size(), offset)) return edid;
     offset = static_cast<uint16_t>(edid.size());
   }
 }
@@ -348,6 +360,7 @@ std::string GatherCapabilities(BuildRequest build_I, SendFunction send_I, bool r
     CheckAndDropChecksum(reply, "CapabilitiesString read checksum mismatch",
                          "CapabilitiesString:Read checksum failed\n");
     AppendFrom(gathered, reply, kOffsetReplyData);
+    if (!Advances(gathered.size(), offset)) return Connector::ValidateCapabilitiesString(gathered);
     offset = static_cast<uint16_t>(gathered.size());
   }
 }

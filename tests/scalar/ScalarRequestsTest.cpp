@@ -72,6 +72,8 @@ TEST_F(ScalarRequestsTest, EDIDIsReadByOffsetUntilTheScalarEchoesIt) {
            {Reply(Text("0123456789ABCDEF")), Chunk(0xE3, 0, "x")}, "0123456789ABCDEF", 2, false},
           {"no block read falls back to offsets", 0x7A5D0355,
            {Chunk(0xE3, 0, "x"), Chunk(0xE3, 0, "edid"), Chunk(0xE3, 4, "")}, "edid", 3, false},
+          {"a reply for another offset adds nothing and ends the read", other,
+           {Chunk(0xE3, 0, "ab"), Chunk(0xE3, 9, ""), Chunk(0xE3, 9, "")}, "ab", 2, false},
       };
   // clang-format on
   for (const auto& [name, sid, replies, edid, requests, warned] : rows) {
