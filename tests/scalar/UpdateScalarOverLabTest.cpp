@@ -142,7 +142,7 @@ TEST_F(UpdateScalarOverLab, EachVariantEndsWithTheImageInFlashBlockForBlock) {
   }
 }
 
-TEST_F(UpdateScalarOverLab, ABlockThatNeverErasesExhaustsItsTriesAndTheUpdateFails) {
+TEST_F(UpdateScalarOverLab, AFlashThatNeverErasesOrStaysBusyFailsTheUpdateUntouched) {
   const auto bridges = Plug({"display-ftdi"});
   const std::vector<uint8_t> before = bridges[0]->GetFlash().GetData();
   // Configured as the Venus board: its sequence leaves this board's flash
@@ -155,6 +155,14 @@ TEST_F(UpdateScalarOverLab, ABlockThatNeverErasesExhaustsItsTriesAndTheUpdateFai
   EXPECT_EQ(mRecorder.errors.end()[-2], "Exausted retries attempting to write block 2");
   EXPECT_EQ(mRecorder.errors.back(), "General Program Failure");
   EXPECT_EQ(bridges[0]->GetFlash().GetData(), before);
+
+  // A busy bit that never clears ends the run before anything is erased.
+  const auto stuck = Plug({"display-ftdi"});
+  mBus->AddFaults({Fault("stuck-busy")}, 1);
+  EXPECT_FALSE(Update(0x0701, "LABFT0701"));
+  EXPECT_EQ(mRecorder.errors, (Strings{"Timed out waiting for bit change", "Disable SW WP Fail",
+                                       "General Program Failure"}));
+  EXPECT_EQ(stuck[0]->GetFlash().GetData(), before);
 }
 
 TEST_F(UpdateScalarOverLab, OnlyTheBridgeWithTheSerialIsKeptOpen) {
