@@ -36,16 +36,6 @@ TEST_F(ClockInstalled, TasksRunOnAnotherThreadInDueOrderBeforeTheSleepPastThemRe
   EXPECT_DOUBLE_EQ(mClock->Now(), 5.5);
 }
 
-TEST_F(ClockInstalled, PollUntilStopsAtTheAnswerOrTheTimeout) {
-  int calls = 0;
-  EXPECT_TRUE(TavPollUntil(10, 1, [&] { return ++calls == 4; }));
-  EXPECT_EQ(calls, 4);
-  EXPECT_DOUBLE_EQ(mClock->Now(), 3.0);
-  calls = 0;
-  EXPECT_FALSE(TavPollUntil(5, 1, [&] { return ++calls < 0; }));
-  EXPECT_EQ(calls, 6);  // asked at 0,1,...,5
-}
-
 TEST(SteadyClock, ScheduleRunsAfterRealDelayAndPendingTasksDieWithTheClock) {
   std::atomic<bool> ran{false};
   std::atomic<bool> dropped{false};
