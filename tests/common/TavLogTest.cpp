@@ -3,17 +3,6 @@
 #include "common/TavLog.h"
 #include "support/LogCapture.h"
 
-TEST(TavLog, FormatWithLevelPutsTheTagAndOneBlankBeforeTheText) {
-  // Level 5 has no use and unknown levels fall back to the same tag.
-  const struct {
-    int level;
-    const char* text;
-    const char* expected;
-  } cases[] = {{0, "x", "[D] x"}, {4, "%d", "[E] %d"}, {8, "", "[*] "},
-               {5, "t", "[U] t"}, {99, "t", "[U] t"},  {-1, "t", "[U] t"}};
-  for (const auto& c : cases) EXPECT_EQ(TavLog::FormatWithLevel(c.level, c.text), c.expected);
-}
-
 TEST(TavLog, LevelsFormatTheirArgumentsAndOnlyDebugTagsTheStartOfALine) {
   TavLog::ResetLineState();
   LogCapture capture;

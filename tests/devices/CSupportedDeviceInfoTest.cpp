@@ -48,11 +48,6 @@ struct ConfigFile : CTempFolder {
   std::string Path() const { return CTempFolder::Path("fw_loader.ini"); }
 };
 
-constexpr const char* kTwoProducts = R"([
-  {"name": "Slate", "penBoard": {"pid": "0x300", "update": "slate.pen"}},
-  {"name": "Easel", "penBoard": {"pid": "301"}, "touchBoard": {"pid": "302"}}
-])";
-
 }  // namespace
 
 TEST(CSupportedDeviceInfoTest, BoardsLeftOutKeepTheDeviceDefaultsAndBoardsGivenTakeTheirOwn) {
@@ -143,7 +138,7 @@ TEST(CSupportedDeviceInfoTest, LoaderBoardReplacesThePenIdentityButNotItsFileOrF
   EXPECT_FALSE(beside.getPenIntoBLMode());
 }
 
-TEST(CSupportedDeviceInfoTest, ProductsAreStoredUnderThePlainSumOfEachBoardsIds) {
+TEST(CSupportedDeviceInfoTest, ProductsAreStoredUnderThePlainSumOfEachBoardsIdsLaterOnesWinning) {
   LogCapture log;
   CSupportedDeviceInfo info;
   CSupportedDeviceInfo::DeviceMap devices = info.ParseDevices(Products(R"([
@@ -154,10 +149,12 @@ TEST(CSupportedDeviceInfoTest, ProductsAreStoredUnderThePlainSumOfEachBoardsIds)
     {"name": "Display", "penBoard": {"pid": "400"}, "scalarBoard": {"pid": "1060"}},
     {"name": "Display2", "penBoard": {"pid": "401", "usagePg": "FF00"},
      "scalarBoard": {"pid": "1063"}},
-    {"name": "Nameless board"}
+    {"name": "Nameless board"},
+    {"name": "Loader", "loaderBoard": {"pid": "95"}},
+    {"name": "Later", "penBoard": {"pid": "300"}, "scalarBoard": {"pid": "1", "sectors": 64}}
   ])"));
 
-  ASSERT_EQ(devices.count(0x7A5D + 0x300), 1u);
+  EXPECT_EQ(devices[0x7A5D + 0x300].GetDeviceName(), "Later");
   EXPECT_EQ(devices[0x7A5D + 0x301].GetDeviceName(), "Tablet");
   EXPECT_EQ(devices[0x7A5D + 0x302].GetDeviceName(), "Tablet");
   // Each key holds the whole product.
@@ -173,21 +170,11 @@ TEST(CSupportedDeviceInfoTest, ProductsAreStoredUnderThePlainSumOfEachBoardsIds)
 
   // An element with neither pen nor loader board lands on key 0.
   EXPECT_EQ(devices[0].GetDeviceName(), "Nameless board");
-  EXPECT_EQ(devices.size(), 9u);
-}
-
-TEST(CSupportedDeviceInfoTest, LaterElementsWinCollisionsAndScalarSectorsNeverReachADevice) {
-  CSupportedDeviceInfo info;
-  CSupportedDeviceInfo::DeviceMap devices = info.ParseDevices(Products(R"([
-    {"name": "First", "penBoard": {"pid": "300"}},
-    {"name": "Loader", "loaderBoard": {"pid": "95"}},
-    {"name": "Second", "penBoard": {"pid": "300"}, "scalarBoard": {"pid": "1", "sectors": 64}}
-  ])"));
-  EXPECT_EQ(devices[0x7A5D + 0x300].GetDeviceName(), "Second");
   EXPECT_TRUE(devices[0x7A5D + 0x95].GetIsFlashLoader());
   // Stored by assignment: the scalar sectors of a map entry stay as they were.
   EXPECT_EQ(devices[0x7A5D + 0x300].GetScalarFlashSectors(), 0u);
   EXPECT_EQ(devices[0x5B27 + 1 + 0xFF00].GetScalarFlashSectors(), 0u);
+  EXPECT_EQ(devices.size(), 11u);
   EXPECT_TRUE(info.ParseDevices(nullptr).empty());
 }
 
@@ -219,27 +206,6 @@ TEST(CSupportedDeviceInfoTest, HexTextsFollowTheStreamRulesAndInterfaceWordsAreE
   EXPECT_EQ(device.GetScalarVendorId(), 0x5B27u);
 }
 
-TEST(CSupportedDeviceInfoTest, LookupsCompareOnlyTheSumAndListEveryKeyInOrder) {
-  CSupportedDeviceInfo info;
-  ConfigFile file;
-  file.Write(kTwoProducts);
-  info.SetConfigPath(file.Path());
-  ASSERT_TRUE(info.ParseConfig());
-
-  EXPECT_EQ(info.FindDevice(0x7A5D, 0x300).GetDeviceName(), "Slate");
-  EXPECT_EQ(info.FindDevice(0x7A5D, 0x300).GetPenUpdate(), "slate.pen");
-  // Any pair with the same sum finds the entry.
-  EXPECT_EQ(info.FindDevice(0x7A5D + 0x300, 0).GetDeviceName(), "Slate");
-  EXPECT_EQ(info.FindDevice(0x7A5D, 0x302).GetDeviceName(), "Easel");
-  EXPECT_FALSE(info.FindDevice(0x7A5D, 0x303).IsValid());
-
-  std::vector<CDevice> all = info.GetAllDevices();
-  ASSERT_EQ(all.size(), 3u);
-  EXPECT_EQ(all[0].GetDeviceName(), "Slate");
-  EXPECT_EQ(all[1].GetDeviceName(), "Easel");
-  EXPECT_EQ(all[2].GetDeviceName(), "Easel");
-}
-
 TEST(CSupportedDeviceInfoTest, OnlyAnArrayOfProductsParsesAndEachParseStartsFromNothing) {
   LogCapture log;
   ConfigFile file;
@@ -254,12 +220,20 @@ TEST(CSupportedDeviceInfoTest, OnlyAnArrayOfProductsParsesAndEachParseStartsFrom
   }
   EXPECT_FALSE(info.IsValid());
 
-  // Elements that are no objects are skipped, and reach no key.
-  file.Write(R"([42, "text", null, [], {"name": "Slate", "penBoard": {"pid": "300"}}])");
+  // Elements that are no objects are skipped, and reach no key. Lookups
+  // compare only the sum, and every key is listed in order.
+  file.Write(R"([42, "text", null, [], {"name": "Slate", "penBoard": {"pid": "0x300",
+    "update": "slate.pen"}}, {"name": "Easel", "penBoard": {"pid": "301"},
+    "touchBoard": {"pid": "302"}}])");
   ASSERT_TRUE(info.ParseConfig());
-  EXPECT_EQ(info.GetAllDevices().size(), 1u);
-  EXPECT_EQ(info.FindDevice(0x7A5D, 0x300).GetDeviceName(), "Slate");
+  EXPECT_EQ(info.FindDevice(0x7A5D, 0x300).GetPenUpdate(), "slate.pen");
+  EXPECT_EQ(info.FindDevice(0x7A5D + 0x300, 0).GetDeviceName(), "Slate");
+  EXPECT_EQ(info.FindDevice(0x7A5D, 0x302).GetDeviceName(), "Easel");
+  EXPECT_FALSE(info.FindDevice(0x7A5D, 0x303).IsValid());
   EXPECT_FALSE(info.FindDevice(0, 0).IsValid());
+  std::vector<std::string> names;
+  for (const CDevice& device : info.GetAllDevices()) names.push_back(device.GetDeviceName());
+  EXPECT_EQ(names, (std::vector<std::string>{"Slate", "Easel", "Easel"}));
 
   // A failed read afterwards empties the map.
   fs::remove(file.Path());

@@ -183,22 +183,6 @@ TEST_F(DiscoveryRules, ParentsMatchAtTheTopologyOfEachBoard) {
   EXPECT_EQ(IOUtils::AncestorLocationId(0x01234000, 9), 0x01000000u);
 }
 
-TEST(DiscoverySearch, CriteriaMatchTheFieldsTheyGiveAndResultsAreKeptOnce) {
-  CListedRegistry registry;
-  registry.AddHid({0x7A5D, 0x100, 0x01100000, 1, 0xFF00});
-  registry.AddHid({0x7A5D, 0x100, 0x01100000, 2, 0x000D});
-  registry.AddHid({0x5B27, 0x200, 0x01200000, 0xA, 0xFF00});
-  registry.AddHid({0, 0x300, 0x01300000, 0xA, 0xFF00});
-
-  const std::vector<DeviceInfo> found = IOUtils::FindMatchedDevicesMultiple(
-      registry, {{0x7A5D, 0, 0, 1, 0xFF00}, {0x7A5D, 0, 0, 0, 0}, {0, 0, 0, 0xA, 0xFF00}});
-  ASSERT_EQ(found.size(), 3u);
-  EXPECT_EQ(found[0].usage, 1u);
-  EXPECT_EQ(found[1].usage, 2u);
-  // The vendor is always part of a criterion, even when it is 0.
-  EXPECT_EQ(found[2].productId, 0x300u);
-}
-
 TEST_F(DiscoveryRules, TheUsbPassKeepsTheGuardAndTakesLoadersOnlyOnTheirOwnTransport) {
   // The guarded product behind another hub, on a root port, and behind its own.
   mRegistry->usb = {SUsbEntry{0x7A5D, 0xFA, BehindHub(1), 0, 0x7A5D, 0xF8},
