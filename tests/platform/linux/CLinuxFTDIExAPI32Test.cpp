@@ -1,16 +1,25 @@
 // The libftdi1 form of the FTDI bridge seam against umockdev: real libftdi
 // and libusb traffic to an emulated FT232H that the lab's bridge answers,
-// driven with the raw MPSSE byte strings of an I2C host.
+// driven with the raw MPSSE byte strings of an I2C host, and a whole
+// scalar update carried through it.
 
 #include <gtest/gtest.h>
+#include <sys/prctl.h>
 
+#include <algorithm>
 #include <numeric>
 
+#include "firmware/FirmwareFiles.h"
+#include "lab/CLabDeviceRegistry.h"
+#include "lab/CLabHidNode.h"
 #include "lab/CLabProducts.h"
+#include "lab/CLabUsbControl.h"
+#include "platform/linux/CLinuxDiscovery.h"
 #include "platform/linux/CLinuxFTDIExAPI32.h"
 #include "platform/linux/UmockdevFTDI.h"
 #include "scalar/CI2CConnectorFTDI.h"
 #include "support/LabFixture.h"
+#include "update/CLinuxUpdateController.h"
 
 namespace {
 
@@ -54,6 +63,10 @@ class LinuxFTDI : public LabFixture {
  protected:
   void SetUp() override {
     ASSERT_TRUE(CEmulatedUsbBus::IsEmulated()) << "run under umockdev-wrapper";
+    // umockdev's client waits for its handler with usleep(0), which the
+    // default 50 us timer slack turns into a real sleep per round trip: a
+    // scalar block's 200,000 transfers would take minutes instead of seconds.
+    prctl(PR_SET_TIMERSLACK, 1UL);
     LabFixture::SetUp();
     CLabProducts::Plug(*mBus, "display-ftdi");
     mBridge = std::dynamic_pointer_cast<CLabFTDIBridge>(mBus->FindBoard("display-ftdi-scalar"));
@@ -221,6 +234,32 @@ TEST_F(LinuxFTDI, FailedTransfersGiveIOErrorsAndAnUnpluggedBridgeIsNoLongerFound
   EXPECT_EQ(mApi->FT_OpenEx(ByValue(kLocation), FT_OPEN_BY_LOCATION, &again), FT_DEVICE_NOT_FOUND);
   EXPECT_EQ(mApi->FT_Close(mHandle), FT_OK);
   EXPECT_EQ(mApi->FT_Close(mHandle), FT_INVALID_HANDLE);
+}
+
+TEST_F(LinuxFTDI, CarriesAScalarUpdateFromDiscoveryToTheProgrammedFlash) {
+  CI2CConnectorFTDI::SetApi(mApi.get());
+  auto discovery = std::make_unique<CLinuxDiscovery>(
+      std::make_shared<CLabDeviceRegistry>(mBus),
+      [this] { return std::make_unique<CLabHidNode>(mBus); },
+      [this] { return std::make_unique<CLabUsbControl>(mBus); });
+  discovery->SetConfig(TAV_DATA_DIR "/fw_loader.ini");
+  CLinuxUpdateController controller(std::move(discovery));
+  ASSERT_TRUE(controller.UpdateDeviceList());
+  ASSERT_TRUE(controller.SetSelectedDevice(0x7A5D, 0x0701));
+  controller.SetUpdateType(EUPDATE_SCALAR_FTDI);
+
+  // One 64 KiB block, the least an image holds: every byte of it crosses
+  // libusb as the link's own transfers.
+  std::vector<uint8_t> image(65536);
+  for (size_t i = 0; i < image.size(); ++i) image[i] = static_cast<uint8_t>(i * 7 + (i >> 8));
+  CTempFolder folder;
+  ASSERT_TRUE(controller.SetUpdateFile(folder.Write("scalar.bin", image)));
+  EXPECT_TRUE(controller.UpdateScalar("LABFT0701", 0, false, std::string()));
+  EXPECT_EQ(controller.GetState(), ESTATE_SUCCESS);
+  const std::vector<uint8_t>& flash = mBridge->GetFlash().GetData();
+  ASSERT_GE(flash.size(), image.size());
+  EXPECT_TRUE(std::equal(image.begin(), image.end(), flash.begin()));
+  EXPECT_EQ(mBridge->GetViolations(), std::vector<std::string>{});
 }
 
 }  // namespace
