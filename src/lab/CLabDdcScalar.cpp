@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstdio>
+#include <cstring>
 
 #include "common/CClock.h"
 #include "lab/LabRelease.h"
@@ -41,10 +42,12 @@ std::string Hex(unsigned value_I) {
 }  // namespace
 
 CLabDdcScalar::CLabDdcScalar(SLabPanel panel_I, uint16_t shippedRelease_I,
-                             const CLabSerialFlash& flash_I, LabViolationSink sink_I)
+                             const CLabSerialFlash& flash_I, CLabFaults& faults_I,
+                             LabViolationSink sink_I)
     : mPanel(std::move(panel_I)),
       mShippedRelease(shippedRelease_I),
       mFlash(flash_I),
+      mFaults(faults_I),
       mViolation(std::move(sink_I)),
       mEdid(MakeLabEdid(mPanel)),
       mReply(kNullReply) {}
@@ -75,6 +78,15 @@ bool CLabDdcScalar::OnAddress(uint8_t address_I) {
   mReading = address_I == kReplyAddress;
   mRequest.assign(1, address_I);
   mSent = 0;
+  mLeading.clear();
+  mLeadingSent = 0;
+  mHeldBack = false;
+  if (mReading && mFaults.TakeNotReady()) {
+    mLeading = {0x00};
+    mHeldBack = true;
+  } else if (mReading && mFaults.TakeStale()) {
+    mLeading = {kReplyAddress, kHostSource};
+  }
   return true;
 }
 
@@ -87,12 +99,16 @@ bool CLabDdcScalar::OnWrite(uint8_t byte_I) {
   return true;
 }
 
-uint8_t CLabDdcScalar::OnRead() { return mSent < mReply.size() ? mReply[mSent++] : 0xFF; }
+uint8_t CLabDdcScalar::OnRead() {
+  if (mLeadingSent < mLeading.size()) return mLeading[mLeadingSent++];
+  if (mHeldBack) return 0x00;
+  return mSent < mReply.size() ? mReply[mSent++] : 0xFF;
+}
 
 void CLabDdcScalar::OnEnd(bool refused_I) {
   if (mReading) {
     // A reply is read once.
-    if (mSent > 0) mReply = kNullReply;
+    if (mSent > 0 && !mHeldBack) mReply = kNullReply;
   } else if (!refused_I && mRequest.size() > 1) {
     TakeRequest();
   }
@@ -142,8 +158,9 @@ void CLabDdcScalar::TakeRequest() {
     payload.insert(payload.end(), record.begin(), record.end());
     Answer(payload);
   } else if (is({0xE2, 0xF3}, 4) || is({0xF3}, 3)) {
-    const std::string caps = CapabilitiesString();
-    AnswerPiece(std::vector<uint8_t>(caps.begin(), caps.end()), {p[p.size() - 2], p.back()});
+    const char* caps = CapabilitiesString();
+    AnswerPiece(std::vector<uint8_t>(caps, caps + std::strlen(caps) + 1),
+                {p[p.size() - 2], p.back()});
   } else if (is({0x01, 0xC9}, 2)) {
     const uint32_t version = FromBcd(mRelease >> 8) << 16 | FromBcd(mRelease & 0xFF) << 8;
     Answer({0x02, 0x00, 0xC9, 0x00, static_cast<uint8_t>(version >> 24),

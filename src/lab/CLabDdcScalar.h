@@ -17,7 +17,9 @@
 //                 code (low byte first) at 2, the name at 14, the serial at
 //                 27, each ended by a zero byte
 //   E2 F3 hi lo,
-//   F3 hi lo      the capabilities string from offset hi:lo, as the EDID
+//   F3 hi lo      the capabilities string from offset hi:lo, as the EDID;
+//                 the string is sent with its terminating zero byte, as
+//                 scalars store it
 //   01 C9         firmware version: 02 00 C9 00, then the version as a 32-bit
 //                 number, high byte first: major << 16 | minor << 8, the two
 //                 digits pairs of the release the flash names (0x0110: 1.10)
@@ -33,6 +35,10 @@
 // it acknowledges nothing for kBootSeconds of clock time while it boots; a
 // lab run finds it long started. The host's reset therefore reads no reply.
 //
+// Faults (not-ready@N, stale@N) count the replies the host reads: a reply
+// not ready yet starts with a zero byte and stays for the next read; a
+// stale reply has two leftover bytes ahead of its header.
+//
 // Violations: a request with a wrong checksum, source or length, and a
 // request the scalar does not know. A request cut short by a refused byte
 // is dropped silently: the host gave it up.
@@ -41,6 +47,7 @@
 #include <string>
 #include <vector>
 
+#include "lab/CLabFaults.h"
 #include "lab/CLabI2CBus.h"
 #include "lab/CLabSerialFlash.h"
 #include "lab/LabEdid.h"
@@ -50,7 +57,7 @@ class CLabDdcScalar : public CLabI2CDevice {
   static constexpr double kBootSeconds = 0.2;
 
   CLabDdcScalar(SLabPanel panel_I, uint16_t shippedRelease_I, const CLabSerialFlash& flash_I,
-                LabViolationSink sink_I);
+                CLabFaults& faults_I, LabViolationSink sink_I);
 
   // Starts the firmware in the flash; it answers nothing for
   // `quietSeconds_I` (a power-on finds it long started).
@@ -80,6 +87,7 @@ class CLabDdcScalar : public CLabI2CDevice {
   SLabPanel mPanel;
   uint16_t mShippedRelease;
   const CLabSerialFlash& mFlash;
+  CLabFaults& mFaults;
   LabViolationSink mViolation;
   std::vector<uint8_t> mEdid;
 
@@ -90,6 +98,9 @@ class CLabDdcScalar : public CLabI2CDevice {
   bool mReading = false;
   std::vector<uint8_t> mReply;
   size_t mSent = 0;
+  std::vector<uint8_t> mLeading;  // what a faulty read sends ahead of the reply
+  size_t mLeadingSent = 0;
+  bool mHeldBack = false;  // the reply was not ready for this read
   size_t mSaves = 0;
   size_t mResets = 0;
 };

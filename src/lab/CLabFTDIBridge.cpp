@@ -6,7 +6,7 @@ CLabFTDIBridge::CLabFTDIBridge(SLabFTDIDescription description_I)
       mFlash(kFlashBlocks, mDescription.variant == ELabScalarVariant::eQuanta, Sink()),
       mBus(Sink()),
       mEngine(mBus),
-      mScalar(mDescription.panel, kShippedRelease, mFlash, Sink()),
+      mScalar(mDescription.panel, kShippedRelease, mFlash, Faults(), Sink()),
       mMcu(mDescription.variant, mFlash, Faults(), Sink(), [this] { Restart(); }) {
   mBus.Attach(&mScalar);
   mBus.Attach(&mMcu);

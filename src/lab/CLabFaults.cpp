@@ -22,6 +22,8 @@ constexpr SKindName kKindNames[] = {
     {ELabFaultKind::eStuckBusy, "stuck-busy"},
     {ELabFaultKind::eCrcMismatch, "crc-mismatch"},
     {ELabFaultKind::eRefuseOpen, "refuse-open"},
+    {ELabFaultKind::eNotReady, "not-ready"},
+    {ELabFaultKind::eStale, "stale"},
 };
 
 bool TakesCount(ELabFaultKind kind_I) {
@@ -114,6 +116,8 @@ void CLabFaults::Add(const SLabFault& fault_I) {
     case ELabFaultKind::eStuckBusy: mStuckBusy = true; break;
     case ELabFaultKind::eCrcMismatch: mBadCrcs.push_back(fault_I.count); break;
     case ELabFaultKind::eRefuseOpen: mRefuseOpen = true; break;
+    case ELabFaultKind::eNotReady: mNotReady.push_back(fault_I.count); break;
+    case ELabFaultKind::eStale: mStale.push_back(fault_I.count); break;
   }
 }
 
@@ -128,12 +132,15 @@ void CLabFaults::Clear() {
   mStuckBusy = false;
   mBadCrcs.clear();
   mRefuseOpen = false;
+  mNotReady.clear();
+  mStale.clear();
 }
 
 bool CLabFaults::Empty() const {
   return mVanishAfter == 0 && !mVanishDue && mFailReads == 0 && mFailWrites == 0 && mStalls == 0 &&
          mBusy == 0 && !mRefuseSwitch && mBadDataReports.empty() && mFlakyOneIn == 0 &&
-         mNakBytes.empty() && !mStuckBusy && mBadCrcs.empty() && !mRefuseOpen;
+         mNakBytes.empty() && !mStuckBusy && mBadCrcs.empty() && !mRefuseOpen &&
+         mNotReady.empty() && mStale.empty();
 }
 
 ELabFaultAction CLabFaults::OnReport(bool isRead_I, bool isData_I, bool ownBusy_I) {
@@ -173,3 +180,7 @@ size_t CLabFaults::CorruptOffset(size_t size_I) {
 bool CLabFaults::TakeNak() { return CountDown(mNakBytes); }
 
 bool CLabFaults::TakeCrcMismatch() { return CountDown(mBadCrcs); }
+
+bool CLabFaults::TakeNotReady() { return CountDown(mNotReady); }
+
+bool CLabFaults::TakeStale() { return CountDown(mStale); }

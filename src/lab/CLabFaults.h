@@ -32,6 +32,10 @@
 //   crc-mismatch@N  the Nth CRC the MCU's engine computes is wrong, once
 //   refuse-open   FT_OpenEx finds the bridge but cannot open it
 //                 (FT_DEVICE_NOT_OPENED)
+//   not-ready@N   the Nth reply the host reads is not ready yet: the scalar
+//                 sends a zero byte first, and keeps the reply for the
+//                 next read
+//   stale@N       the Nth reply comes after two stale bytes left on the bus
 //
 // A fault may name its board: KIND@N:board. The generator is seeded, so a
 // run with the same faults and seed fails the same reports.
@@ -54,6 +58,8 @@ enum class ELabFaultKind {
   eStuckBusy,
   eCrcMismatch,
   eRefuseOpen,
+  eNotReady,
+  eStale,
 };
 
 struct SLabFault {
@@ -103,6 +109,9 @@ class CLabFaults {
   // One CRC computed: true when it is to come out wrong.
   bool TakeCrcMismatch();
   bool RefuseOpen() const { return mRefuseOpen; }
+  // One reply read from the scalar: whether it is not ready, or stale.
+  bool TakeNotReady();
+  bool TakeStale();
 
  private:
   uint32_t mVanishAfter = 0;  // 0: no vanish fault
@@ -118,5 +127,7 @@ class CLabFaults {
   bool mStuckBusy = false;
   std::vector<uint32_t> mBadCrcs;  // countdowns, one per crc-mismatch fault
   bool mRefuseOpen = false;
+  std::vector<uint32_t> mNotReady;  // countdowns, one per not-ready fault
+  std::vector<uint32_t> mStale;     // countdowns, one per stale fault
   std::mt19937_64 mRandom{0x7A5Cu};
 };

@@ -1,59 +1,38 @@
 // The libftdi1 form of the FTDI bridge seam against umockdev: real libftdi
 // and libusb traffic to an emulated FT232H that the lab's bridge answers,
-// driven with the raw MPSSE byte strings of an I2C host.
+// from the raw calls of the seam to a whole scalar update carried through it.
 
 #include <gtest/gtest.h>
+#include <sys/prctl.h>
 
-#include <numeric>
+#include <algorithm>
 
+#include "firmware/FirmwareFiles.h"
+#include "lab/CLabDeviceRegistry.h"
+#include "lab/CLabHidNode.h"
 #include "lab/CLabProducts.h"
+#include "lab/CLabUsbControl.h"
+#include "platform/linux/CLinuxDiscovery.h"
 #include "platform/linux/CLinuxFTDIExAPI32.h"
 #include "platform/linux/UmockdevFTDI.h"
 #include "scalar/CI2CConnectorFTDI.h"
 #include "support/LabFixture.h"
+#include "update/CLinuxUpdateController.h"
 
 namespace {
 
 using Bytes = std::vector<uint8_t>;
 
-Bytes operator+(Bytes head_I, const Bytes& tail_I) {
-  head_I.insert(head_I.end(), tail_I.begin(), tail_I.end());
-  return head_I;
-}
-Bytes& operator+=(Bytes& head_IO, const Bytes& tail_I) { return head_IO = head_IO + tail_I; }
-
 void* ByValue(uint32_t value_I) { return reinterpret_cast<void*>(uintptr_t{value_I}); }
-
-// The bus primitives: both lines set by 0x80 value, direction triples.
-Bytes Start() {
-  Bytes bytes;
-  for (uint8_t value : {0x03, 0x01, 0x00}) {
-    for (int i = 0; i < 4; ++i) bytes.insert(bytes.end(), {0x80, value, 0x03});
-  }
-  return bytes;
-}
-Bytes Stop() {
-  Bytes bytes;
-  for (uint8_t value : {0x01, 0x03}) {
-    for (int i = 0; i < 4; ++i) bytes.insert(bytes.end(), {0x80, value, 0x03});
-  }
-  bytes.insert(bytes.end(), {0x80, 0x02, 0x03});
-  return bytes;
-}
-// One byte out and its acknowledge clocked in and sent back at once.
-Bytes SendByte(uint8_t byte_I) {
-  return {0x11, 0x00, 0x00, byte_I, 0x80, 0x00, 0x01, 0x22,
-          0x00, 0x87, 0x80, 0x00,   0x03, 0x80, 0x02, 0x03};
-}
-Bytes GetByte(bool ack_I) {
-  return {0x80, 0x00, 0x01, 0x24, 0x00, 0x00,
-          0x80, 0x00, 0x03, 0x13, 0x00, static_cast<uint8_t>(ack_I ? 0x00 : 0x80)};
-}
 
 class LinuxFTDI : public LabFixture {
  protected:
   void SetUp() override {
     ASSERT_TRUE(CEmulatedUsbBus::IsEmulated()) << "run under umockdev-wrapper";
+    // umockdev's client waits for its handler with usleep(0), which the
+    // default 50 us timer slack turns into a real sleep per round trip: a
+    // scalar block's 200,000 transfers would take minutes instead of seconds.
+    prctl(PR_SET_TIMERSLACK, 1UL);
     LabFixture::SetUp();
     CLabProducts::Plug(*mBus, "display-ftdi");
     mBridge = std::dynamic_pointer_cast<CLabFTDIBridge>(mBus->FindBoard("display-ftdi-scalar"));
@@ -119,7 +98,7 @@ class LinuxFTDI : public LabFixture {
   FT_HANDLE mHandle = nullptr;
 };
 
-TEST_F(LinuxFTDI, TheBridgeIsListedByLocationAndCarriesADisplayInformationRequest) {
+TEST_F(LinuxFTDI, TheBridgeIsListedByItsLocation) {
   uint32_t count = 0;
   ASSERT_EQ(mApi->FT_ListDevices(&count, nullptr, FT_LIST_NUMBER_ONLY), FT_OK);
   EXPECT_EQ(count, 1u);
@@ -129,45 +108,6 @@ TEST_F(LinuxFTDI, TheBridgeIsListedByLocationAndCarriesADisplayInformationReques
   EXPECT_EQ(location, kLocation) << "the registry's rule for bus 1, ports 1.5";
   EXPECT_EQ(mApi->FT_ListDevices(ByValue(1), &location, FT_LIST_BY_INDEX | FT_OPEN_BY_LOCATION),
             FT_DEVICE_NOT_FOUND);
-  Open();
-
-  // Request 0x01 0xF2 to 0x6E, each byte acknowledged.
-  Bytes request{0x6E, 0x51, 0x82, 0x01, 0xF2};
-  request.push_back(std::accumulate(request.begin(), request.end(), uint8_t{0},
-                                    [](uint8_t a, uint8_t b) { return uint8_t(a ^ b); }));
-  Bytes bytes = Start();
-  for (uint8_t byte : request) bytes += SendByte(byte);
-  Send(bytes + Stop());
-  EXPECT_EQ(Take(request.size()), Bytes(request.size(), 0x00)) << "every byte acknowledged";
-
-  // The reply from 0x6F: 56 bytes, the last one refused.
-  constexpr size_t kReply = 56;
-  bytes = Start() + SendByte(0x6F);
-  for (size_t i = 0; i < kReply; ++i) bytes += GetByte(i + 1 < kReply);
-  Send(bytes + Stop());
-  const Bytes answer = Take(1 + kReply);
-  ASSERT_EQ(answer.size(), 1 + kReply);
-  EXPECT_EQ(answer[0] & 1, 0);
-  const Bytes reply(answer.begin() + 1, answer.end());
-  EXPECT_EQ(std::accumulate(reply.begin(), reply.end(), uint8_t{0x50},
-                            [](uint8_t a, uint8_t b) { return uint8_t(a ^ b); }),
-            0);
-  EXPECT_STREQ(reinterpret_cast<const char*>(&reply[3 + 14]), "Lab Display");
-  EXPECT_STREQ(reinterpret_cast<const char*>(&reply[3 + 27]), "LABFT0701");
-  EXPECT_EQ(mBridge->GetViolations(), std::vector<std::string>{});
-  EXPECT_EQ(mApi->FT_Close(mHandle), FT_OK);
-}
-
-TEST_F(LinuxFTDI, TheScalarLinkOpensTheBridgeAndIdentifiesTheDisplay) {
-  CI2CConnectorFTDI::SetApi(mApi.get());
-  ASSERT_EQ(CI2CConnectorFTDI::NumberOfDevices(), 1);
-  CI2CConnectorFTDI link;
-  ASSERT_TRUE(link.Open(0));
-  EXPECT_EQ(link.SerialNumber(0x7A5D0701), "LABFT0701");
-  EXPECT_EQ(link.MonitorName(), "Lab Display");
-  EXPECT_TRUE(link.FWVersion() == FileVersion(1, 0, 0, FileVersion::EFinalVersion, 0));
-  EXPECT_EQ(mBridge->GetViolations(), std::vector<std::string>{});
-  EXPECT_TRUE(link.Close());
 }
 
 TEST_F(LinuxFTDI, ReadsTimeOutShortAndTheBridgeServesOneHandle) {
@@ -221,6 +161,32 @@ TEST_F(LinuxFTDI, FailedTransfersGiveIOErrorsAndAnUnpluggedBridgeIsNoLongerFound
   EXPECT_EQ(mApi->FT_OpenEx(ByValue(kLocation), FT_OPEN_BY_LOCATION, &again), FT_DEVICE_NOT_FOUND);
   EXPECT_EQ(mApi->FT_Close(mHandle), FT_OK);
   EXPECT_EQ(mApi->FT_Close(mHandle), FT_INVALID_HANDLE);
+}
+
+TEST_F(LinuxFTDI, CarriesAScalarUpdateFromDiscoveryToTheProgrammedFlash) {
+  CI2CConnectorFTDI::SetApi(mApi.get());
+  auto discovery = std::make_unique<CLinuxDiscovery>(
+      std::make_shared<CLabDeviceRegistry>(mBus),
+      [this] { return std::make_unique<CLabHidNode>(mBus); },
+      [this] { return std::make_unique<CLabUsbControl>(mBus); });
+  discovery->SetConfig(TAV_DATA_DIR "/fw_loader.ini");
+  CLinuxUpdateController controller(std::move(discovery));
+  ASSERT_TRUE(controller.UpdateDeviceList());
+  ASSERT_TRUE(controller.SetSelectedDevice(0x7A5D, 0x0701));
+  controller.SetUpdateType(EUPDATE_SCALAR_FTDI);
+
+  // One 64 KiB block, the least an image holds: every byte of it crosses
+  // libusb as the link's own transfers.
+  std::vector<uint8_t> image(65536);
+  for (size_t i = 0; i < image.size(); ++i) image[i] = static_cast<uint8_t>(i * 7 + (i >> 8));
+  CTempFolder folder;
+  ASSERT_TRUE(controller.SetUpdateFile(folder.Write("scalar.bin", image)));
+  EXPECT_TRUE(controller.UpdateScalar("LABFT0701", 0, false, std::string()));
+  EXPECT_EQ(controller.GetState(), ESTATE_SUCCESS);
+  const std::vector<uint8_t>& flash = mBridge->GetFlash().GetData();
+  ASSERT_GE(flash.size(), image.size());
+  EXPECT_TRUE(std::equal(image.begin(), image.end(), flash.begin()));
+  EXPECT_EQ(mBridge->GetViolations(), std::vector<std::string>{});
 }
 
 }  // namespace
