@@ -108,6 +108,7 @@ std::optional<SDesktopEntry> Read(const std::string& path_I) {
       std::string name = path_I.substr(path_I.rfind('/') + 1);
       if (StringUtilities::EndsWith(name, ".desktop")) name.resize(name.size() - 8);
       entry.id = name;
+      entry.path = path_I;
       entry.exec = WithoutFieldCodes(trimmed.substr(5));
       const std::vector<std::string> words = SplitExec(entry.exec);
       entry.program = words.empty() ? std::string() : ResolveProgram(words.front());

@@ -65,18 +65,16 @@ TEST_F(LinuxDesktop, ExecLinesSplitLikeTheDesktopEntryFormat) {
   EXPECT_EQ(entry->program, fs::canonical("/bin/sleep").string());
   EXPECT_FALSE(CDesktopEntries::Find("../etc/passwd").has_value());
   EXPECT_FALSE(CDesktopEntries::Find("com.tavik.Missing").has_value());
-  // A notification's name becomes the member of its D-Bus signal.
-  EXPECT_EQ(CLinuxDesktop::SignalMemberFor("com.tavik.TFUCompleted"), "com_tavik_TFUCompleted");
 }
 
 TEST_F(LinuxDesktop, LaunchedApplicationRunsIsNamedAndQuitsOnRequest) {
   WriteEntry("com.tavik.TestDriver", "\"" + mProgram.string() + "\" 30");
   WriteEntry("com.tavik.Broken", (mFolder / "no-such-program").string());
-  EXPECT_FALSE(mDesktop.LaunchApplication("com.tavik.Broken"));
-  EXPECT_FALSE(mDesktop.LaunchApplication("com.tavik.NotInstalled"));
+  EXPECT_EQ(mDesktop.LaunchApplication({"com.tavik.Broken", "", {}}), 0);
+  EXPECT_EQ(mDesktop.LaunchApplication({"com.tavik.NotInstalled", "", {}}), 0);
   EXPECT_TRUE(mDesktop.RunningApplications("com.tavik.TestDriver").empty());
 
-  ASSERT_TRUE(mDesktop.LaunchApplication("com.tavik.TestDriver"));
+  ASSERT_GT(mDesktop.LaunchApplication({"com.tavik.TestDriver", "", {}}), 0);
   std::vector<int> running;
   ASSERT_TRUE(WaitFor([&] {
     running = mDesktop.RunningApplications("com.tavik.TestDriver");
