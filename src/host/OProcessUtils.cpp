@@ -117,14 +117,16 @@ void OProcessUtils::handleNotification(const SNotification& notification_I) {
   }
 }
 
-bool OProcessUtils::applicationIsRunningWithBundleIdentifier(const std::optional<std::string>& id_I) {
+bool OProcessUtils::applicationIsRunningWithBundleIdentifier(
+    const std::optional<std::string>& id_I) {
   return id_I && mDesktop && !mDesktop->RunningApplications(*id_I).empty();
 }
 
 int OProcessUtils::processIDWithBundleID(const std::optional<std::string>& id_I,
                                          bool includingCurrentPID_I) {
   if (!id_I || !includingCurrentPID_I) return -1;
-  const std::vector<int> running = mDesktop ? mDesktop->RunningApplications(*id_I) : std::vector<int>();
+  const std::vector<int> running =
+      mDesktop ? mDesktop->RunningApplications(*id_I) : std::vector<int>();
   return running.empty() ? -2 : running.front();
 }
 

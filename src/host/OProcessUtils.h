@@ -48,8 +48,8 @@ class OProcessUtils {
   bool quitWithBundleIdentifier(const std::optional<std::string>& id_I,
                                 bool includingCurrentApplication_I);
   bool launchWithBundleIdentifier(const std::optional<std::string>& id_I,
-                                  const std::optional<std::string>& path_I,
-                                  unsigned long option_I, bool checkIsRunning_I);
+                                  const std::optional<std::string>& path_I, unsigned long option_I,
+                                  bool checkIsRunning_I);
   // Posts `name_I` as sent by the application of process `pid_I`, with its
   // process id and entry path; false without a name or an application.
   bool postCustomNotification(const std::string& name_I, int pid_I);

@@ -42,8 +42,9 @@ bool LaunchApplicationWithBundleID(const OptionalText& bundleId_I, const Optiona
   // Running means the process runs the application's program, not just
   // that it was forked.
   const bool running = pid > 0 && TavPollUntil(kLaunchWaitSeconds, kLaunchPollSeconds, [&] {
-                         return bundleId_I ? Contains(desktop->RunningApplications(*bundleId_I), pid)
-                                           : desktop->IsApplicationProcess(pid);
+                         return bundleId_I
+                                    ? Contains(desktop->RunningApplications(*bundleId_I), pid)
+                                    : desktop->IsApplicationProcess(pid);
                        });
   if (!running) return false;
 

@@ -27,7 +27,8 @@ void CLabDesktop::Save() const {
   CLabStateFile state;
   state.PutNumber("next-pid", static_cast<uint64_t>(mNextPid));
   for (const auto& [id, pid] : mRunning) state.PutNumber("pid:" + id, static_cast<uint64_t>(pid));
-  if (!state.Save(mStatePath)) TavLog::Warning("Lab desktop state not saved: %s\n", mStatePath.c_str());
+  if (!state.Save(mStatePath))
+    TavLog::Warning("Lab desktop state not saved: %s\n", mStatePath.c_str());
 }
 
 std::string CLabDesktop::RunningIdOf(int pid_I) const {
@@ -91,8 +92,10 @@ bool CLabDesktop::IsTerminated(int pid_I) {
 int CLabDesktop::LaunchApplication(const SLaunchRequest& request_I) {
   std::string id = request_I.applicationId;
   const std::string& entry = request_I.entryPath;
-  if (entry.rfind(kEntryPrefix, 0) == 0 && entry.size() > kEntryPrefix.size() + kEntrySuffix.size()) {
-    id = entry.substr(kEntryPrefix.size(), entry.size() - kEntryPrefix.size() - kEntrySuffix.size());
+  if (entry.rfind(kEntryPrefix, 0) == 0 &&
+      entry.size() > kEntryPrefix.size() + kEntrySuffix.size()) {
+    id =
+        entry.substr(kEntryPrefix.size(), entry.size() - kEntryPrefix.size() - kEntrySuffix.size());
   } else if (!entry.empty()) {
     return 0;  // no such entry in the lab
   }

@@ -17,8 +17,8 @@
 class CLabDesktop : public CDesktop {
  public:
   // The applications installed, each running at first.
-  static constexpr const char* kApplications[] = {
-      "com.tavik.taviktablet", "com.tavik.TabletDriver", "com.tavik.TavikTouchDriver"};
+  static constexpr const char* kApplications[] = {"com.tavik.taviktablet", "com.tavik.TabletDriver",
+                                                  "com.tavik.TavikTouchDriver"};
   // This program's own lab process id; the applications' ids come after it.
   static constexpr int kOwnPid = 1000;
 

@@ -26,9 +26,13 @@ TEST_F(ProcessControl, ProcessIdAnswersKeepARefusedQuestionApartFromAMissingAppl
   const int driver = DriverPid();
   // identifier, including the current process, answer
   const std::vector<std::tuple<std::optional<std::string>, bool, int>> rows = {
-      {std::nullopt, true, -1}, {kDriver, false, -1}, {"com.tavik.Missing", true, -2}, {kDriver, true, driver}};
+      {std::nullopt, true, -1},
+      {kDriver, false, -1},
+      {"com.tavik.Missing", true, -2},
+      {kDriver, true, driver}};
   for (const auto& [id, including, answer] : rows) {
-    EXPECT_EQ(utils->processIDWithBundleID(id, including), answer) << id.value_or("null") << including;
+    EXPECT_EQ(utils->processIDWithBundleID(id, including), answer)
+        << id.value_or("null") << including;
   }
   // Named for a path, it gives the identifier; the object's own gives the entry.
   EXPECT_EQ(ProcessUtils::GetBundlePathForProcessWithBundleID(kDriver), kDriver);
@@ -61,19 +65,23 @@ TEST_F(ProcessControl, OnlyAQuitThatIncludesTheCurrentApplicationQuitsAndItsNoti
 
 TEST_F(ProcessControl, LaunchStartsOnlyWhatIsNotRunningAndWatchesItsQuit) {
   const size_t watched = OProcessUtils::GetInstance()->GetObserverCount();
-  EXPECT_FALSE(ProcessUtils::LaunchApplicationWithBundleID(kDriver, std::nullopt, 65536, true, std::nullopt));
-  EXPECT_FALSE(ProcessUtils::LaunchApplicationWithBundleID(std::nullopt, "", 0, false, std::nullopt));
-  EXPECT_FALSE(ProcessUtils::LaunchApplicationWithBundleID("com.tavik.Missing", std::nullopt, 0, false, std::nullopt));
+  EXPECT_FALSE(ProcessUtils::LaunchApplicationWithBundleID(kDriver, std::nullopt, 65536, true,
+                                                           std::nullopt));
+  EXPECT_FALSE(
+      ProcessUtils::LaunchApplicationWithBundleID(std::nullopt, "", 0, false, std::nullopt));
+  EXPECT_FALSE(ProcessUtils::LaunchApplicationWithBundleID("com.tavik.Missing", std::nullopt, 0,
+                                                           false, std::nullopt));
 
   mDesktop->TerminateApplication(DriverPid());
-  EXPECT_TRUE(ProcessUtils::LaunchApplicationWithBundleID(kDriver, std::nullopt, 65536, true, std::nullopt));
+  EXPECT_TRUE(ProcessUtils::LaunchApplicationWithBundleID(kDriver, std::nullopt, 65536, true,
+                                                          std::nullopt));
   EXPECT_TRUE(ProcessUtils::ApplicationIsRunning(kDriver));
   EXPECT_EQ(OProcessUtils::GetInstance()->GetObserverCount(), watched + 1);
   // By its entry alone, the identifier comes from the process started.
   mDesktop->TerminateApplication(DriverPid());
   EXPECT_EQ(OProcessUtils::GetInstance()->GetObserverCount(), watched);
-  EXPECT_TRUE(ProcessUtils::LaunchApplicationWithBundleID(std::nullopt, mDesktop->GetApplicationPath(kDriver), 0,
-                                                          false, std::nullopt));
+  EXPECT_TRUE(ProcessUtils::LaunchApplicationWithBundleID(
+      std::nullopt, mDesktop->GetApplicationPath(kDriver), 0, false, std::nullopt));
   EXPECT_EQ(ProcessUtils::GetBundleIdentifierForProcessWithUnixPID(DriverPid()), kDriver);
 }
 

@@ -56,8 +56,8 @@ namespace CDesktopEntries {
 std::vector<std::string> SearchFolders() {
   std::vector<std::string> folders;
   folders.push_back(EnvOr("XDG_DATA_HOME", HomeFolder() + "/.local/share") + "/applications");
-  for (const std::string& folder :
-       StringUtilities::Tokenize(EnvOr("XDG_DATA_DIRS", "/usr/local/share:/usr/share"), ":", true)) {
+  for (const std::string& folder : StringUtilities::Tokenize(
+           EnvOr("XDG_DATA_DIRS", "/usr/local/share:/usr/share"), ":", true)) {
     folders.push_back(folder + "/applications");
   }
   return folders;

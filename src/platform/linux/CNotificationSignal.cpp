@@ -14,7 +14,8 @@ std::string Replaced(std::string text_I, char from_I, char to_I) {
   return text_I;
 }
 
-int AppendValue(sd_bus_message* signal_I, const std::string& key_I, const NotificationValue& value_I) {
+int AppendValue(sd_bus_message* signal_I, const std::string& key_I,
+                const NotificationValue& value_I) {
   if (const auto* number = std::get_if<int32_t>(&value_I)) {
     return sd_bus_message_append(signal_I, "{sv}", key_I.c_str(), "i", *number);
   }

@@ -11,9 +11,9 @@
 #include <fstream>
 #include <sstream>
 
-#include "platform/linux/CDesktopEntries.h"
 #include "host/OProcessUtils.h"
 #include "host/ProcessUtils.h"
+#include "platform/linux/CDesktopEntries.h"
 #include "platform/linux/CLinuxDesktop.h"
 
 namespace {
@@ -104,7 +104,8 @@ TEST_F(LinuxDesktop, LaunchedApplicationRunsDetachedIsNamedAndQuitsOnRequest) {
   close(held[0]);
   close(held[1]);
   ASSERT_GT(pid, 0);
-  ASSERT_TRUE(WaitFor([&] { return mDesktop.RunningApplications("com.tavik.TestDriver").size() == 1; }));
+  ASSERT_TRUE(
+      WaitFor([&] { return mDesktop.RunningApplications("com.tavik.TestDriver").size() == 1; }));
   EXPECT_EQ(mDesktop.RunningApplications("com.tavik.TestDriver"), std::vector<int>{pid});
 
   const fs::path proc = "/proc/" + std::to_string(pid);
@@ -120,8 +121,12 @@ TEST_F(LinuxDesktop, LaunchedApplicationRunsDetachedIsNamedAndQuitsOnRequest) {
   EXPECT_NE(std::stoi(stat[1]), getpid());
   EXPECT_NE(std::stoi(stat[3]), getsid(0));
   std::ifstream cmdline(proc / "cmdline");
-  std::string arguments((std::istreambuf_iterator<char>(cmdline)), std::istreambuf_iterator<char>());
-  EXPECT_EQ(arguments, mProgram.string() + std::string("\0" "30\0" "1\0", 6));
+  std::string arguments((std::istreambuf_iterator<char>(cmdline)),
+                        std::istreambuf_iterator<char>());
+  EXPECT_EQ(arguments, mProgram.string() + std::string("\0"
+                                                       "30\0"
+                                                       "1\0",
+                                                       6));
 
   EXPECT_EQ(mDesktop.GetApplicationIdOfProcess(pid), "com.tavik.TestDriver");
   EXPECT_TRUE(mDesktop.IsApplicationProcess(pid));
@@ -203,8 +208,8 @@ TEST_F(LinuxDesktop, LaunchCountsOnceTheApplicationShowsWithinAboutASecond) {
   EXPECT_EQ(desktop->RunningApplications("com.tavik.TestDriver"), running);
 
   const auto start = std::chrono::steady_clock::now();
-  EXPECT_FALSE(ProcessUtils::LaunchApplicationWithBundleID("com.tavik.Wrapped", std::nullopt,
-                                                           65536, true, std::nullopt));
+  EXPECT_FALSE(ProcessUtils::LaunchApplicationWithBundleID("com.tavik.Wrapped", std::nullopt, 65536,
+                                                           true, std::nullopt));
   const double waited =
       std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
   EXPECT_GE(waited, 0.9);

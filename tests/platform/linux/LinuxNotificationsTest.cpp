@@ -41,7 +41,8 @@ sd_bus_message* NextSignal(sd_bus* bus_I) {
   for (int i = 0; i < 50; ++i) {
     sd_bus_message* message = nullptr;
     const int status = sd_bus_process(bus_I, &message);
-    if (message != nullptr && sd_bus_message_is_signal(message, "com.tavik.Notification", nullptr) > 0) {
+    if (message != nullptr &&
+        sd_bus_message_is_signal(message, "com.tavik.Notification", nullptr) > 0) {
       return message;
     }
     sd_bus_message_unref(message);
@@ -96,7 +97,8 @@ TEST_F(LinuxNotifications, QuitNoticeTakesOnlyItsOwnProcessOffTheQuitList) {
   OProcessUtils* utils = OProcessUtils::GetInstance();
   utils->setQuitProcessIDList({42, 43});
 
-  mPoster.PostNotification({"TavikApplicationQuitNotification", "com.tavik.Other", {{"processID", 99}}});
+  mPoster.PostNotification(
+      {"TavikApplicationQuitNotification", "com.tavik.Other", {{"processID", 99}}});
   mPoster.PostNotification(
       {"TavikApplicationQuitNotification", "com.tavik.TabletDriver", {{"processID", 42}}});
   EXPECT_TRUE(WaitFor([&] { return utils->quitProcessIDList() == std::vector<int>{43}; }));
