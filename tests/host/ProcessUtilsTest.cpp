@@ -85,4 +85,20 @@ TEST_F(ProcessControl, LaunchStartsOnlyWhatIsNotRunningAndWatchesItsQuit) {
   EXPECT_EQ(ProcessUtils::GetBundleIdentifierForProcessWithUnixPID(DriverPid()), kDriver);
 }
 
+TEST_F(ProcessControl, WorkspaceLaunchNeedsAPathAndAnOptionAndTheNoticeNeedsAnApplication) {
+  OProcessUtils* utils = OProcessUtils::GetInstance();
+  EXPECT_FALSE(utils->launchWithBundleIdentifier(kDriver, std::nullopt, 65536, true));
+  EXPECT_FALSE(utils->launchWithBundleIdentifier(kDriver, "", 0, true));
+  const int before = DriverPid();
+  EXPECT_TRUE(utils->launchWithBundleIdentifier(kDriver, "", 65536, true));  // running: left as is
+  mDesktop->TerminateApplication(before);
+  EXPECT_TRUE(utils->launchWithBundleIdentifier(kDriver, "", 65536, true));
+  EXPECT_NE(DriverPid(), before);
+
+  EXPECT_FALSE(utils->postCustomNotification("", DriverPid()));
+  EXPECT_FALSE(utils->postCustomNotification("com.tavik.Hello", CLabDesktop::kOwnPid));
+  EXPECT_TRUE(utils->postCustomNotification("com.tavik.Hello", DriverPid()));
+  EXPECT_EQ(mDesktop->GetNotifications().back(), "com.tavik.Hello");
+}
+
 }  // namespace
