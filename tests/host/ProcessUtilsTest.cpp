@@ -63,42 +63,4 @@ TEST_F(ProcessControl, OnlyAQuitThatIncludesTheCurrentApplicationQuitsAndItsNoti
   EXPECT_FALSE(utils->quitWithBundleIdentifier(kDriver, true));  // nothing runs
 }
 
-TEST_F(ProcessControl, LaunchStartsOnlyWhatIsNotRunningAndWatchesItsQuit) {
-  const size_t watched = OProcessUtils::GetInstance()->GetObserverCount();
-  EXPECT_FALSE(ProcessUtils::LaunchApplicationWithBundleID(kDriver, std::nullopt, 65536, true,
-                                                           std::nullopt));
-  EXPECT_FALSE(
-      ProcessUtils::LaunchApplicationWithBundleID(std::nullopt, "", 0, false, std::nullopt));
-  EXPECT_FALSE(ProcessUtils::LaunchApplicationWithBundleID("com.tavik.Missing", std::nullopt, 0,
-                                                           false, std::nullopt));
-
-  mDesktop->TerminateApplication(DriverPid());
-  EXPECT_TRUE(ProcessUtils::LaunchApplicationWithBundleID(kDriver, std::nullopt, 65536, true,
-                                                          std::nullopt));
-  EXPECT_TRUE(ProcessUtils::ApplicationIsRunning(kDriver));
-  EXPECT_EQ(OProcessUtils::GetInstance()->GetObserverCount(), watched + 1);
-  // By its entry alone, the identifier comes from the process started.
-  mDesktop->TerminateApplication(DriverPid());
-  EXPECT_EQ(OProcessUtils::GetInstance()->GetObserverCount(), watched);
-  EXPECT_TRUE(ProcessUtils::LaunchApplicationWithBundleID(
-      std::nullopt, mDesktop->GetApplicationPath(kDriver), 0, false, std::nullopt));
-  EXPECT_EQ(ProcessUtils::GetBundleIdentifierForProcessWithUnixPID(DriverPid()), kDriver);
-}
-
-TEST_F(ProcessControl, WorkspaceLaunchNeedsAPathAndAnOptionAndTheNoticeNeedsAnApplication) {
-  OProcessUtils* utils = OProcessUtils::GetInstance();
-  EXPECT_FALSE(utils->launchWithBundleIdentifier(kDriver, std::nullopt, 65536, true));
-  EXPECT_FALSE(utils->launchWithBundleIdentifier(kDriver, "", 0, true));
-  const int before = DriverPid();
-  EXPECT_TRUE(utils->launchWithBundleIdentifier(kDriver, "", 65536, true));  // running: left as is
-  mDesktop->TerminateApplication(before);
-  EXPECT_TRUE(utils->launchWithBundleIdentifier(kDriver, "", 65536, true));
-  EXPECT_NE(DriverPid(), before);
-
-  EXPECT_FALSE(utils->postCustomNotification("", DriverPid()));
-  EXPECT_FALSE(utils->postCustomNotification("com.tavik.Hello", CLabDesktop::kOwnPid));
-  EXPECT_TRUE(utils->postCustomNotification("com.tavik.Hello", DriverPid()));
-  EXPECT_EQ(mDesktop->GetNotifications().back(), "com.tavik.Hello");
-}
-
 }  // namespace
