@@ -37,7 +37,8 @@ for id in $drivers; do
     >"$WORK/data/applications/$id.desktop"
 done
 SECONDS=0
-out="$(XDG_DATA_HOME="$WORK/data" XDG_DATA_DIRS="$WORK/none" DBUS_SESSION_BUS_ADDRESS=unix:path=/nonexistent \
+out="$(XDG_DATA_HOME="$WORK/data" XDG_DATA_DIRS="$WORK/none" XDG_CONFIG_HOME="$WORK/config" \
+  DBUS_SESSION_BUS_ADDRESS=unix:path=/nonexistent \
   "$PROGRAM" --headless --yes -p "" </dev/null 2>&1)"
 took=$SECONDS
 [ "$took" -lt 40 ] || fail "the output was held open for $took s after the run"

@@ -184,7 +184,8 @@ int CLinuxDesktop::LaunchApplication(const SLaunchRequest& request_I) {
   const bool failed = read(report[0], &error, sizeof error) > 0;
   close(report[0]);
   if (!gotPid || launched <= 0 || failed) {
-    TavLog::Error("Could not launch %s: %s\n", entry->id.c_str(), TavSysErrStr(error).c_str());
+    TavLog::Error("Could not launch %s: %s\n", entry->id.c_str(),
+                  failed ? TavSysErrStr(error).c_str() : "no process could be made");
     return 0;
   }
   return static_cast<int>(launched);
