@@ -27,8 +27,9 @@ void CLabDesktop::Save() const {
   CLabStateFile state;
   state.PutNumber("next-pid", static_cast<uint64_t>(mNextPid));
   for (const auto& [id, pid] : mRunning) state.PutNumber("pid:" + id, static_cast<uint64_t>(pid));
-  if (!state.Save(mStatePath))
+  if (!state.Save(mStatePath)) {
     TavLog::Warning("Lab desktop state not saved: %s\n", mStatePath.c_str());
+  }
 }
 
 std::string CLabDesktop::RunningIdOf(int pid_I) const {
