@@ -79,7 +79,7 @@ int CUpdateCommand::Run() {
   runSeams.registry = seams->GetRegistry();
   if (seams->GetLabBus()) {
     runSeams.power = std::make_shared<CLabPowerInhibitor>();
-    runSeams.desktop = std::make_shared<CLabDesktop>();
+    runSeams.desktop = std::make_shared<CLabDesktop>(labOptions.GetStateFolder());
   } else {
     runSeams.power = std::make_shared<CLinuxPowerInhibitor>();
     runSeams.desktop = std::make_shared<CLinuxDesktop>(seams->GetRegistry());

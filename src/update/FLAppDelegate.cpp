@@ -11,6 +11,8 @@
 #include "devices/CDevice.h"
 #include "flash/CFLDeviceInterface.h"
 #include "host/CLanguageManager.h"
+#include "host/OProcessUtils.h"
+#include "host/ProcessUtils.h"
 #include "update/OFLUpdater.h"
 
 namespace {
@@ -25,6 +27,9 @@ constexpr double kQuitWaitSeconds = 2.0;
 constexpr double kServiceStopWaitSeconds = 6.0;
 
 const char* const kFamilyPrefix = "com.tavik";
+// The workspace option the driver start has always passed; it asks for
+// nothing a desktop entry knows.
+constexpr unsigned long kDriverLaunchOptions = 65536;
 
 std::string T(const char* key_I) { return TTCLocalizedNSString(key_I); }
 
@@ -42,7 +47,10 @@ const char* OutcomeText(ERunOutcome outcome_I) {
 
 }  // namespace
 
-FLAppDelegate::FLAppDelegate(SApplicationSetup setup_I) : mSetup(std::move(setup_I)) {}
+FLAppDelegate::FLAppDelegate(SApplicationSetup setup_I) : mSetup(std::move(setup_I)) {
+  // The driver is started again through the run's desktop.
+  OProcessUtils::SetDesktop(mSetup.desktop);
+}
 
 void FLAppDelegate::CheckLaunchSender() {
   setUserLaunched(true);
@@ -315,7 +323,7 @@ OUpdaterClient::Request FLAppDelegate::DriverRequest() {
 }
 
 void FLAppDelegate::stopDriver(CDesktop& desktop_I) {
-  desktop_I.PostNotification("com.tavik.removeTavikTablet.closeModalDialog", {});
+  desktop_I.PostNotification({"com.tavik.removeTavikTablet.closeModalDialog", {}, {}});
   if (std::shared_ptr<OUpdaterClient> client = OUpdaterClient::client()) {
     OUpdaterClient::Request request = DriverRequest();
     const std::vector<std::string> bundles = request["BundleID"];
@@ -341,7 +349,8 @@ void FLAppDelegate::startDriver(CDesktop& desktop_I) {
   }
   for (const char* application : kDriverApplications) {
     if (desktop_I.RunningApplications(application).empty()) {
-      desktop_I.LaunchApplication(application);
+      ProcessUtils::LaunchApplicationWithBundleID(application, std::nullopt, kDriverLaunchOptions,
+                                                  true, std::nullopt);
     }
   }
 }
@@ -350,7 +359,7 @@ void FLAppDelegate::applicationWillTerminate() {
   if (mUpdater != nullptr) mUpdater->cleanup();
   if (mSetup.desktop) {
     startDriver(*mSetup.desktop);
-    mSetup.desktop->PostNotification("com.tavik.TFUCompleted", {});
+    mSetup.desktop->PostNotification({"com.tavik.TFUCompleted", {}, {}});
   }
 }
 

@@ -54,6 +54,7 @@ class FLAppDelegate : public CApplicationDelegate {
   void updateProgramText();
 
   static void stopDriver(CDesktop& desktop_I);
+  // Launches through ProcessUtils, over the desktop this object installed.
   static void startDriver(CDesktop& desktop_I);
 
   // A terminal run whose updates all ran without a state that ended the

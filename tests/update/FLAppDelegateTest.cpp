@@ -63,9 +63,12 @@ class CFakeWindow : public CTerminalWindowController {
 class CFakeDesktop : public CDesktop {
  public:
   int GetLaunchSenderPid() override { return mSenderPid; }
+  int GetOwnPid() override { return 1; }
   std::string GetApplicationIdOfProcess(int) override { return mSenderId; }
+  std::string GetExecutableOfProcess(int) override { return std::string(); }
   bool IsApplicationProcess(int) override { return mSenderIsApplication; }
   int GetProcessArgumentCount() override { return mArgumentCount; }
+  std::string GetApplicationPath(const std::string& id_I) override { return "/apps/" + id_I; }
   std::vector<int> RunningApplications(const std::string& id_I) override { return mRunning[id_I]; }
   bool TerminateApplication(int pid_I) override {
     mJournal.Add("quit:" + std::to_string(pid_I));
@@ -73,14 +76,15 @@ class CFakeDesktop : public CDesktop {
     return true;
   }
   bool IsTerminated(int) override { return true; }
-  bool LaunchApplication(const std::string& id_I) override {
-    mJournal.Add("launch:" + id_I);
-    return true;
+  int LaunchApplication(const SLaunchRequest& request_I) override {
+    mJournal.Add("launch:" + request_I.applicationId);
+    mRunning[request_I.applicationId].push_back(++mLastPid);
+    return mLastPid;
   }
-  void PostNotification(const std::string& name_I,
-                        const std::map<std::string, std::string>&) override {
-    mJournal.Add("notify:" + name_I);
+  void PostNotification(const SNotification& notification_I) override {
+    mJournal.Add("notify:" + notification_I.name);
   }
+  bool ObserveNotifications(std::function<void(const SNotification&)>) override { return false; }
   bool RequestHidAccess() override { return mHidAccess; }
 
   int mSenderPid = 1;
@@ -89,6 +93,7 @@ class CFakeDesktop : public CDesktop {
   int mArgumentCount = 1;
   bool mHidAccess = true;
   std::map<std::string, std::vector<int>> mRunning;
+  int mLastPid = 100;
   CJournal mJournal;
 };
 

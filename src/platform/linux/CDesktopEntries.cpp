@@ -56,8 +56,8 @@ namespace CDesktopEntries {
 std::vector<std::string> SearchFolders() {
   std::vector<std::string> folders;
   folders.push_back(EnvOr("XDG_DATA_HOME", HomeFolder() + "/.local/share") + "/applications");
-  for (const std::string& folder :
-       StringUtilities::Tokenize(EnvOr("XDG_DATA_DIRS", "/usr/local/share:/usr/share"), ":", true)) {
+  for (const std::string& folder : StringUtilities::Tokenize(
+           EnvOr("XDG_DATA_DIRS", "/usr/local/share:/usr/share"), ":", true)) {
     folders.push_back(folder + "/applications");
   }
   return folders;
@@ -108,6 +108,7 @@ std::optional<SDesktopEntry> Read(const std::string& path_I) {
       std::string name = path_I.substr(path_I.rfind('/') + 1);
       if (StringUtilities::EndsWith(name, ".desktop")) name.resize(name.size() - 8);
       entry.id = name;
+      entry.path = path_I;
       entry.exec = WithoutFieldCodes(trimmed.substr(5));
       const std::vector<std::string> words = SplitExec(entry.exec);
       entry.program = words.empty() ? std::string() : ResolveProgram(words.front());

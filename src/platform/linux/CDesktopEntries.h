@@ -7,6 +7,7 @@
 
 struct SDesktopEntry {
   std::string id;       // the file name without ".desktop"
+  std::string path;     // the entry file
   std::string exec;     // the Exec line with field codes removed
   std::string program;  // the absolute path of the Exec line's program
 };

@@ -1,12 +1,17 @@
 // Applications and the access check of the Linux desktop.
 #include <gtest/gtest.h>
+#include <signal.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
+#include <chrono>
 #include <filesystem>
 #include <fstream>
 
+#include "host/OProcessUtils.h"
+#include "host/ProcessUtils.h"
 #include "platform/linux/CDesktopEntries.h"
 #include "platform/linux/CLinuxDesktop.h"
 
@@ -65,35 +70,127 @@ TEST_F(LinuxDesktop, ExecLinesSplitLikeTheDesktopEntryFormat) {
   EXPECT_EQ(entry->program, fs::canonical("/bin/sleep").string());
   EXPECT_FALSE(CDesktopEntries::Find("../etc/passwd").has_value());
   EXPECT_FALSE(CDesktopEntries::Find("com.tavik.Missing").has_value());
-  // A notification's name becomes the member of its D-Bus signal.
-  EXPECT_EQ(CLinuxDesktop::SignalMemberFor("com.tavik.TFUCompleted"), "com_tavik_TFUCompleted");
 }
 
-TEST_F(LinuxDesktop, LaunchedApplicationRunsIsNamedAndQuitsOnRequest) {
+std::string ReadLink(const fs::path& path_I) {
+  std::error_code error;
+  return fs::read_symlink(path_I, error).string();
+}
+
+TEST_F(LinuxDesktop, LaunchedApplicationRunsDetachedIsNamedAndQuitsOnRequest) {
   WriteEntry("com.tavik.TestDriver", "\"" + mProgram.string() + "\" 30");
   WriteEntry("com.tavik.Broken", (mFolder / "no-such-program").string());
-  EXPECT_FALSE(mDesktop.LaunchApplication("com.tavik.Broken"));
-  EXPECT_FALSE(mDesktop.LaunchApplication("com.tavik.NotInstalled"));
+  EXPECT_EQ(mDesktop.LaunchApplication({"com.tavik.Broken", "", {}}), 0);
+  EXPECT_EQ(mDesktop.LaunchApplication({"com.tavik.NotInstalled", "", {}}), 0);
   EXPECT_TRUE(mDesktop.RunningApplications("com.tavik.TestDriver").empty());
 
-  ASSERT_TRUE(mDesktop.LaunchApplication("com.tavik.TestDriver"));
-  std::vector<int> running;
-  ASSERT_TRUE(WaitFor([&] {
-    running = mDesktop.RunningApplications("com.tavik.TestDriver");
-    return running.size() == 1;
-  }));
-  EXPECT_EQ(mDesktop.GetApplicationIdOfProcess(running[0]), "com.tavik.TestDriver");
-  EXPECT_TRUE(mDesktop.IsApplicationProcess(running[0]));
+  // A descriptor of ours that closes at no exec, like the pipe a shell reads
+  // our output from.
+  int held[2];
+  ASSERT_EQ(pipe(held), 0);
+  const int pid = mDesktop.LaunchApplication({"com.tavik.TestDriver", "", {"1"}});
+  close(held[0]);
+  close(held[1]);
+  ASSERT_GT(pid, 0);
+  ASSERT_TRUE(
+      WaitFor([&] { return mDesktop.RunningApplications("com.tavik.TestDriver").size() == 1; }));
+  EXPECT_EQ(mDesktop.RunningApplications("com.tavik.TestDriver"), std::vector<int>{pid});
+
+  const fs::path proc = "/proc/" + std::to_string(pid);
+  std::vector<std::string> descriptors;
+  for (const auto& fd : fs::directory_iterator(proc / "fd")) {
+    descriptors.push_back(fd.path().filename().string() + ":" + ReadLink(fd.path()));
+  }
+  std::sort(descriptors.begin(), descriptors.end());
+  EXPECT_EQ(descriptors, (std::vector<std::string>{"0:/dev/null", "1:/dev/null", "2:/dev/null"}));
+  EXPECT_NE(getsid(pid), getsid(0));
+  std::ifstream cmdline(proc / "cmdline");
+  std::string arguments((std::istreambuf_iterator<char>(cmdline)),
+                        std::istreambuf_iterator<char>());
+  EXPECT_EQ(arguments, mProgram.string() + std::string("\0"
+                                                       "30\0"
+                                                       "1\0",
+                                                       6));
+
+  EXPECT_EQ(mDesktop.GetApplicationIdOfProcess(pid), "com.tavik.TestDriver");
+  EXPECT_TRUE(mDesktop.IsApplicationProcess(pid));
   // A process that is no application goes by its executable's name.
   EXPECT_FALSE(mDesktop.IsApplicationProcess(getpid()));
   EXPECT_EQ(mDesktop.GetApplicationIdOfProcess(getpid()),
             fs::read_symlink("/proc/self/exe").filename().string());
-  EXPECT_FALSE(mDesktop.IsTerminated(running[0]));
+  EXPECT_FALSE(mDesktop.IsTerminated(pid));
 
-  EXPECT_TRUE(mDesktop.TerminateApplication(running[0]));
-  EXPECT_TRUE(WaitFor([&] { return mDesktop.IsTerminated(running[0]); }));
+  EXPECT_TRUE(mDesktop.TerminateApplication(pid));
+  EXPECT_TRUE(WaitFor([&] { return mDesktop.IsTerminated(pid); }));
   EXPECT_TRUE(
       WaitFor([&] { return mDesktop.RunningApplications("com.tavik.TestDriver").empty(); }));
+}
+
+TEST_F(LinuxDesktop, OnlyProcessesWhoseRealOwnerIsThisUserAreListedOrQuit) {
+  // A process table of our own over children of ours: the program run by
+  // us, by another user, and by another user as us (a set-id program: the
+  // real id counts).
+  WriteEntry("com.tavik.TestDriver", mProgram.string());
+  const uid_t me = getuid(), other = me + 4242;
+  std::vector<std::pair<pid_t, std::vector<uid_t>>> table = {
+      {0, {me, me}}, {0, {other, other}}, {0, {other, me}}};
+  for (auto& [pid, ids] : table) {
+    pid = fork();
+    if (pid == 0) {
+      pause();
+      _exit(0);
+    }
+    const fs::path folder = mFolder / "proc" / std::to_string(pid);
+    fs::create_directories(folder);
+    fs::create_symlink(mProgram, folder / "exe");
+    std::ofstream(folder / "status") << "Name:\tdriver\nUid:\t" << ids[0] << "\t" << ids[1] << "\t"
+                                     << ids[1] << "\t" << ids[1] << "\n";
+  }
+  CLinuxDesktop desktop(nullptr, CProcFolder((mFolder / "proc").string()));
+  EXPECT_EQ(desktop.RunningApplications("com.tavik.TestDriver"), std::vector<int>{table[0].first});
+  // Another user's process is sent nothing; and root starts no second one
+  // beside another user's.
+  EXPECT_FALSE(desktop.TerminateApplication(table[1].first));
+  EXPECT_FALSE(desktop.TerminateApplication(table[2].first));
+  if (getuid() == 0) {
+    EXPECT_EQ(desktop.LaunchApplication({"com.tavik.TestDriver", "", {}}), 0);
+  }
+  for (const auto& [pid, ids] : table) {
+    EXPECT_EQ(waitpid(pid, nullptr, WNOHANG), 0) << "process " << pid << " was ended";
+    kill(pid, SIGKILL);
+    waitpid(pid, nullptr, 0);
+  }
+}
+
+TEST_F(LinuxDesktop, LaunchCountsOnceTheApplicationShowsWithinAboutASecond) {
+  auto desktop = std::make_shared<CLinuxDesktop>(nullptr);
+  OProcessUtils::SetDesktop(desktop);
+  WriteEntry("com.tavik.TestDriver", "\"" + mProgram.string() + "\" 30");
+  // A wrapper whose process never runs the entry's program.
+  const fs::path wrapper = mFolder / "wrapper";
+  std::ofstream(wrapper) << "#!/bin/sh\nexec /bin/sleep 2\n";
+  fs::permissions(wrapper, fs::perms::owner_all);
+  WriteEntry("com.tavik.Wrapped", wrapper.string());
+
+  EXPECT_TRUE(ProcessUtils::LaunchApplicationWithBundleID("com.tavik.TestDriver", std::nullopt,
+                                                          65536, true, std::nullopt));
+  const std::vector<int> running = desktop->RunningApplications("com.tavik.TestDriver");
+  ASSERT_EQ(running.size(), 1u);
+  // Running already: nothing more starts, and the answer is no.
+  EXPECT_FALSE(ProcessUtils::LaunchApplicationWithBundleID("com.tavik.TestDriver", std::nullopt,
+                                                           65536, true, std::nullopt));
+  EXPECT_EQ(desktop->RunningApplications("com.tavik.TestDriver"), running);
+
+  const auto start = std::chrono::steady_clock::now();
+  EXPECT_FALSE(ProcessUtils::LaunchApplicationWithBundleID("com.tavik.Wrapped", std::nullopt, 65536,
+                                                           true, std::nullopt));
+  const double waited =
+      std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+  EXPECT_GE(waited, 0.9);
+  EXPECT_LT(waited, 5.0);
+
+  kill(running[0], SIGKILL);
+  OProcessUtils::SetDesktop(nullptr);
 }
 
 class CListRegistry : public CDeviceRegistry {
