@@ -25,8 +25,8 @@ bool CHelperConfig::IsUnitName(const std::string& name_I) {
   const size_t dot = name_I.rfind('.');
   if (dot == 0 || dot == std::string::npos) return false;
   const std::string suffix = name_I.substr(dot);
-  return suffix == ".service" || suffix == ".socket" || suffix == ".target" ||
-         suffix == ".timer" || suffix == ".path";
+  return suffix == ".service" || suffix == ".socket" || suffix == ".target" || suffix == ".timer" ||
+         suffix == ".path";
 }
 
 bool CHelperConfig::Read(const std::string& path_I, std::string& error_O) {

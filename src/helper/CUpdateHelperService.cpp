@@ -20,10 +20,12 @@ namespace {
 constexpr size_t kMaxListEntries = 16;
 constexpr size_t kMaxTextLength = 255;
 
-const char* const kErrorNames[] = {
-    "", "com.tavik.UpdateHelper.Error.NotSupported", "com.tavik.UpdateHelper.Error.InvalidRequest",
-    "com.tavik.UpdateHelper.Error.NotConfigured", "com.tavik.UpdateHelper.Error.NotAuthorized",
-    "com.tavik.UpdateHelper.Error.Failed"};
+const char* const kErrorNames[] = {"",
+                                   "com.tavik.UpdateHelper.Error.NotSupported",
+                                   "com.tavik.UpdateHelper.Error.InvalidRequest",
+                                   "com.tavik.UpdateHelper.Error.NotConfigured",
+                                   "com.tavik.UpdateHelper.Error.NotAuthorized",
+                                   "com.tavik.UpdateHelper.Error.Failed"};
 
 std::string Caller(sd_bus_message* message_I) {
   const char* sender = sd_bus_message_get_sender(message_I);
@@ -46,7 +48,8 @@ bool IsListOfShortTexts(const CXPCDictionary::Strings& texts_I) {
 }  // namespace
 
 CUpdateHelperService::CUpdateHelperService(sd_bus* bus_I, const CHelperConfig& config_I)
-    : mBus(bus_I), mConfig(config_I),
+    : mBus(bus_I),
+      mConfig(config_I),
       mPath(CLinuxServiceConnection::ObjectPathFor(OUpdaterClient::kServiceName)),
       mInterface(CLinuxServiceConnection::InterfaceFor(OUpdaterClient::kServiceName,
                                                        OUpdaterClient::kServerProtocol)) {}
@@ -68,16 +71,14 @@ bool CUpdateHelperService::Start() {
       SD_BUS_METHOD("loadDriverKext", "", "a{sv}", &OnNotSupported, SD_BUS_VTABLE_UNPRIVILEGED),
       SD_BUS_METHOD("performInstall", "a{sv}", "a{sv}", &OnNotSupported,
                     SD_BUS_VTABLE_UNPRIVILEGED),
-      SD_BUS_METHOD("performRemove", "a{sv}", "a{sv}", &OnNotSupported,
-                    SD_BUS_VTABLE_UNPRIVILEGED),
+      SD_BUS_METHOD("performRemove", "a{sv}", "a{sv}", &OnNotSupported, SD_BUS_VTABLE_UNPRIVILEGED),
       SD_BUS_METHOD("removePrefs", "a{sv}", "a{sv}", &OnNotSupported, SD_BUS_VTABLE_UNPRIVILEGED),
-      SD_BUS_METHOD("verifyInstallation", "", "a{sv}", &OnNotSupported,
-                    SD_BUS_VTABLE_UNPRIVILEGED),
+      SD_BUS_METHOD("verifyInstallation", "", "a{sv}", &OnNotSupported, SD_BUS_VTABLE_UNPRIVILEGED),
       SD_BUS_METHOD("wakeSystem", "", "a{sv}", &OnNotSupported, SD_BUS_VTABLE_UNPRIVILEGED),
       SD_BUS_METHOD("stopService", "a{sv}", "a{sv}", &OnNotSupported, SD_BUS_VTABLE_UNPRIVILEGED),
       SD_BUS_VTABLE_END};
-  int status = sd_bus_add_object_vtable(mBus, &mSlot, mPath.c_str(), mInterface.c_str(), vtable,
-                                        this);
+  int status =
+      sd_bus_add_object_vtable(mBus, &mSlot, mPath.c_str(), mInterface.c_str(), vtable, this);
   if (status >= 0) status = sd_bus_request_name(mBus, OUpdaterClient::kServiceName, 0);
   if (status < 0) {
     HelperLog::Print(LOG_ERR, "Cannot serve %s: %s", OUpdaterClient::kServiceName,
@@ -150,7 +151,8 @@ bool CUpdateHelperService::ReadIdentifiers(const CXPCDictionary& request_I, cons
 int CUpdateHelperService::HandleDriverRequest(sd_bus_message* message_I, EDriverAction action_I) {
   const std::string member = Member(message_I);
   const std::string caller = Caller(message_I);
-  const char* key = action_I == ESTOP_UNITS || action_I == ESTART_UNITS ? "LaunchAgents" : "BundleID";
+  const char* key =
+      action_I == ESTOP_UNITS || action_I == ESTART_UNITS ? "LaunchAgents" : "BundleID";
 
   const std::shared_ptr<CXPCDictionary> request = BusDictionary::Read(message_I);
   std::vector<std::string> identifiers;
@@ -177,7 +179,8 @@ int CUpdateHelperService::HandleDriverRequest(sd_bus_message* message_I, EDriver
   }
   std::string failures;
   for (const std::string& identifier : identifiers) {
-    if (!Act(action_I, identifier, user, problem)) failures += (failures.empty() ? "" : "; ") + problem;
+    if (!Act(action_I, identifier, user, problem))
+      failures += (failures.empty() ? "" : "; ") + problem;
   }
   if (!failures.empty()) return ReplyError(message_I, EHELPER_FAILED, failures);
   return ReplySuccess(message_I, CXPCDictionary{{OXPCClient::kErrorCodeKey, int64_t{0}}});
@@ -190,9 +193,11 @@ bool CUpdateHelperService::Act(EDriverAction action_I, const std::string& identi
     const bool stop = action_I == ESTOP_UNITS;
     for (const std::string& unit : mConfig.GetUnits(identifier_I)) {
       std::string why;
-      const bool queued = stop ? CSystemdUnits::Stop(mBus, unit, why) : CSystemdUnits::Start(mBus, unit, why);
-      HelperLog::Print(queued ? LOG_INFO : LOG_ERR, "%s %s for %s%s%s", stop ? "Stopping" : "Starting",
-                       unit.c_str(), identifier_I.c_str(), queued ? "" : " failed: ", why.c_str());
+      const bool queued =
+          stop ? CSystemdUnits::Stop(mBus, unit, why) : CSystemdUnits::Start(mBus, unit, why);
+      HelperLog::Print(queued ? LOG_INFO : LOG_ERR, "%s %s for %s%s%s",
+                       stop ? "Stopping" : "Starting", unit.c_str(), identifier_I.c_str(),
+                       queued ? "" : " failed: ", why.c_str());
       if (!queued) problem_O = unit + ": " + why;
       done = done && queued;
     }
@@ -235,8 +240,8 @@ int CUpdateHelperService::OnFindProcesses(sd_bus_message* message_I, void* self_
       }
     }
   }
-  return ReplySuccess(message_I,
-                      CXPCDictionary{{OXPCClient::kErrorCodeKey, int64_t{0}}, {"Running", running}});
+  return ReplySuccess(
+      message_I, CXPCDictionary{{OXPCClient::kErrorCodeKey, int64_t{0}}, {"Running", running}});
 }
 
 int CUpdateHelperService::OnFindUsers(sd_bus_message* message_I, void*, sd_bus_error*) {

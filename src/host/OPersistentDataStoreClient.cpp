@@ -31,7 +31,8 @@ SXPCError OPersistentDataStoreClient::connectToService() {
   for (int attempt = 0; attempt < kConnectTries; ++attempt) {
     OXPCClient::connectToService(kServiceName, kServerProtocol, kClientProtocol, 0);
     try {
-      if (getDataForKey(kProbeKey)) return SXPCError{"XPCClient", 0, {{"Error", "Connection Started."}}};
+      if (getDataForKey(kProbeKey))
+        return SXPCError{"XPCClient", 0, {{"Error", "Connection Started."}}};
     } catch (const CTavException&) {
       // Not up yet.
     }
@@ -72,8 +73,8 @@ void OPersistentDataStoreClient::setData(const std::string& data_I, const std::s
 }
 
 void OPersistentDataStoreClient::stopService() {
-  const auto junk = std::make_shared<const CXPCDictionary>(
-      CXPCDictionary{{"junk", std::string("data")}});
+  const auto junk =
+      std::make_shared<const CXPCDictionary>(CXPCDictionary{{"junk", std::string("data")}});
   Call("stopService:withReply:", junk, kPollSeconds, 0);
 }
 

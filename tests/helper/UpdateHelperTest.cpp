@@ -94,15 +94,15 @@ class CFakeSystemd {
     sd_bus_message_read(message_I, "ss", &unit, &mode);
     {
       std::lock_guard<std::mutex> guard(self->mLock);
-      self->mJobs.push_back(std::string(sd_bus_message_get_member(message_I)) + " " + unit + " " + mode);
+      self->mJobs.push_back(std::string(sd_bus_message_get_member(message_I)) + " " + unit + " " +
+                            mode);
     }
     return sd_bus_reply_method_return(message_I, "o", "/org/freedesktop/systemd1/job/1");
   }
   static constexpr sd_bus_vtable kVtable[] = {
       SD_BUS_VTABLE_START(0),
       SD_BUS_METHOD("StopUnit", "ss", "o", &OnJob, SD_BUS_VTABLE_UNPRIVILEGED),
-      SD_BUS_METHOD("StartUnit", "ss", "o", &OnJob, SD_BUS_VTABLE_UNPRIVILEGED),
-      SD_BUS_VTABLE_END};
+      SD_BUS_METHOD("StartUnit", "ss", "o", &OnJob, SD_BUS_VTABLE_UNPRIVILEGED), SD_BUS_VTABLE_END};
 
   std::mutex mLock;
   Strings mJobs;
@@ -131,7 +131,8 @@ bool WaitForName(const char* name_I) {
     int owned = 0;
     sd_bus_message* reply = nullptr;
     if (sd_bus_call_method(raw, "org.freedesktop.DBus", "/org/freedesktop/DBus",
-                           "org.freedesktop.DBus", "NameHasOwner", nullptr, &reply, "s", name_I) >= 0) {
+                           "org.freedesktop.DBus", "NameHasOwner", nullptr, &reply, "s",
+                           name_I) >= 0) {
       sd_bus_message_read(reply, "b", &owned);
     }
     sd_bus_message_unref(reply);
@@ -180,7 +181,8 @@ pid_t StartProcess(const fs::path& program_I, const fs::path& stderr_I = {}) {
 // The signal that ended the process, 0 if it did not end within 5 s.
 int EndingSignal(pid_t pid_I) {
   int status = 0;
-  const bool ended = TavPollUntil(5.0, 0.01, [&] { return waitpid(pid_I, &status, WNOHANG) == pid_I; });
+  const bool ended =
+      TavPollUntil(5.0, 0.01, [&] { return waitpid(pid_I, &status, WNOHANG) == pid_I; });
   return ended && WIFSIGNALED(status) ? WTERMSIG(status) : 0;
 }
 
@@ -241,7 +243,8 @@ TEST_F(UpdateHelper, AnAuthorisedCallerStopsAndStartsTheConfiguredUnitsAndProces
                                       "StopUnit tavik-test-tray.service replace",
                                       "StartUnit tavik-test-driver.service replace",
                                       "StartUnit tavik-test-tray.service replace"}));
-  const std::string question = std::string("system-bus-name ") + CPolkitAuthority::kActionId + " unique";
+  const std::string question =
+      std::string("system-bus-name ") + CPolkitAuthority::kActionId + " unique";
   EXPECT_EQ(mPolkit.Questions(), Strings(3, question));
   // Only the configured program's processes were asked to quit.
   EXPECT_EQ(waitpid(stranger, nullptr, WNOHANG), 0);
@@ -275,15 +278,24 @@ TEST_F(UpdateHelper, ForeignOrMalformedRequestsAreRefusedAndTheHelperKeepsServin
     int64_t code;
   } cases[] = {
       {"a unit nobody configured", "stopLaunchDProcess:", {{"LaunchAgents", Strings{"sshd"}}}, 3},
-      {"a stranger among ours", "stopLaunchDProcess:", {{"LaunchAgents", Strings{kAgent, "x.y"}}}, 3},
+      {"a stranger among ours",
+       "stopLaunchDProcess:",
+       {{"LaunchAgents", Strings{kAgent, "x.y"}}},
+       3},
       {"a process nobody configured", "stopProcess:", {{"BundleID", Strings{"/usr/bin/sshd"}}}, 3},
       {"a text, not a list", "stopLaunchDProcess:", {{"LaunchAgents", kAgent}}, 2},
       {"a dictionary, not a list", "stopLaunchDProcess:", {{"LaunchAgents", nested}}, 2},
       {"no list at all", "stopLaunchDProcess:", {{"User", Strings{"1000"}}}, 2},
       {"an empty list", "startLaunchDProcess:", {{"LaunchAgents", Strings{}}}, 2},
-      {"a huge text", "stopLaunchDProcess:", {{"LaunchAgents", Strings{std::string(1 << 20, 'a')}}}, 2},
+      {"a huge text",
+       "stopLaunchDProcess:",
+       {{"LaunchAgents", Strings{std::string(1 << 20, 'a')}}},
+       2},
       {"too many entries", "stopProcess:", {{"BundleID", Strings(1000, kDriver)}}, 2},
-      {"a user that is no id", "stopLaunchDProcess:", {{"LaunchAgents", Strings{kAgent}}, {"User", Strings{"root"}}}, 2},
+      {"a user that is no id",
+       "stopLaunchDProcess:",
+       {{"LaunchAgents", Strings{kAgent}}, {"User", Strings{"root"}}},
+       2},
       {"a message it does not carry out", "performInstall:withReply:", {}, 1},
   };
   for (const auto& entry : cases) {
@@ -315,43 +327,52 @@ std::string ReadFile(const fs::path& file_I) {
 TEST(UpdateHelperInstalled, StartedByTheBusItStopsAndRestartsTheDriverForTheClient) {
   const fs::path folder = MakeFolder();
   ASSERT_FALSE(folder.empty());
-  const std::string install = "DESTDIR=" + folder.string() + " \"" TAV_CMAKE_COMMAND "\" --install \"" +
+  const std::string install = "DESTDIR=" + folder.string() +
+                              " \"" TAV_CMAKE_COMMAND "\" --install \"" +
                               TAV_BUILD_DIR "\" --component helper > /dev/null";
   ASSERT_EQ(std::system(install.c_str()), 0);
   const fs::path root = folder / fs::path(TAV_INSTALL_PREFIX).relative_path();
   const fs::path program = root / TAV_LIBEXEC_DIR / "tavik-update-helper";
   const fs::path serviceFile = root / TAV_DBUS_SERVICES_DIR / "com.tavik.UpdateHelper.service";
   ASSERT_TRUE(fs::exists(program));
-  EXPECT_TRUE(fs::exists(folder / fs::path(TAV_SYSCONF_DIR).relative_path() / "tavik/update-helper.conf.example"));
+  EXPECT_TRUE(fs::exists(folder / fs::path(TAV_SYSCONF_DIR).relative_path() /
+                         "tavik/update-helper.conf.example"));
   // The bus, systemd and polkit all name the same program and action.
-  const std::string installedPath = fs::path(TAV_INSTALL_PREFIX) / TAV_LIBEXEC_DIR / "tavik-update-helper";
+  const std::string installedPath =
+      fs::path(TAV_INSTALL_PREFIX) / TAV_LIBEXEC_DIR / "tavik-update-helper";
   std::string service = ReadFile(serviceFile);
   EXPECT_NE(service.find("Exec=" + installedPath + "\n"), std::string::npos);
-  EXPECT_NE(ReadFile(root / TAV_SYSTEMD_DIR / "tavik-update-helper.service").find("ExecStart=" + installedPath),
+  EXPECT_NE(ReadFile(root / TAV_SYSTEMD_DIR / "tavik-update-helper.service")
+                .find("ExecStart=" + installedPath),
             std::string::npos);
-  EXPECT_NE(ReadFile(root / TAV_POLKIT_DIR / "com.tavik.update-helper.policy").find(CPolkitAuthority::kActionId),
+  EXPECT_NE(ReadFile(root / TAV_POLKIT_DIR / "com.tavik.update-helper.policy")
+                .find(CPolkitAuthority::kActionId),
             std::string::npos);
 
   // Here the program lies in the temporary folder, with the test's configuration.
   WriteConfig(folder / "update-helper.conf", folder / "unused");
-  service.replace(service.find("Exec=" + installedPath), ("Exec=" + installedPath).size(),
-                  "Exec=" + program.string() + " --config " + (folder / "update-helper.conf").string());
+  service.replace(
+      service.find("Exec=" + installedPath), ("Exec=" + installedPath).size(),
+      "Exec=" + program.string() + " --config " + (folder / "update-helper.conf").string());
   std::ofstream(serviceFile) << service;
 
   {
-    CPrivateBus bus(SPrivateBusOptions{(root / TAV_DBUS_SERVICES_DIR).string(),
-                                       {(root / TAV_DBUS_POLICY_DIR / "com.tavik.UpdateHelper.conf").string()}});
+    CPrivateBus bus(SPrivateBusOptions{
+        (root / TAV_DBUS_SERVICES_DIR).string(),
+        {(root / TAV_DBUS_POLICY_DIR / "com.tavik.UpdateHelper.conf").string()}});
     ASSERT_TRUE(bus.IsUp());
     CFakePolkit polkit;
     CFakeSystemd systemd;
     ASSERT_TRUE(polkit.IsReady() && systemd.IsReady());
-    OXPCClient::SetServiceDirectory(OXPCClient::kPrivileged, std::make_shared<CLinuxServiceDirectory>(true));
+    OXPCClient::SetServiceDirectory(OXPCClient::kPrivileged,
+                                    std::make_shared<CLinuxServiceDirectory>(true));
 
     const std::shared_ptr<OUpdaterClient> client = OUpdaterClient::client();
     ASSERT_NE(client, nullptr) << "the bus can start it";
     EXPECT_EQ(client->connectToService().code, 0);
     // As an update does: the driver's services stop first, and start at the end.
-    client->stopLaunchDProcess(OUpdaterClient::Request{{"LaunchAgents", {kAgent}}, {"User", {"1000"}}});
+    client->stopLaunchDProcess(
+        OUpdaterClient::Request{{"LaunchAgents", {kAgent}}, {"User", {"1000"}}});
     client->startLaunchDProcess(OUpdaterClient::Request{
         {"LaunchAgents", {kAgent}}, {"User", {"1000"}}, {"BundleID", {kAgent, kTouch, kDriver}}});
     TavPollUntil(5.0, 0.01, [&] { return systemd.Jobs().size() >= 4; });

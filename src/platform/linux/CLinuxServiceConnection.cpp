@@ -10,7 +10,9 @@ namespace {
 // in, and dropped, rather than left pending.
 constexpr uint64_t kCallTimeoutUsec = 10 * 1000 * 1000;
 
-void FreeHandler(void* handler_I) { delete static_cast<CServiceConnection::ReplyHandler*>(handler_I); }
+void FreeHandler(void* handler_I) {
+  delete static_cast<CServiceConnection::ReplyHandler*>(handler_I);
+}
 
 }  // namespace
 
@@ -59,8 +61,11 @@ std::unique_ptr<CLinuxServiceConnection> CLinuxServiceConnection::Open(
 CLinuxServiceConnection::CLinuxServiceConnection(sd_bus* bus_I, std::string service_I,
                                                  std::string interface_I,
                                                  std::string clientInterface_I)
-    : mBus(bus_I), mService(std::move(service_I)), mPath(ObjectPathFor(mService)),
-      mInterface(std::move(interface_I)), mClientInterface(std::move(clientInterface_I)) {
+    : mBus(bus_I),
+      mService(std::move(service_I)),
+      mPath(ObjectPathFor(mService)),
+      mInterface(std::move(interface_I)),
+      mClientInterface(std::move(clientInterface_I)) {
   sd_bus_add_object(mBus, &mExported, mPath.c_str(), &CLinuxServiceConnection::OnClientMessage,
                     this);
 }

@@ -84,10 +84,13 @@ class CPrivateBus {
               " \"http://www.freedesktop.org/standards/dbus/1.0/busconfig.dtd\">\n"
               "<busconfig>\n  <type>session</type>\n  <listen>"
            << address_I << "</listen>\n";
-    if (!options_I.serviceDir.empty()) config << "  <servicedir>" << options_I.serviceDir << "</servicedir>\n";
-    config << "  <policy context=\"default\">\n    <allow send_destination=\"*\" eavesdrop=\"true\"/>\n"
+    if (!options_I.serviceDir.empty())
+      config << "  <servicedir>" << options_I.serviceDir << "</servicedir>\n";
+    config << "  <policy context=\"default\">\n    <allow send_destination=\"*\" "
+              "eavesdrop=\"true\"/>\n"
               "    <allow eavesdrop=\"true\"/>\n    <allow own=\"*\"/>\n  </policy>\n";
-    for (const std::string& include : options_I.includes) config << "  <include>" << include << "</include>\n";
+    for (const std::string& include : options_I.includes)
+      config << "  <include>" << include << "</include>\n";
     config << "</busconfig>\n";
   }
 

@@ -97,7 +97,8 @@ class CFakeDataStore {
   static int OnCall(sd_bus_message* message_I, void* self_I, sd_bus_error*) {
     auto* self = static_cast<CFakeDataStore*>(self_I);
     const auto request = BusDictionary::Read(message_I);
-    const std::string key = request && request->Get<std::string>("Key") ? *request->Get<std::string>("Key") : "";
+    const std::string key =
+        request && request->Get<std::string>("Key") ? *request->Get<std::string>("Key") : "";
     if (key == "silent") return 1;
     const std::string member = sd_bus_message_get_member(message_I);
     CXPCDictionary reply;
@@ -111,7 +112,8 @@ class CFakeDataStore {
     }
     sd_bus_message* answer = nullptr;
     if (self->mAnswerAsErrors) {
-      const sd_bus_error error = SD_BUS_ERROR_MAKE_CONST("com.tavik.DataStoreMgr.Error.Reply", "reply");
+      const sd_bus_error error =
+          SD_BUS_ERROR_MAKE_CONST("com.tavik.DataStoreMgr.Error.Reply", "reply");
       sd_bus_message_new_method_error(message_I, &answer, &error);
     } else {
       sd_bus_message_new_method_return(message_I, &answer);
@@ -189,13 +191,14 @@ TEST_F(ServiceClients, DriverRequestsTravelAsListsOfTextsAndTheHelperIsFoundOnly
   client->startLaunchDProcess(request);
 
   using Entries = CFakeHelper::Entries;
-  const Entries agents{{"LaunchAgents", {"as", {"com.tavik.taviktablet"}}}, {"User", {"as", {"1000"}}}};
+  const Entries agents{{"LaunchAgents", {"as", {"com.tavik.taviktablet"}}},
+                       {"User", {"as", {"1000"}}}};
   Entries all = agents;
   all["BundleID"] = {"as", {"com.tavik.taviktablet", "com.tavik.TavikTouchDriver"}};
-  EXPECT_EQ(helper.Arrived(), (std::vector<std::pair<std::string, Entries>>{
-                                  {"stopLaunchDProcess", agents},
-                                  {"stopProcess", all},
-                                  {"startLaunchDProcess", all}}));
+  EXPECT_EQ(
+      helper.Arrived(),
+      (std::vector<std::pair<std::string, Entries>>{
+          {"stopLaunchDProcess", agents}, {"stopProcess", all}, {"startLaunchDProcess", all}}));
 }
 
 TEST_F(ServiceClients, AHelperThatNeverAnswersCostsHalfASecondACallAndTheDriverStopGoesOn) {
@@ -207,7 +210,8 @@ TEST_F(ServiceClients, AHelperThatNeverAnswersCostsHalfASecondACallAndTheDriverS
 
   const auto start = std::chrono::steady_clock::now();
   EXPECT_EQ(client->stopProcess(OUpdaterClient::Request{{"BundleID", {"x"}}}), nullptr);
-  const double waited = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+  const double waited =
+      std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
   EXPECT_GE(waited, 0.5);
   EXPECT_LT(waited, 1.5);
 
@@ -218,8 +222,8 @@ TEST_F(ServiceClients, AHelperThatNeverAnswersCostsHalfASecondACallAndTheDriverS
   CRecordingDesktop desktop;
   FLAppDelegate::stopDriver(desktop);
   EXPECT_NEAR(clock->GetTotalSlept(), 7.0, 0.01);
-  EXPECT_EQ(desktop.asked,
-            (Strings{"com.tavik.taviktablet", "com.tavik.TabletDriver", "com.tavik.TavikTouchDriver"}));
+  EXPECT_EQ(desktop.asked, (Strings{"com.tavik.taviktablet", "com.tavik.TabletDriver",
+                                    "com.tavik.TavikTouchDriver"}));
 }
 
 TEST_F(ServiceClients, DataStoreTakesRepliesAndErrorsUserInfoAndThrowsWhenNothingComes) {
@@ -262,7 +266,8 @@ TEST_F(ServiceClients, CategoryKeepsItsKeysInOneObjectAndDeleteKeyWritesNothingB
   category->setData("5", "Level");
   EXPECT_EQ(category->count(), 2u);
   EXPECT_EQ(category->copyDataForKey("Level"), std::optional<std::string>("5"));
-  const auto stored = CSettingsMap::CastToMap(CSettingsObject::ReadFromJSONBuffer(store.Stored("Prefs")), false);
+  const auto stored =
+      CSettingsMap::CastToMap(CSettingsObject::ReadFromJSONBuffer(store.Stored("Prefs")), false);
   ASSERT_NE(stored, nullptr);
   EXPECT_EQ(stored->StringForKeyWithDefault("Logging", ""), "on");
 
