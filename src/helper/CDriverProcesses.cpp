@@ -1,5 +1,6 @@
 #include "helper/CDriverProcesses.h"
 
+#include <fcntl.h>
 #include <grp.h>
 #include <pwd.h>
 #include <signal.h>
@@ -35,6 +36,7 @@ bool CDriverProcesses::Start(const std::string& executable_I, uid_t user_I) {
   if (account == nullptr || access(executable_I.c_str(), X_OK) != 0) return false;
   const gid_t group = account->pw_gid;
   const std::string name = account->pw_name;
+  const std::string home = account->pw_dir;
   const pid_t child = fork();
   if (child < 0) return false;
   if (child == 0) {
@@ -44,6 +46,14 @@ bool CDriverProcesses::Start(const std::string& executable_I, uid_t user_I) {
     if (initgroups(name.c_str(), group) != 0 || setgid(group) != 0 || setuid(user_I) != 0) {
       _exit(126);
     }
+    // Nothing of the helper's: no bus to read from or write to, the user's
+    // own home.
+    const int nothing = open("/dev/null", O_RDWR);
+    dup2(nothing, STDIN_FILENO);
+    dup2(nothing, STDOUT_FILENO);
+    setenv("HOME", home.c_str(), 1);
+    setenv("USER", name.c_str(), 1);
+    setenv("LOGNAME", name.c_str(), 1);
     execl(executable_I.c_str(), executable_I.c_str(), static_cast<char*>(nullptr));
     _exit(127);
   }

@@ -235,6 +235,10 @@ TEST_F(UpdateHelper, AnAuthorisedCallerStopsAndStartsTheConfiguredUnitsAndProces
                                  {"BundleID", Strings{kAgent, kTouch, kDriver}}};
 
   EXPECT_EQ(Ask("stopLaunchDProcess:withReply:", &agents).Code(), 0);
+  const SAnswer found = Ask("findAllProcessesInList:withReply:", &processes);
+  ASSERT_NE(found.body, nullptr);
+  ASSERT_NE(found.body->Get<Strings>("Running"), nullptr);
+  EXPECT_EQ(*found.body->Get<Strings>("Running"), Strings{kDriver});
   EXPECT_EQ(Ask("stopProcess:withReply:", &processes).Code(), 0);
   EXPECT_EQ(EndingSignal(driver), SIGTERM);
   EXPECT_EQ(Ask("startLaunchDProcess:withReply:", &processes).Code(), 0);

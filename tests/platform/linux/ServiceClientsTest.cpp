@@ -51,8 +51,11 @@ class CFakeHelper {
       sd_bus_message_enter_container(message_I, 'v', contents);
       char** texts = nullptr;
       if (entry.first == "as" && sd_bus_message_read_strv(message_I, &texts) >= 0) {
-        for (char** text = texts; *text != nullptr; ++text) entry.second.push_back(*text);
-        sd_bus_message_read_strv(message_I, nullptr);
+        for (char** text = texts; *text != nullptr; ++text) {
+          entry.second.push_back(*text);
+          free(*text);
+        }
+        free(texts);
       } else {
         sd_bus_message_skip(message_I, contents);
       }
