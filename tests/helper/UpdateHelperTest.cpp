@@ -37,11 +37,9 @@ class CFakePolkit {
                  "org.freedesktop.PolicyKit1.Authority", kVtable, this) {}
   bool IsReady() const { return mService.IsReady(); }
   void SetAllow(bool allow_I) { mAllow = allow_I; }
-  // Each question as "<subject kind> <action id>", and the names asked about.
-  Strings Questions() {
-    std::lock_guard<std::mutex> guard(mLock);
-    return mQuestions;
-  }
+  // Each question as "<subject kind> <action id> unique", the last word
+  // saying the subject was named by its unique bus name.
+  Strings Questions() { return mService.Records(); }
 
  private:
   static int OnCheck(sd_bus_message* message_I, void* self_I, sd_bus_error*) {
@@ -54,11 +52,8 @@ class CFakePolkit {
     sd_bus_message_exit_container(message_I);
     sd_bus_message_read(message_I, "s", &action);
     const std::string* name = subject ? subject->Get<std::string>("name") : nullptr;
-    {
-      std::lock_guard<std::mutex> guard(self->mLock);
-      self->mQuestions.push_back(std::string(kind) + " " + action + " " +
-                                 (name != nullptr && name->rfind(':', 0) == 0 ? "unique" : "?"));
-    }
+    self->mService.Record(std::string(kind) + " " + action + " " +
+                          (name != nullptr && name->rfind(':', 0) == 0 ? "unique" : "?"));
     return sd_bus_reply_method_return(message_I, "(bba{ss})", static_cast<int>(self->mAllow.load()),
                                       0, 0);
   }
@@ -69,8 +64,6 @@ class CFakePolkit {
       SD_BUS_VTABLE_END};
 
   std::atomic<bool> mAllow{true};
-  std::mutex mLock;
-  Strings mQuestions;
   CFakeBusService mService;
 };
 
@@ -81,10 +74,7 @@ class CFakeSystemd {
                  "org.freedesktop.systemd1.Manager", kVtable, this) {}
   bool IsReady() const { return mService.IsReady(); }
   // "<method> <unit> <mode>" for each job asked for.
-  Strings Jobs() {
-    std::lock_guard<std::mutex> guard(mLock);
-    return mJobs;
-  }
+  Strings Jobs() { return mService.Records(); }
 
  private:
   static int OnJob(sd_bus_message* message_I, void* self_I, sd_bus_error*) {
@@ -92,11 +82,8 @@ class CFakeSystemd {
     const char* unit = nullptr;
     const char* mode = nullptr;
     sd_bus_message_read(message_I, "ss", &unit, &mode);
-    {
-      std::lock_guard<std::mutex> guard(self->mLock);
-      self->mJobs.push_back(std::string(sd_bus_message_get_member(message_I)) + " " + unit + " " +
-                            mode);
-    }
+    self->mService.Record(std::string(sd_bus_message_get_member(message_I)) + " " + unit + " " +
+                          mode);
     return sd_bus_reply_method_return(message_I, "o", "/org/freedesktop/systemd1/job/1");
   }
   static constexpr sd_bus_vtable kVtable[] = {
@@ -104,8 +91,6 @@ class CFakeSystemd {
       SD_BUS_METHOD("StopUnit", "ss", "o", &OnJob, SD_BUS_VTABLE_UNPRIVILEGED),
       SD_BUS_METHOD("StartUnit", "ss", "o", &OnJob, SD_BUS_VTABLE_UNPRIVILEGED), SD_BUS_VTABLE_END};
 
-  std::mutex mLock;
-  Strings mJobs;
   CFakeBusService mService;
 };
 
@@ -121,24 +106,6 @@ void WriteConfig(const fs::path& file_I, const fs::path& driver_I) {
                         << "executable " << kDriver << " " << driver_I.string() << "\n"
                         << "ignore " << kTouch << "\n"
                         << "unit " << kDriver << " not-a-unit-name\n";
-}
-
-bool WaitForName(const char* name_I) {
-  CLinuxServiceDirectory bus(true);
-  return TavPollUntil(5.0, 0.01, [&] {
-    sd_bus* raw = nullptr;
-    if (sd_bus_open_system(&raw) < 0) return false;
-    int owned = 0;
-    sd_bus_message* reply = nullptr;
-    if (sd_bus_call_method(raw, "org.freedesktop.DBus", "/org/freedesktop/DBus",
-                           "org.freedesktop.DBus", "NameHasOwner", nullptr, &reply, "s",
-                           name_I) >= 0) {
-      sd_bus_message_read(reply, "b", &owned);
-    }
-    sd_bus_message_unref(reply);
-    sd_bus_flush_close_unref(raw);
-    return owned != 0;
-  });
 }
 
 // The helper's answer: its dictionary or its error's user information (null
@@ -202,7 +169,9 @@ class UpdateHelper : public ::testing::Test {
             (mFolder / "update-helper.conf").c_str(), static_cast<char*>(nullptr));
       _exit(127);
     }
-    ASSERT_TRUE(WaitForName(OUpdaterClient::kServiceName));
+    CLinuxServiceDirectory bus(true);
+    ASSERT_TRUE(
+        TavPollUntil(5.0, 0.01, [&] { return bus.HasService(OUpdaterClient::kServiceName); }));
   }
   void TearDown() override {
     if (mHelper > 0) {

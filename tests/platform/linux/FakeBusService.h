@@ -1,11 +1,15 @@
 #pragma once
 // A stand-in service on the private bus: one object served under one name,
 // answered on a thread of its own, or not at all for a service that hangs.
+// Its handlers note what they were asked in Record.
 
 #include <systemd/sd-bus.h>
 
 #include <atomic>
+#include <mutex>
+#include <string>
 #include <thread>
+#include <vector>
 
 class CFakeBusService {
  public:
@@ -31,10 +35,20 @@ class CFakeBusService {
   CFakeBusService& operator=(const CFakeBusService&) = delete;
 
   bool IsReady() const { return mReady; }
+  void Record(const std::string& what_I) {
+    std::lock_guard<std::mutex> guard(mLock);
+    mRecords.push_back(what_I);
+  }
+  std::vector<std::string> Records() {
+    std::lock_guard<std::mutex> guard(mLock);
+    return mRecords;
+  }
 
  private:
   sd_bus* mBus = nullptr;
   bool mReady = false;
   std::atomic<bool> mStop{false};
   std::thread mThread;
+  std::mutex mLock;
+  std::vector<std::string> mRecords;
 };

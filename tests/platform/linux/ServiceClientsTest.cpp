@@ -21,51 +21,27 @@ namespace {
 
 using Strings = std::vector<std::string>;
 
-// The update helper as the wire shows it: for each call, its method and,
-// per key, the signature of the value and the texts of a list.
+// The update helper as it reads each call: "<method> <key>=<texts>...",
+// where a value that came as anything but a list of texts reads "?".
 class CFakeHelper {
  public:
-  using Entries = std::map<std::string, std::pair<std::string, Strings>>;
-
   explicit CFakeHelper(bool answers_I)
       : mService(OUpdaterClient::kServiceName, "/com/tavik/UpdateHelper",
                  "com.tavik.UpdateHelperProtocol", kVtable, this, answers_I) {}
   bool IsReady() const { return mService.IsReady(); }
-  std::vector<std::pair<std::string, Entries>> Arrived() {
-    std::lock_guard<std::mutex> guard(mLock);
-    return mArrived;
-  }
+  Strings Arrived() { return mService.Records(); }
 
  private:
   static int OnCall(sd_bus_message* message_I, void* self_I, sd_bus_error*) {
     auto* self = static_cast<CFakeHelper*>(self_I);
-    Entries entries;
-    sd_bus_message_enter_container(message_I, 'a', "{sv}");
-    while (sd_bus_message_enter_container(message_I, 'e', "sv") > 0) {
-      const char* key = nullptr;
-      const char* contents = nullptr;
-      sd_bus_message_read(message_I, "s", &key);
-      sd_bus_message_peek_type(message_I, nullptr, &contents);
-      auto& entry = entries[key];
-      entry.first = contents;
-      sd_bus_message_enter_container(message_I, 'v', contents);
-      char** texts = nullptr;
-      if (entry.first == "as" && sd_bus_message_read_strv(message_I, &texts) >= 0) {
-        for (char** text = texts; *text != nullptr; ++text) {
-          entry.second.push_back(*text);
-          free(*text);
-        }
-        free(texts);
-      } else {
-        sd_bus_message_skip(message_I, contents);
-      }
-      sd_bus_message_exit_container(message_I);
-      sd_bus_message_exit_container(message_I);
+    std::string call = sd_bus_message_get_member(message_I);
+    const std::shared_ptr<CXPCDictionary> request = BusDictionary::Read(message_I);
+    for (const auto& [key, value] : request->GetEntries()) {
+      const auto* texts = std::get_if<Strings>(&value);
+      call += " " + key + "=";
+      for (const std::string& text : texts != nullptr ? *texts : Strings{"?"}) call += text + ",";
     }
-    {
-      std::lock_guard<std::mutex> guard(self->mLock);
-      self->mArrived.emplace_back(sd_bus_message_get_member(message_I), entries);
-    }
+    self->mService.Record(call);
     return sd_bus_reply_method_return(message_I, "a{sv}", 1, "Error Code", "x", int64_t{0});
   }
 
@@ -76,8 +52,6 @@ class CFakeHelper {
       SD_BUS_METHOD("startLaunchDProcess", "a{sv}", "a{sv}", &OnCall, SD_BUS_VTABLE_UNPRIVILEGED),
       SD_BUS_VTABLE_END};
 
-  std::mutex mLock;
-  std::vector<std::pair<std::string, Entries>> mArrived;
   CFakeBusService mService;
 };
 
@@ -193,15 +167,10 @@ TEST_F(ServiceClients, DriverRequestsTravelAsListsOfTextsAndTheHelperIsFoundOnly
   client->stopProcess(request);
   client->startLaunchDProcess(request);
 
-  using Entries = CFakeHelper::Entries;
-  const Entries agents{{"LaunchAgents", {"as", {"com.tavik.taviktablet"}}},
-                       {"User", {"as", {"1000"}}}};
-  Entries all = agents;
-  all["BundleID"] = {"as", {"com.tavik.taviktablet", "com.tavik.TavikTouchDriver"}};
-  EXPECT_EQ(
-      helper.Arrived(),
-      (std::vector<std::pair<std::string, Entries>>{
-          {"stopLaunchDProcess", agents}, {"stopProcess", all}, {"startLaunchDProcess", all}}));
+  const std::string agents = " LaunchAgents=com.tavik.taviktablet, User=1000,";
+  const std::string all = " BundleID=com.tavik.taviktablet,com.tavik.TavikTouchDriver," + agents;
+  EXPECT_EQ(helper.Arrived(), (Strings{"stopLaunchDProcess" + agents, "stopProcess" + all,
+                                       "startLaunchDProcess" + all}));
 }
 
 TEST_F(ServiceClients, AHelperThatNeverAnswersCostsHalfASecondACallAndTheDriverStopGoesOn) {
@@ -230,6 +199,11 @@ TEST_F(ServiceClients, AHelperThatNeverAnswersCostsHalfASecondACallAndTheDriverS
 }
 
 TEST_F(ServiceClients, DataStoreTakesRepliesAndErrorsUserInfoAndThrowsWhenNothingComes) {
+  EXPECT_EQ(OPersistentDataStoreClient::client(), nullptr);
+  const SXPCError absent = OPersistentDataStoreClient().connectToService();
+  EXPECT_EQ(absent.code, 1) << "after its twenty tries";
+  EXPECT_EQ(absent.userInfo.at("Error"), "Service not running?");
+
   CFakeDataStore store;
   ASSERT_TRUE(store.IsReady());
   const std::shared_ptr<OPersistentDataStoreClient> client = OPersistentDataStoreClient::client();
@@ -277,13 +251,6 @@ TEST_F(ServiceClients, CategoryKeepsItsKeysInOneObjectAndDeleteKeyWritesNothingB
   EXPECT_TRUE(category->deleteKey("Logging"));
   EXPECT_TRUE(category->hasKey("Logging"));
   EXPECT_FALSE(category->deleteKey("Missing"));
-}
-
-TEST_F(ServiceClients, DataStoreThatIsNotThereFailsToConnectAfterItsTries) {
-  OPersistentDataStoreClient client;
-  const SXPCError error = client.connectToService();
-  EXPECT_EQ(error.code, 1);
-  EXPECT_EQ(error.userInfo.at("Error"), "Service not running?");
 }
 
 }  // namespace
