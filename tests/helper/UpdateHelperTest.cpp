@@ -108,6 +108,12 @@ void WriteConfig(const fs::path& file_I, const fs::path& driver_I) {
                         << "unit " << kDriver << " not-a-unit-name\n";
 }
 
+std::string ReadFile(const fs::path& file_I) {
+  std::ostringstream text;
+  text << std::ifstream(file_I).rdbuf();
+  return text.str();
+}
+
 // The helper's answer: its dictionary or its error's user information (null
 // for an error of the bus's own), and whether it was an error.
 struct SAnswer {
@@ -135,10 +141,9 @@ SAnswer Ask(const std::string& message_I, const CXPCDictionary* argument_I) {
   return answer;
 }
 
-pid_t StartProcess(const fs::path& program_I, const fs::path& stderr_I = {}) {
+pid_t StartProcess(const fs::path& program_I) {
   const pid_t child = fork();
   if (child == 0) {
-    if (!stderr_I.empty() && std::freopen(stderr_I.c_str(), "w", stderr) == nullptr) _exit(126);
     execl(program_I.c_str(), program_I.c_str(), "30", static_cast<char*>(nullptr));
     _exit(127);
   }
@@ -181,11 +186,7 @@ class UpdateHelper : public ::testing::Test {
     std::error_code ignored;
     if (!mFolder.empty()) fs::remove_all(mFolder, ignored);
   }
-  std::string Log() const {
-    std::ostringstream text;
-    text << std::ifstream(mFolder / "helper.log").rdbuf();
-    return text.str();
-  }
+  std::string Log() const { return ReadFile(mFolder / "helper.log"); }
   bool HelperRuns() const { return waitpid(mHelper, nullptr, WNOHANG) == 0; }
 
   CPrivateBus mBus;
@@ -288,12 +289,6 @@ TEST_F(UpdateHelper, ForeignOrMalformedRequestsAreRefusedAndTheHelperKeepsServin
   const CXPCDictionary good{{"LaunchAgents", Strings{kAgent}}};
   EXPECT_EQ(Ask("stopLaunchDProcess:", &good).Code(), 0);
   EXPECT_EQ(mSystemd.Jobs().size(), 2u);
-}
-
-std::string ReadFile(const fs::path& file_I) {
-  std::ostringstream text;
-  text << std::ifstream(file_I).rdbuf();
-  return text.str();
 }
 
 // The installed helper, started by the bus on the updater's first call.
