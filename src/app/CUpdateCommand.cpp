@@ -11,12 +11,14 @@
 #include "app/CUpdaterRun.h"
 #include "app/TavVersion.h"
 #include "common/LinuxPaths.h"
+#include "host/OXPCClient.h"
 #include "lab/CLabDesktop.h"
 #include "lab/CLabOptions.h"
 #include "lab/CLabPowerInhibitor.h"
 #include "lab/CLabSession.h"
 #include "platform/linux/CLinuxDesktop.h"
 #include "platform/linux/CLinuxPowerInhibitor.h"
+#include "platform/linux/CLinuxServiceDirectory.h"
 #include "update/CApplicationDelegate.h"
 
 namespace {
@@ -83,6 +85,9 @@ int CUpdateCommand::Run() {
   } else {
     runSeams.power = std::make_shared<CLinuxPowerInhibitor>();
     runSeams.desktop = std::make_shared<CLinuxDesktop>(seams->GetRegistry());
+    // The update helper on the system bus, where one is installed.
+    OXPCClient::SetServiceDirectory(OXPCClient::kPrivileged,
+                                    std::make_shared<CLinuxServiceDirectory>(true));
   }
   CRunSeams* seamsForDiscovery = seams.get();
   runSeams.makeDiscovery = [seamsForDiscovery] { return seamsForDiscovery->MakeDiscovery(); };
