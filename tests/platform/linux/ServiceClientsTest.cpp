@@ -119,17 +119,21 @@ class CFakeDataStore {
 class CRecordingDesktop : public CDesktop {
  public:
   int GetLaunchSenderPid() override { return 0; }
+  int GetOwnPid() override { return 1; }
   std::string GetApplicationIdOfProcess(int) override { return {}; }
+  std::string GetExecutableOfProcess(int) override { return {}; }
   bool IsApplicationProcess(int) override { return false; }
   int GetProcessArgumentCount() override { return 1; }
+  std::string GetApplicationPath(const std::string&) override { return {}; }
   std::vector<int> RunningApplications(const std::string& id_I) override {
     asked.push_back(id_I);
     return {};
   }
   bool TerminateApplication(int) override { return false; }
   bool IsTerminated(int) override { return true; }
-  bool LaunchApplication(const std::string&) override { return false; }
-  void PostNotification(const std::string&, const std::map<std::string, std::string>&) override {}
+  int LaunchApplication(const SLaunchRequest&) override { return 0; }
+  void PostNotification(const SNotification&) override {}
+  bool ObserveNotifications(std::function<void(const SNotification&)>) override { return true; }
   bool RequestHidAccess() override { return true; }
   Strings asked;
 };
