@@ -131,6 +131,8 @@ TEST_F(CI2CConnectorFTDIOverLab, AMissingHeldOrFailingBridgeLeavesTheLinkClosed)
   FT_HANDLE other = OpenElsewhere(FT_OK);
   EXPECT_FALSE(link.Open(0));
   EXPECT_TRUE(link.GetFoundButNotOpenable());
+  link.Close();
+  EXPECT_FALSE(link.GetFoundButNotOpenable()) << "a closed link forgets it";
   mApi->FT_Close(other);
 
   // A probe before a request that cannot be written closes the bridge.
@@ -215,12 +217,12 @@ TEST_F(CI2CConnectorFTDITest, ARefusedByteStartsTheRequestAgainAsDeepAsAsked) {
   ASSERT_TRUE(mLink.Open(0));
   for (const auto& [acks, depth, sent] : rows) {
     SCOPED_TRACE(depth);
-    mApi.writes.clear();
+    mApi.sent.clear();
     mApi.acks.assign(acks.begin(), acks.end());
     mApi.reads = {0x6E, 0x80, 0xBE};
     const Bytes reply = mLink.SendRequest({0x6E, 0x51, 0x81, 0x0C, 0xB2}, 0.0, 38, depth);
     EXPECT_EQ(reply, sent.back() == 0x6F ? DDCFrame::NullReply() : Bytes{});
-    EXPECT_EQ(mApi.Sent(), sent);
+    EXPECT_EQ(mApi.sent, sent);
   }
 }
 

@@ -39,7 +39,7 @@ TEST_F(RTDISPTest, AnISPEntryAtTheLastTryFailsTheRunAndLeavesISP) {
   std::vector<std::string> errors(9, "Timed out waiting for bit change");
   errors.push_back("Fail to Enter ISP mode");
   EXPECT_EQ(notifier.errors, errors);
-  const Bytes sent = mApi.Sent();
+  const Bytes& sent = mApi.sent;
   EXPECT_EQ(Bytes(sent.end() - 3, sent.end()), (Bytes{0x94, 0x6F, 0x00})) << "ISP mode left";
 }
 

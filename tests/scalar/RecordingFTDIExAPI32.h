@@ -3,7 +3,7 @@
 // reset fails `resetFailures` times, whose engine answers the bad-command
 // probe with `probeAnswer`, an acknowledge bit for every byte clocked out
 // (from `acks`, 0 once they run out) and a byte for every byte clocked in
-// (from `reads`, `defaultRead` once they run out). Every FT_Write is kept.
+// (from `reads`, `defaultRead` once they run out).
 
 #include <cstdint>
 #include <deque>
@@ -19,18 +19,9 @@ class RecordingFTDIExAPI32 : public CFTDIExAPI32 {
   std::deque<uint8_t> reads;
   uint8_t defaultRead = 0xFF;
 
-  std::vector<std::vector<uint8_t>> writes;
+  std::vector<uint8_t> sent;  // the bytes clocked out onto the bus, in order
   int resets = 0;
   bool open = false;
-
-  // The bytes clocked out onto the bus, in order.
-  std::vector<uint8_t> Sent() const {
-    std::vector<uint8_t> sent;
-    for (const auto& w : writes) {
-      if (IsByteOut(w)) sent.push_back(w[3]);
-    }
-    return sent;
-  }
 
   FT_STATUS FT_ListDevices(void* arg1_IO, void* arg2_IO, uint32_t flags_I) override {
     if (flags_I == FT_LIST_NUMBER_ONLY) {
@@ -62,10 +53,11 @@ class RecordingFTDIExAPI32 : public CFTDIExAPI32 {
   FT_STATUS FT_Write(FT_HANDLE, const void* buffer_I, uint32_t size_I,
                      uint32_t* written_O) override {
     const auto* bytes = static_cast<const uint8_t*>(buffer_I);
-    const std::vector<uint8_t>& w = writes.emplace_back(bytes, bytes + size_I);
+    const std::vector<uint8_t> w(bytes, bytes + size_I);
     if (w == std::vector<uint8_t>{0xAA})
       mPending.insert(mPending.end(), probeAnswer.begin(), probeAnswer.end());
-    if (IsByteOut(w)) {
+    if (w.size() > 3 && w[0] == 0x11) {  // a byte clocked out
+      sent.push_back(w[3]);
       mPending.push_back(Next(acks, 0));
     } else if (w.size() > 3 && w[3] == 0x24) {  // a byte clocked in
       mPending.push_back(Next(reads, defaultRead));
@@ -88,9 +80,6 @@ class RecordingFTDIExAPI32 : public CFTDIExAPI32 {
   }
 
  private:
-  static bool IsByteOut(const std::vector<uint8_t>& w_I) {
-    return w_I.size() > 3 && w_I[0] == 0x11;
-  }
   static uint8_t Next(std::deque<uint8_t>& queue_IO, uint8_t default_I) {
     if (queue_IO.empty()) return default_I;
     const uint8_t value = queue_IO.front();
