@@ -84,6 +84,7 @@ FT_STATUS CLabFTDIBridge::Write(const uint8_t* data_I, uint32_t size_I, uint32_t
   if (taken) {
     if (IsMpsse()) mEngine.Write(data_I, size_I);
     written_O = size_I;
+    Remember(data_I, size_I);
   }
   AfterReport();
   return taken ? FT_OK : FT_IO_ERROR;

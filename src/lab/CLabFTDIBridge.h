@@ -17,6 +17,7 @@
 // until an update writes an image that names one.
 
 #include <cstdint>
+#include <deque>
 #include <memory>
 #include <string>
 #include <vector>
@@ -43,6 +44,8 @@ class CLabFTDIBridge : public CLabBoard {
   static constexpr size_t kFlashBlocks = 16;
   static constexpr size_t kFactoryBlocks = 4;
   static constexpr uint16_t kShippedRelease = 0x0100;
+  // How many of the last transfers written the bridge shows.
+  static constexpr size_t kRecentWrites = 64;
 
   explicit CLabFTDIBridge(SLabFTDIDescription description_I);
 
@@ -66,6 +69,10 @@ class CLabFTDIBridge : public CLabBoard {
   const CLabScalarMcu& GetMcu() const { return mMcu; }
   const CLabDdcScalar& GetScalar() const { return mScalar; }
   const CLabMpsse& GetEngine() const { return mEngine; }
+  const CLabI2CBus& GetBus() const { return mBus; }
+  // The last transfers written and taken, oldest first, as a USB analyser
+  // beside the bridge would show them.
+  const std::deque<std::vector<uint8_t>>& GetRecentWrites() const { return mRecentWrites; }
   const SLabPanel& GetPanel() const { return mDescription.panel; }
   bool IsMpsse() const { return mMode == FT_BITMODE_MPSSE; }
 
@@ -76,6 +83,10 @@ class CLabFTDIBridge : public CLabBoard {
  private:
   LabViolationSink Sink();
   bool TakeTransfer(bool isRead_I);
+  void Remember(const uint8_t* data_I, uint32_t size_I) {
+    mRecentWrites.emplace_back(data_I, data_I + size_I);
+    if (mRecentWrites.size() > kRecentWrites) mRecentWrites.pop_front();
+  }
   void Restart();
 
   SLabFTDIDescription mDescription;
@@ -85,4 +96,5 @@ class CLabFTDIBridge : public CLabBoard {
   CLabDdcScalar mScalar;
   CLabScalarMcu mMcu;
   uint8_t mMode = FT_BITMODE_RESET;
+  std::deque<std::vector<uint8_t>> mRecentWrites;
 };

@@ -55,6 +55,8 @@ class CLabI2CBus {
   void Drive(EDrive scl_I, EDrive sda_I);
   bool GetScl() const { return mScl; }
   bool GetSda() const { return mSda; }
+  // No transaction open: none started since power-on or the last STOP.
+  bool IsIdle() const { return mPhase == EPhase::eIdle; }
   // Back to an idle bus, with no transaction open (power-on).
   void Reset();
 

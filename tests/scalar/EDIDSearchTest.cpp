@@ -5,7 +5,6 @@
 
 #include "scalar/Connector.h"
 #include "scalar/HelperUtils.h"
-#include "scalar/RTDISP.h"
 
 namespace {
 
@@ -59,14 +58,6 @@ TEST(CapabilitiesString, KeepsTheTextUpToTheParenthesisClosingTheFirst) {
   for (const auto& [text, kept] : rows) {
     EXPECT_EQ(Connector::ValidateCapabilitiesString(Text(text)), kept) << text;
   }
-}
-
-TEST(CalcByteCRC, IsCrc8WithPolynomial7AndNoReflection) {
-  const Bytes blank(65536, 0xFF);
-  EXPECT_EQ(RTDISP::CalcByteCRC(blank.data(), blank.size()), 0xDE);
-  const Bytes check = Text("123456789");  // the catalogue check value of CRC-8
-  EXPECT_EQ(RTDISP::CalcByteCRC(check.data(), check.size()), 0xF4);
-  EXPECT_EQ(RTDISP::CalcByteCRC(blank.data(), 0), 0x00);
 }
 
 }  // namespace

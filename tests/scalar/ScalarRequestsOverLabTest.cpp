@@ -1,46 +1,27 @@
-// The request layer's multi-part readers against the lab scalar: each read
+// The request layer's readers against the lab scalar: each multi-part read
 // ends the way the scalar ends it (the offset echoed, the null reply past
-// the last block) and gathers the whole value.
+// the last block) and gathers the whole value; the version and the display
+// information come back as the scalar keeps them.
 
 #include <gtest/gtest.h>
 
 #include <functional>
 #include <tuple>
 
-#include "lab/CLabFTDIBridge.h"
-#include "lab/CLabFTDIExAPI32.h"
-#include "lab/CLabProducts.h"
-#include "scalar/CI2CConnectorFTDI.h"
-#include "support/LabFixture.h"
+#include "scalar/ScalarLabFixture.h"
 #include "support/LogCapture.h"
 
 namespace {
 
 using Bytes = std::vector<uint8_t>;
 
-class ScalarRequestsOverLab : public LabFixture {
- protected:
-  void SetUp() override {
-    LabFixture::SetUp();
-    CLabProducts::Plug(*mBus, "display-ftdi");
-    mBridge = std::dynamic_pointer_cast<CLabFTDIBridge>(mBus->FindBoard("display-ftdi-scalar"));
-    ASSERT_NE(mBridge, nullptr);
-    mApi = std::make_unique<CLabFTDIExAPI32>(mBus);
-    CI2CConnectorFTDI::SetApi(mApi.get());
-  }
-  void TearDown() override {
-    CI2CConnectorFTDI::SetApi(nullptr);
-    LabFixture::TearDown();
-  }
+class ScalarRequestsOverLab : public ScalarLabFixture {};
 
-  std::shared_ptr<CLabFTDIBridge> mBridge;
-  std::unique_ptr<CLabFTDIExAPI32> mApi;
-};
+Bytes AsBytes(const std::string& text_I) { return Bytes(text_I.begin(), text_I.end()); }
 
-TEST_F(ScalarRequestsOverLab, MultiPartReadsGatherTheWholeValueAndEndWithoutWarning) {
+TEST_F(ScalarRequestsOverLab, ReadsGatherTheWholeValueAndEndWithoutWarning) {
   const Bytes edid = mBridge->GetScalar().GetEdid();
-  const std::string caps = CLabDdcScalar::CapabilitiesString();
-  const Bytes capsBytes(caps.begin(), caps.end());
+  const Bytes caps = AsBytes(CLabDdcScalar::CapabilitiesString());
   // name, read, expected
   // clang-format off
   const std::vector<std::tuple<const char*, std::function<Bytes(CI2CConnectorFTDI&)>, Bytes>>
@@ -50,16 +31,18 @@ TEST_F(ScalarRequestsOverLab, MultiPartReadsGatherTheWholeValueAndEndWithoutWarn
           {"EDID by 16-byte block, ended by the null reply",
            [](CI2CConnectorFTDI& link) { return link.ReadEDID(-1); }, edid},
           {"capabilities, Linnet form",
-           [](CI2CConnectorFTDI& link) {
-             const std::string text = link.CapabilitiesString();
-             return Bytes(text.begin(), text.end());
-           }, capsBytes},
+           [](CI2CConnectorFTDI& link) { return AsBytes(link.CapabilitiesString()); }, caps},
           {"capabilities, GreyOwl form once the display information is known",
            [](CI2CConnectorFTDI& link) {
-             EXPECT_EQ(link.ReadDisplayInformation(-1).size(), 55u);
-             const std::string text = link.CapabilitiesString();
-             return Bytes(text.begin(), text.end());
-           }, capsBytes},
+             const Bytes information = link.ReadDisplayInformation(-1);
+             EXPECT_EQ(information.size(), 55u);
+             EXPECT_STREQ(reinterpret_cast<const char*>(&information.at(3 + 27)), "LABFT0701");
+             return AsBytes(link.CapabilitiesString());
+           }, caps},
+          {"firmware version of the shipped release",
+           [](CI2CConnectorFTDI& link) {
+             return AsBytes(link.FWVersion().AsString(FileVersion::EStyleThreePart));
+           }, AsBytes("1.0.0")},
       };
   // clang-format on
   for (const auto& [name, read, expected] : rows) {
@@ -74,11 +57,23 @@ TEST_F(ScalarRequestsOverLab, MultiPartReadsGatherTheWholeValueAndEndWithoutWarn
   EXPECT_EQ(mBridge->GetViolations(), std::vector<std::string>{});
 }
 
-TEST_F(ScalarRequestsOverLab, TheNullReplyToASaveIsAnAcknowledgement) {
-  CI2CConnectorFTDI link;
-  ASSERT_TRUE(link.Open(0));
-  EXPECT_TRUE(link.SaveSettingsToScalar());
-  EXPECT_EQ(mBridge->GetScalar().GetSaves(), 1u);
+TEST_F(ScalarRequestsOverLab, ASaveIsAcknowledgedByTheNullReplyAndTracedOnlyWhileTracingIsOn) {
+  for (int trace : {0, 1}) {
+    SCOPED_TRACE(trace);
+    LogCapture log;
+    g_DebugTrace = trace;
+    CI2CConnectorFTDI link;
+    ASSERT_TRUE(link.Open(0));
+    const double slept = mClock->GetTotalSlept();
+    EXPECT_TRUE(link.SaveSettingsToScalar());
+    g_DebugTrace = 0;
+    EXPECT_EQ(mBridge->GetScalar().GetSaves(), trace + 1u);
+    // 20 ms for each of the five request bytes and the read address, the
+    // request's own wait, and the scalar's time to commit.
+    EXPECT_NEAR(mClock->GetTotalSlept() - slept, 6 * 0.02 + 0.22 + 0.2, 1e-9);
+    EXPECT_EQ(log.LogContains("CI2CConnectorFTDI::Open ID = 0\n"), trace == 1);
+    EXPECT_EQ(log.LogContains("I2CWrite buffer"), trace == 1);
+  }
 }
 
 }  // namespace

@@ -38,8 +38,9 @@ class CRecorder : public CUpdateNotifier {
   void UpdateStatus(ECONTROLLER_STATE state_I) override {
     if (onStatus) onStatus(state_I);
   }
-  void UpdateProgress(unsigned int) override {}
+  void UpdateProgress(unsigned int percent_I) override { progress.push_back(percent_I); }
   Strings errors;
+  std::vector<unsigned int> progress;
   std::function<void(ECONTROLLER_STATE)> onStatus;
 
  private:
@@ -88,6 +89,7 @@ class UpdateScalarOverLab : public LabFixture {
     discovery->SetConfig(TAV_DATA_DIR "/fw_loader.ini");
     mController = std::make_unique<CLinuxUpdateController>(std::move(discovery));
     mRecorder.errors.clear();
+    mRecorder.progress.clear();
     mController->RegisterCallback(&mRecorder);
     EXPECT_TRUE(mController->UpdateDeviceList());
     EXPECT_TRUE(mController->SetSelectedDevice(kVendor, penProductId_I));
@@ -137,6 +139,10 @@ TEST_F(UpdateScalarOverLab, EachVariantEndsWithTheImageInFlashBlockForBlock) {
     EXPECT_TRUE(Update(pen, serial));
     EXPECT_EQ(mController->GetState(), ESTATE_SUCCESS);
     EXPECT_EQ(mRecorder.errors, errors);
+    // Blocks go from the last down, then the run ends; the new firmware
+    // runs once ISP mode is left.
+    EXPECT_EQ(mRecorder.progress, (std::vector<unsigned int>{0, 50, 100, 100}));
+    EXPECT_FALSE(bridges[0]->GetMcu().IsInIsp());
     ExpectFlashHoldsImage(*bridges[0]);
     EXPECT_EQ(bridges[0]->GetViolations(), Strings{});
   }
@@ -155,6 +161,7 @@ TEST_F(UpdateScalarOverLab, AFlashThatNeverErasesOrStaysBusyFailsTheUpdateUntouc
   EXPECT_EQ(mRecorder.errors.end()[-2], "Exausted retries attempting to write block 2");
   EXPECT_EQ(mRecorder.errors.back(), "General Program Failure");
   EXPECT_EQ(bridges[0]->GetFlash().GetData(), before);
+  EXPECT_FALSE(bridges[0]->GetMcu().IsInIsp()) << "a failed run leaves ISP mode";
 
   // A busy bit that never clears ends the run before anything is erased.
   const auto stuck = Plug({"display-ftdi"});
