@@ -101,7 +101,8 @@ bool CLabDdcScalar::OnWrite(uint8_t byte_I) {
 
 uint8_t CLabDdcScalar::OnRead() {
   if (mLeadingSent < mLeading.size()) return mLeading[mLeadingSent++];
-  if (mHeldBack) return 0x00;
+  // Nothing more to say: SDA let go, so the host's STOP gets through.
+  if (mHeldBack) return 0xFF;
   return mSent < mReply.size() ? mReply[mSent++] : 0xFF;
 }
 

@@ -8,6 +8,7 @@
 #include <functional>
 #include <tuple>
 
+#include "scalar/DDCFrame.h"
 #include "scalar/ScalarLabFixture.h"
 #include "support/LogCapture.h"
 
@@ -74,6 +75,29 @@ TEST_F(ScalarRequestsOverLab, ASaveIsAcknowledgedByTheNullReplyAndTracedOnlyWhil
     EXPECT_EQ(log.LogContains("CI2CConnectorFTDI::Open ID = 0\n"), trace == 1);
     EXPECT_EQ(log.LogContains("I2CWrite buffer"), trace == 1);
   }
+}
+
+TEST_F(ScalarRequestsOverLab, AReplyNotReadyIsTheNullReplyAndAStaleOneIsFoundPastItsLeftovers) {
+  CI2CConnectorFTDI link;
+  ASSERT_TRUE(link.Open(0));
+  const Bytes request = DDCFrame::FWVersion().bytes;
+  const Bytes reply = link.SendRequest(request, 0.07, 38, 1);
+  ASSERT_EQ(reply.size(), 11u);
+  // fault, reply
+  const std::vector<std::tuple<std::string, Bytes>> rows = {
+      {"not-ready", DDCFrame::NullReply()},
+      {"stale", reply},
+  };
+  for (const auto& [kind, expected] : rows) {
+    SCOPED_TRACE(kind);
+    SLabFault fault;
+    std::string error;
+    ASSERT_TRUE(ParseLabFault(kind + "@1", fault, error)) << error;
+    mBus->AddFaults({fault}, 1);
+    EXPECT_EQ(link.SendRequest(request, 0.07, 38, 1), expected);
+    EXPECT_TRUE(mBridge->GetBus().IsIdle());
+  }
+  EXPECT_EQ(mBridge->GetViolations(), std::vector<std::string>{});
 }
 
 }  // namespace
