@@ -60,8 +60,7 @@ class OProcessUtils {
   void addObserver(const std::string& name_I, const std::string& object_I);
   // Hands every notification of that name, from any sender, to `handler_I`
   // as well, on the desktop's listening thread.
-  void addObserver(const std::string& name_I,
-                   std::function<void(const SNotification&)> handler_I);
+  void addObserver(const std::string& name_I, std::function<void(const SNotification&)> handler_I);
   size_t GetObserverCount() const;
 
  private:
