@@ -85,8 +85,7 @@ void CLinuxPersistentSettings::RegisterForLogging() {
   if (mLoggingEnabler) return;
   mLoggingEnabler = std::make_shared<LoggingEnable>();
   OProcessUtils::GetInstance()->addObserver(
-      kLoggingEnabledKey,
-      [enabler = mLoggingEnabler](const SNotification& notification_I) {
+      kLoggingEnabledKey, [enabler = mLoggingEnabler](const SNotification& notification_I) {
         enabler->enableLogging(notification_I);
       });
 }
@@ -105,7 +104,7 @@ bool CLinuxPersistentSettings::IsKeyPresent(const std::string& key_I,
     return category ? category->hasKey(key) : mStore->hasKey(key);
   } catch (const std::exception& exception) {
     TavLog::Warning("CMacPersistentSettings::IsKeyPresent() caught exception named %s\n",
-                  exception.what());
+                    exception.what());
     return false;
   }
 }
@@ -118,8 +117,7 @@ size_t CLinuxPersistentSettings::CountKeys(const std::string& category_I) {
   });
 }
 
-bool CLinuxPersistentSettings::DeleteKey(const std::string& key_I,
-                                         const std::string& category_I) {
+bool CLinuxPersistentSettings::DeleteKey(const std::string& key_I, const std::string& category_I) {
   if (!mStore) return CConfigFolderSettings::DeleteKey(key_I, category_I);
   const std::string key = FormatKey(key_I);
   return Guarded("DeleteKey", key, false, [&] {
@@ -136,8 +134,7 @@ bool CLinuxPersistentSettings::SetKeyAndBool(const std::string& key_I, bool valu
   return stored;
 }
 
-bool CLinuxPersistentSettings::SetKeyAndString(const std::string& key_I,
-                                               const std::string& value_I,
+bool CLinuxPersistentSettings::SetKeyAndString(const std::string& key_I, const std::string& value_I,
                                                const std::string& category_I) {
   if (!mStore) return CConfigFolderSettings::SetKeyAndString(key_I, value_I, category_I);
   const std::string key = FormatKey(key_I);
