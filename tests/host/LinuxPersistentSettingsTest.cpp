@@ -61,7 +61,8 @@ TEST_F(LinuxPersistentSettings, ValuesTravelToTheStoreAsTextsUnderKeysWithoutBla
   ASSERT_TRUE(store.IsReady());
   std::vector<SNotification> heard;
   OProcessUtils::GetInstance()->addObserver(
-      "LOGGING_ENABLED", [&](const SNotification& notification_I) { heard.push_back(notification_I); });
+      "LOGGING_ENABLED",
+      [&](const SNotification& notification_I) { heard.push_back(notification_I); });
   const size_t observers = OProcessUtils::GetInstance()->GetObserverCount();
 
   CLinuxPersistentSettings settings;
@@ -147,8 +148,8 @@ TEST_F(LinuxPersistentSettings, WithoutAStoreTheValuesStayInTheConfigurationFold
     LogCapture capture;
     settings.Init();
     EXPECT_FALSE(settings.IsUsingDataStore());
-    EXPECT_TRUE(capture.LogContains("no data store answers; values kept in " +
-                                    StoreFile().string()));
+    EXPECT_TRUE(
+        capture.LogContains("no data store answers; values kept in " + StoreFile().string()));
     EXPECT_TRUE(settings.SetKeyAndBool("Beta Updates", true));
   }
   std::ifstream in(StoreFile());
