@@ -11,6 +11,7 @@
 #include "app/CUpdaterRun.h"
 #include "app/TavVersion.h"
 #include "common/LinuxPaths.h"
+#include "host/CLinuxPersistentSettings.h"
 #include "host/OXPCClient.h"
 #include "lab/CLabDesktop.h"
 #include "lab/CLabOptions.h"
@@ -88,6 +89,10 @@ int CUpdateCommand::Run() {
     // The update helper on the system bus, where one is installed.
     OXPCClient::SetServiceDirectory(OXPCClient::kPrivileged,
                                     std::make_shared<CLinuxServiceDirectory>(true));
+    // The user's data store on the session bus, where one runs, keeps the
+    // persistent settings.
+    OXPCClient::SetServiceDirectory(0, std::make_shared<CLinuxServiceDirectory>(false));
+    CPersistentSettings::SetFactory([] { return std::make_unique<CLinuxPersistentSettings>(); });
   }
   CRunSeams* seamsForDiscovery = seams.get();
   runSeams.makeDiscovery = [seamsForDiscovery] { return seamsForDiscovery->MakeDiscovery(); };

@@ -84,6 +84,13 @@ void OProcessUtils::addObserver(const std::string& name_I, const std::string& ob
   mObservers.emplace(name_I, object_I);
 }
 
+void OProcessUtils::addObserver(const std::string& name_I,
+                                std::function<void(const SNotification&)> handler_I) {
+  std::lock_guard<std::mutex> guard(mLock);
+  mObservers.emplace(name_I, "");
+  mHandlers.emplace(name_I, std::move(handler_I));
+}
+
 void OProcessUtils::removeObserver(const std::string& name_I, const std::string& object_I) {
   std::lock_guard<std::mutex> guard(mLock);
   mObservers.erase({name_I, object_I});
@@ -115,6 +122,14 @@ void OProcessUtils::handleNotification(const SNotification& notification_I) {
     // Not ours: an application that quit by itself, which changes nothing.
     if (found != mQuitProcessIDList.end()) mQuitProcessIDList.erase(found);
   }
+  std::vector<std::function<void(const SNotification&)>> handlers;
+  {
+    std::lock_guard<std::mutex> guard(mLock);
+    const auto [first, last] = mHandlers.equal_range(notification_I.name);
+    for (auto it = first; it != last; ++it) handlers.push_back(it->second);
+  }
+  // Outside the lock: a handler may ask this object again.
+  for (const auto& handler : handlers) handler(notification_I);
 }
 
 bool OProcessUtils::applicationIsRunningWithBundleIdentifier(

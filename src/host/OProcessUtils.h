@@ -6,6 +6,8 @@
 //
 // Notices arrive on the desktop's listening thread; the list has its lock.
 
+#include <functional>
+#include <map>
 #include <memory>
 #include <mutex>
 #include <optional>
@@ -56,6 +58,9 @@ class OProcessUtils {
 
   // `object_I` empty: from any sender.
   void addObserver(const std::string& name_I, const std::string& object_I);
+  // Hands every notification of that name, from any sender, to `handler_I`
+  // as well, on the desktop's listening thread.
+  void addObserver(const std::string& name_I, std::function<void(const SNotification&)> handler_I);
   size_t GetObserverCount() const;
 
  private:
@@ -70,4 +75,5 @@ class OProcessUtils {
   mutable std::mutex mLock;
   std::vector<int> mQuitProcessIDList;
   std::multiset<std::pair<std::string, std::string>> mObservers;
+  std::multimap<std::string, std::function<void(const SNotification&)>> mHandlers;
 };

@@ -3,13 +3,28 @@
 #include <algorithm>
 
 #include "common/TavLog.h"
-#include "settings/CLinuxPersistentSettings.h"
+#include "settings/CConfigFolderSettings.h"
+
+namespace {
+
+CPersistentSettings::Factory& RegisteredFactory() {
+  static CPersistentSettings::Factory factory;
+  return factory;
+}
+
+}  // namespace
+
+void CPersistentSettings::SetFactory(Factory factory_I) {
+  RegisteredFactory() = std::move(factory_I);
+}
 
 CPersistentSettings* CPersistentSettings::SharedInstance() {
   static CPersistentSettings* instance = [] {
-    CPersistentSettings* created = new CLinuxPersistentSettings();
+    const Factory& factory = RegisteredFactory();
+    std::unique_ptr<CPersistentSettings> created =
+        factory ? factory() : std::make_unique<CConfigFolderSettings>();
     created->Init();
-    return created;
+    return created.release();
   }();
   return instance;
 }

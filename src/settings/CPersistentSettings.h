@@ -7,6 +7,7 @@
 // category is the root itself. Keys and category names are stored without
 // blanks, so "My Key" and "MyKey" name the same value.
 
+#include <functional>
 #include <memory>
 #include <string>
 
@@ -21,9 +22,15 @@ class CPersistentSettings {
     ESTATUS_SAVE_FAILED = 2,  // the last change did not reach the file
   };
 
-  // The one store of the process, made and initialised on first use as the
-  // platform's form. Callers never delete it. Takes no lock.
+  using Factory = std::function<std::unique_ptr<CPersistentSettings>()>;
+
+  // The one store of the process, made and initialised on first use by the
+  // registered factory, else as the configuration-folder file. Callers
+  // never delete it. Takes no lock.
   static CPersistentSettings* SharedInstance();
+  // The platform's form, which this folder cannot name: the application
+  // registers it before anything asks for SharedInstance().
+  static void SetFactory(Factory factory_I);
 
   explicit CPersistentSettings(std::string filePath_I = std::string());
   virtual ~CPersistentSettings() = default;

@@ -1,10 +1,12 @@
 // tavik-update-helper on a private bus, with polkit and systemd answered by
 // stand-ins: what it does for whom, and what it refuses.
+#include <grp.h>
 #include <gtest/gtest.h>
 #include <signal.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
@@ -289,6 +291,57 @@ TEST_F(UpdateHelper, ForeignOrMalformedRequestsAreRefusedAndTheHelperKeepsServin
   const CXPCDictionary good{{"LaunchAgents", Strings{kAgent}}};
   EXPECT_EQ(Ask("stopLaunchDProcess:", &good).Code(), 0);
   EXPECT_EQ(mSystemd.Jobs().size(), 2u);
+}
+
+TEST_F(UpdateHelper, StartProcessStartsOnlyAConfiguredExecutableAndAsTheCaller) {
+  if (geteuid() != 0) GTEST_SKIP() << "only root can call as another user";
+  // The driver notes who runs it; the caller is another user than the helper,
+  // who can reach the bus, the driver and its note.
+  const fs::path started = mFolder / "started";
+  std::ofstream(mFolder / "tavik-test-driver") << "#!/bin/sh\nid -u > " << started.string() << "\n";
+  std::ofstream{started};
+  fs::permissions(started, fs::perms(0666));
+  fs::permissions(mFolder, fs::perms(0755));
+  fs::permissions(mFolder / "tavik-test-driver", fs::perms(0755));
+  const std::string address = std::getenv("DBUS_SYSTEM_BUS_ADDRESS");
+  fs::permissions(fs::path(address.substr(address.find('/'))).parent_path(), fs::perms(0711));
+  // The answer's code, from a child that has become nobody.
+  const auto startAsNobody = [](const std::string& identifier_I) {
+    const pid_t child = fork();
+    if (child == 0) {
+      if (setgroups(0, nullptr) != 0 || setgid(65534) != 0 || setuid(65534) != 0) _exit(126);
+      const CXPCDictionary request{{"BundleID", Strings{identifier_I}}};
+      _exit(static_cast<int>(Ask("startProcess:withReply:", &request).Code() & 0x7F));
+    }
+    int status = 0;
+    waitpid(child, &status, 0);
+    return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+  };
+
+  EXPECT_EQ(startAsNobody("com.tavik.Other"), 3);
+  EXPECT_EQ(ReadFile(started), "") << "nothing started";
+
+  ASSERT_EQ(startAsNobody(kDriver), 0) << Log();
+  EXPECT_TRUE(TavPollUntil(5.0, 0.01, [&] { return !ReadFile(started).empty(); }));
+  EXPECT_EQ(ReadFile(started), "65534\n");
+}
+
+TEST_F(UpdateHelper, FindLoggedInUsersAnswersTheUsersLogindKnows) {
+  Strings expected;
+  std::error_code code;
+  for (const auto& entry : fs::directory_iterator("/run/systemd/users", code)) {
+    const std::string name = entry.path().filename().string();
+    if (name.find_first_not_of("0123456789") == std::string::npos) expected.push_back(name);
+  }
+  const SAnswer answer = Ask("findLoggedInUsersWithReply:", nullptr);
+  EXPECT_FALSE(answer.error);
+  EXPECT_EQ(answer.Code(), 0);
+  ASSERT_NE(answer.body, nullptr);
+  ASSERT_NE(answer.body->Get<Strings>("Users"), nullptr);
+  Strings users = *answer.body->Get<Strings>("Users");
+  std::sort(users.begin(), users.end());
+  std::sort(expected.begin(), expected.end());
+  EXPECT_EQ(users, expected);
 }
 
 // The installed helper, started by the bus on the updater's first call.

@@ -9,7 +9,7 @@
 #include <fstream>
 #include <optional>
 
-#include "settings/CLinuxPersistentSettings.h"
+#include "settings/CConfigFolderSettings.h"
 #include "support/LogCapture.h"
 
 namespace fs = std::filesystem;
@@ -97,7 +97,7 @@ TEST_F(PersistentSettingsTest, BaseStoreKeepsValuesInItsFileAcrossStarts) {
 }
 
 TEST_F(PersistentSettingsTest, LinuxStoreWritesYesAndNoIntoTheConfigFolder) {
-  CLinuxPersistentSettings store;
+  CConfigFolderSettings store;
   store.Init();
   EXPECT_EQ(store.GetFilePath(), StoreFile().string());
   EXPECT_FALSE(fs::exists(StoreFile()));
@@ -116,7 +116,7 @@ TEST_F(PersistentSettingsTest, LinuxStoreWritesYesAndNoIntoTheConfigFolder) {
   store.SetKeyAndString("Typed", "yes");
   EXPECT_TRUE(store.GetBoolForKey("Typed"));
 
-  CLinuxPersistentSettings again;
+  CConfigFolderSettings again;
   again.Init();
   EXPECT_TRUE(again.GetBoolForKey("Beta Updates"));
   EXPECT_EQ(again.GetStringForKey("Device"), "pen");
@@ -127,7 +127,7 @@ TEST_F(PersistentSettingsTest, LegacyFileMovesInOnceAndIsRemoved) {
             "<root type=\"map\"><Agreed type=\"bool\">true</Agreed><Off type=\"bool\">false</Off>"
             "<Name type=\"string\">old</Name><Count type=\"integer\">4</Count></root>");
   {
-    CLinuxPersistentSettings store;
+    CConfigFolderSettings store;
     store.Init();
     EXPECT_TRUE(store.GetBoolForKey("Agreed"));
     EXPECT_FALSE(store.GetBoolForKey("Off"));
@@ -137,7 +137,7 @@ TEST_F(PersistentSettingsTest, LegacyFileMovesInOnceAndIsRemoved) {
     EXPECT_FALSE(fs::exists(LegacyFile()));
     EXPECT_TRUE(fs::exists(LegacyFile().parent_path()));
   }
-  CLinuxPersistentSettings second;
+  CConfigFolderSettings second;
   second.Init();
   EXPECT_TRUE(second.GetBoolForKey("Agreed"));
   EXPECT_EQ(second.CountKeys(), 3u);
@@ -147,7 +147,7 @@ TEST_F(PersistentSettingsTest, LegacyFileStaysWhenItIsBadOrCannotBeMovedIn) {
   LogCapture capture;
   WriteFile(LegacyFile(), "<root><unclosed></root>");
   {
-    CLinuxPersistentSettings store;
+    CConfigFolderSettings store;
     store.Init();
     EXPECT_EQ(store.CountKeys(), 0u);
     EXPECT_TRUE(fs::exists(LegacyFile()));
@@ -156,7 +156,7 @@ TEST_F(PersistentSettingsTest, LegacyFileStaysWhenItIsBadOrCannotBeMovedIn) {
   // A file where the configuration folder should be: nothing can be saved.
   WriteFile(LegacyFile(), "<root><Name>old</Name></root>");
   WriteFile(mRoot / "config", "in the way");
-  CLinuxPersistentSettings blocked;
+  CConfigFolderSettings blocked;
   blocked.Init();
   EXPECT_EQ(blocked.GetLastStatus(), CPersistentSettings::ESTATUS_SAVE_FAILED);
   EXPECT_TRUE(fs::exists(LegacyFile()));

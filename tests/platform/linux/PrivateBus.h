@@ -1,8 +1,9 @@
 #pragma once
 // A private D-Bus daemon for one test, reachable as both the system and the
 // session bus of this process and of every process it starts, so that
-// nothing touches the machine's own. Its policy lets anyone own any name,
-// as the stand-in services need. A test may give it a folder of services
+// nothing touches the machine's own. Its policy lets any user connect, as
+// a test's caller of another user needs, and anyone own any name, as the
+// stand-in services need. A test may give it a folder of services
 // to start on demand, and further configuration files to include.
 
 #include <signal.h>
@@ -86,7 +87,8 @@ class CPrivateBus {
            << address_I << "</listen>\n";
     if (!options_I.serviceDir.empty())
       config << "  <servicedir>" << options_I.serviceDir << "</servicedir>\n";
-    config << "  <policy context=\"default\">\n    <allow send_destination=\"*\" "
+    config << "  <policy context=\"default\">\n    <allow user=\"*\"/>\n"
+              "    <allow send_destination=\"*\" "
               "eavesdrop=\"true\"/>\n"
               "    <allow eavesdrop=\"true\"/>\n    <allow own=\"*\"/>\n  </policy>\n";
     for (const std::string& include : options_I.includes)
