@@ -1,5 +1,6 @@
 #include "host/CLinuxPersistentSettings.h"
 
+#include "common/CClock.h"
 #include "common/TavLog.h"
 #include "host/Category.h"
 #include "host/LoggingEnable.h"
@@ -9,8 +10,11 @@
 namespace {
 
 // Rounds of the client's own twenty tries before the store counts as
-// absent; a store started on demand gets all the time it needs.
+// absent. A store that is listed but never answers would keep a start
+// waiting for hours through all of them, so the rounds also end once this
+// much clock time has gone by; one started on demand is up long before.
 constexpr int kConnectRounds = 1000;
+constexpr double kConnectSeconds = 30.0;
 
 void PostLoggingEnabled(bool enable_I) {
   const std::shared_ptr<CDesktop> desktop = OProcessUtils::GetDesktop();
@@ -43,10 +47,11 @@ std::shared_ptr<OPersistentDataStoreClient> CLinuxPersistentSettings::ConnectToS
   if (!client) return nullptr;
   SXPCError result;
   int tries = 0;
+  const double giveUpAt = CClock::Get()->Now() + kConnectSeconds;
   while (tries < kConnectRounds) {
     ++tries;
     result = client->connectToService();
-    if (result.code == 0) break;
+    if (result.code == 0 || CClock::Get()->Now() >= giveUpAt) break;
   }
   if (result.code != 0) {
     TavLog::Error(

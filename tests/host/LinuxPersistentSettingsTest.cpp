@@ -130,6 +130,18 @@ TEST_F(LinuxPersistentSettings, AStoreThatDoesNotAnswerReadsAsAbsent) {
   EXPECT_FALSE(settings.SetKeyAndString("silent", "x"));
 }
 
+TEST_F(LinuxPersistentSettings, AStoreListedButMuteIsGivenUpWithinHalfAMinute) {
+  CFakeDataStore store;
+  ASSERT_TRUE(store.IsReady());
+  store.SetMuted(true);
+  auto clock = std::make_shared<CVirtualClock>();
+  CClock::Set(clock);
+  CLinuxPersistentSettings settings;
+  settings.Init();
+  EXPECT_FALSE(settings.IsUsingDataStore());
+  EXPECT_LT(clock->Now(), 40.0);
+}
+
 TEST_F(LinuxPersistentSettings, WithoutAStoreTheValuesStayInTheConfigurationFolder) {
   {
     CLinuxPersistentSettings settings;  // a bus with no store on it

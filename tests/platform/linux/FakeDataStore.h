@@ -12,7 +12,7 @@
 
 // A data store that keeps texts, answers either with a dictionary or with
 // an error that carries the same dictionary, and never answers for the key
-// "silent".
+// "silent" (nor for any key once muted).
 class CFakeDataStore {
  public:
   CFakeDataStore()
@@ -20,6 +20,7 @@ class CFakeDataStore {
                  "com.tavik.OPersistentDataStoreServiceProtocol", kVtable, this) {}
   bool IsReady() const { return mService.IsReady(); }
   void SetAnswerAsErrors(bool errors_I) { mAnswerAsErrors = errors_I; }
+  void SetMuted(bool muted_I) { mMuted = muted_I; }
   // Empty for a key it does not hold.
   std::string Stored(const std::string& key_I) {
     std::lock_guard<std::mutex> guard(mLock);
@@ -41,7 +42,7 @@ class CFakeDataStore {
     const auto request = BusDictionary::Read(message_I);
     const std::string key =
         request && request->Get<std::string>("Key") ? *request->Get<std::string>("Key") : "";
-    if (key == "silent") return 1;
+    if (key == "silent" || self->mMuted) return 1;
     const std::string member = sd_bus_message_get_member(message_I);
     CXPCDictionary reply;
     {
@@ -74,6 +75,7 @@ class CFakeDataStore {
       SD_BUS_METHOD("setDataForKey", "a{sv}", "a{sv}", &OnCall, SD_BUS_VTABLE_UNPRIVILEGED),
       SD_BUS_VTABLE_END};
 
+  std::atomic<bool> mMuted{false};
   std::mutex mLock;
   std::map<std::string, std::string> mValues;
   std::atomic<bool> mAnswerAsErrors{false};
