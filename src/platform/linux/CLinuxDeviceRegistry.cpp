@@ -24,6 +24,8 @@ constexpr std::streamsize kMaxDescriptorSize = 64 * 1024;
 constexpr int kBusNumberShift = 24;
 constexpr int kFirstPortShift = 20;
 constexpr int kPortBits = 4;
+// Without a USB device the bus byte stays 0, which no USB bus number is.
+constexpr int kNonUsbBusTypeShift = 16;
 
 struct SUdevUnref {
   void operator()(udev* udev_I) const { udev_unref(udev_I); }
@@ -94,18 +96,43 @@ bool ReadReportDescriptor(udev_device* hidraw_I, std::vector<uint8_t>& bytes_O) 
   return !in.bad();
 }
 
+// A HID device with no USB device above it (Bluetooth, I2C, uhid): the ids
+// come from its HID_ID ("BBBB:VVVVVVVV:PPPPPPPP"), the location from its bus
+// type and the sequence number the HID core gave it ("...PPPP.NNNN"), which
+// holds while it stays attached. There is no release number to read.
+bool ReadNonUsbHid(udev_device* hidraw_I, SUsbEntry& entry_O) {
+  udev_device* hid = udev_device_get_parent_with_subsystem_devtype(hidraw_I, "hid", nullptr);
+  if (hid == nullptr) return false;
+  const char* id = udev_device_get_property_value(hid, "HID_ID");
+  const char* name = udev_device_get_sysname(hid);
+  if (id == nullptr || name == nullptr) return false;
+  const std::vector<std::string> fields = StringUtilities::Tokenize(id, ":", false);
+  const char* dot = std::strrchr(name, '.');
+  uint32_t busType = 0;
+  uint32_t sequence = 0;
+  if (fields.size() != 3 || dot == nullptr || !ParseNumber(fields[0].c_str(), 16, busType) ||
+      !ParseNumber(fields[1].c_str(), 16, entry_O.vendorId) ||
+      !ParseNumber(fields[2].c_str(), 16, entry_O.productId) || !ParseNumber(dot + 1, 16, sequence)) {
+    return false;
+  }
+  entry_O.locationId = CLinuxDeviceRegistry::LocationIdWithoutUsb(busType, sequence);
+  entry_O.version = 0;
+  return true;
+}
+
 // The identity shared by every usage pair of one hidraw node.
 bool ReadInterfaceBase(udev_device* hidraw_I, SHidEntry& base_O) {
   udev_device* usb = UsbDeviceAbove(hidraw_I);
   SUsbEntry usbEntry;
-  if (!ReadUsbDevice(usb, usbEntry)) return false;
+  if (usb == nullptr ? !ReadNonUsbHid(hidraw_I, usbEntry) : !ReadUsbDevice(usb, usbEntry))
+    return false;
   base_O.info.vendorId = usbEntry.vendorId;
   base_O.info.productId = usbEntry.productId;
   base_O.info.locationId = usbEntry.locationId;
   base_O.version = usbEntry.version;
   const char* node = udev_device_get_devnode(hidraw_I);
   base_O.nodePath = node != nullptr ? node : std::string();
-  ReadParentHub(usb, base_O.parentUsbVendorId, base_O.parentUsbProductId);
+  if (usb != nullptr) ReadParentHub(usb, base_O.parentUsbVendorId, base_O.parentUsbProductId);
   return true;
 }
 
@@ -174,6 +201,10 @@ uint32_t CLinuxDeviceRegistry::LocationIdFromTopology(uint32_t busNumber_I,
   return locationId;
 }
 
+uint32_t CLinuxDeviceRegistry::LocationIdWithoutUsb(uint32_t busType_I, uint32_t sequence_I) {
+  return (busType_I & 0xFF) << kNonUsbBusTypeShift | (sequence_I & 0xFFFF);
+}
+
 std::vector<SHidEntry> CLinuxDeviceRegistry::ListHidInterfaces(uint32_t vendorId_I) {
   std::vector<SHidEntry> entries;
   UdevPtr context(udev_new());
@@ -215,7 +246,11 @@ bool CLinuxDeviceRegistry::OpenWatch() {
   if (mWakeFd < 0) return false;
   mWatchUdev = udev_new();
   if (mWatchUdev == nullptr) return false;
-  mMonitor = udev_monitor_new_from_netlink(mWatchUdev, "udev");
+  // Without a udev daemon (an initramfs, a container) nothing is sent to
+  // the "udev" group and a watch there would wait for ever; the kernel's own
+  // events carry the same add and remove, and devtmpfs has made the node.
+  const bool udevRunning = access("/run/udev/control", F_OK) == 0;
+  mMonitor = udev_monitor_new_from_netlink(mWatchUdev, udevRunning ? "udev" : "kernel");
   if (mMonitor == nullptr ||
       udev_monitor_filter_add_match_subsystem_devtype(mMonitor, "hidraw", nullptr) < 0 ||
       udev_monitor_enable_receiving(mMonitor) < 0) {
