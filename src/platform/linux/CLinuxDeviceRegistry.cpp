@@ -112,7 +112,8 @@ bool ReadNonUsbHid(udev_device* hidraw_I, SUsbEntry& entry_O) {
   uint32_t sequence = 0;
   if (fields.size() != 3 || dot == nullptr || !ParseNumber(fields[0].c_str(), 16, busType) ||
       !ParseNumber(fields[1].c_str(), 16, entry_O.vendorId) ||
-      !ParseNumber(fields[2].c_str(), 16, entry_O.productId) || !ParseNumber(dot + 1, 16, sequence)) {
+      !ParseNumber(fields[2].c_str(), 16, entry_O.productId) ||
+      !ParseNumber(dot + 1, 16, sequence)) {
     return false;
   }
   entry_O.locationId = CLinuxDeviceRegistry::LocationIdWithoutUsb(busType, sequence);
@@ -148,19 +149,22 @@ std::vector<SHidEntry> EntriesForPairs(
   return entries;
 }
 
-// The identity a watch event carries: the first usage pair, or none.
-bool ReadWatchedIdentity(udev_device* hidraw_I, DeviceInfo& info_O) {
+// The identities watch events carry: one per top-level usage pair, or one
+// with usage 0 where the descriptor gives none.
+bool ReadWatchedIdentities(udev_device* hidraw_I, std::vector<DeviceInfo>& infos_O) {
   SHidEntry base;
   if (!ReadInterfaceBase(hidraw_I, base)) return false;
-  info_O = base.info;
+  infos_O.clear();
   std::vector<uint8_t> descriptor;
   if (ReadReportDescriptor(hidraw_I, descriptor)) {
-    const auto pairs = HIDReportDescriptor::TopLevelUsagePairs(descriptor);
-    if (!pairs.empty()) {
-      info_O.usage = pairs.front().usage;
-      info_O.usagePage = pairs.front().usagePage;
+    for (const auto& pair : HIDReportDescriptor::TopLevelUsagePairs(descriptor)) {
+      DeviceInfo info = base.info;
+      info.usage = pair.usage;
+      info.usagePage = pair.usagePage;
+      infos_O.push_back(info);
     }
   }
+  if (infos_O.empty()) infos_O.push_back(base.info);
   return true;
 }
 
@@ -266,9 +270,9 @@ bool CLinuxDeviceRegistry::OpenWatch() {
 
 void CLinuxDeviceRegistry::RememberPresentInterfaces() {
   ForEachDevice(mWatchUdev, "hidraw", [this](udev_device* hidraw_I) {
-    DeviceInfo info;
-    if (ReadWatchedIdentity(hidraw_I, info))
-      mKnownInterfaces[udev_device_get_syspath(hidraw_I)] = info;
+    std::vector<DeviceInfo> infos;
+    if (ReadWatchedIdentities(hidraw_I, infos))
+      mKnownInterfaces[udev_device_get_syspath(hidraw_I)] = infos;
   });
 }
 
@@ -301,26 +305,26 @@ void CLinuxDeviceRegistry::DeliverEvent(udev_device* device_I, CRegistryWatcher&
   const char* sysPath = udev_device_get_syspath(device_I);
   if (action == nullptr || sysPath == nullptr) return;
   if (std::strcmp(action, "add") == 0) {
-    DeviceInfo info;
-    if (!ReadWatchedIdentity(device_I, info)) return;
+    std::vector<DeviceInfo> infos;
+    if (!ReadWatchedIdentities(device_I, infos)) return;
     auto known = mKnownInterfaces.find(sysPath);
     if (known != mKnownInterfaces.end()) {
       // Present when the watch opened and announced again: already known.
-      if (known->second == info) return;
+      if (known->second == infos) return;
       // A node cannot change identity in place; its departure was missed.
-      const DeviceInfo gone = known->second;
-      known->second = info;
-      watcher_I.DeviceRemoved(gone);
+      const std::vector<DeviceInfo> gone = known->second;
+      known->second = infos;
+      for (const DeviceInfo& info : gone) watcher_I.DeviceRemoved(info);
     } else {
-      mKnownInterfaces[sysPath] = info;
+      mKnownInterfaces[sysPath] = infos;
     }
-    watcher_I.DeviceAdded(info);
+    for (const DeviceInfo& info : infos) watcher_I.DeviceAdded(info);
   } else if (std::strcmp(action, "remove") == 0) {
     auto known = mKnownInterfaces.find(sysPath);
     if (known == mKnownInterfaces.end()) return;
-    const DeviceInfo info = known->second;
+    const std::vector<DeviceInfo> infos = known->second;
     mKnownInterfaces.erase(known);
-    watcher_I.DeviceRemoved(info);
+    for (const DeviceInfo& info : infos) watcher_I.DeviceRemoved(info);
   }
 }
 

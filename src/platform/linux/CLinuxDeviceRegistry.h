@@ -13,8 +13,9 @@
 // The watch is a udev netlink monitor on subsystem "hidraw", on the
 // kernel's events where no udev daemon runs. It remembers
 // the identity of every interface present when the watch was opened or
-// added since, so that a removal carries it. An interface whose report
-// descriptor gives no usage pair is reported with usage and page 0.
+// added since, so that a removal carries it. Each top-level usage pair of an
+// interface gets its own event; one whose report descriptor gives none is
+// reported with usage and page 0.
 //
 // Each listing uses a udev context of its own, so lists may be asked for on
 // one thread while RunWatch runs on another.
@@ -62,5 +63,5 @@ class CLinuxDeviceRegistry : public CDeviceRegistry {
   std::atomic<bool> mStopRequested{false};
   // Identity of each watched interface by its sys path; RunWatch's thread
   // only, after OpenWatch.
-  std::map<std::string, DeviceInfo> mKnownInterfaces;
+  std::map<std::string, std::vector<DeviceInfo>> mKnownInterfaces;
 };

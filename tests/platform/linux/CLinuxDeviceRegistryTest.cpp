@@ -277,17 +277,23 @@ TEST_F(CLinuxDeviceRegistryTest, WatchFollowsADeviceThatReenumeratesUnderAnother
   const auto loaderNode = mBus->AddHidInterface(loader, 0, 0, kVendorOnly);
   // Read before it goes: a node unplugged before its arrival is read shows
   // no usage, as with real hardware that vanishes that fast.
-  watcher.WaitFor(2);
+  watcher.WaitFor(3);
   mBus->Unplug(loaderNode);
   const std::string back = mBus->AddUsbDevice(mRootHub, 1, "3", kVendor, 0x374, 0x0103);
   mBus->AddHidInterface(back, 0, 0, kPenAndVendor);
 
   using SEvent = CRecordingWatcher::SEvent;
+  // One event per top-level pair: the pen's vendor collection, behind its
+  // digitizer one, is seen as well.
   const DeviceInfo pen{kVendor, 0x374, 0x01300000, 0x02, 0x0D};
+  const DeviceInfo penVendor{kVendor, 0x374, 0x01300000, 0x01, 0xFF00};
   const DeviceInfo loaderInfo{kVendor, 0x94, 0x01300000, 0x01, 0xFF00};
-  EXPECT_EQ(
-      watcher.WaitFor(4),
-      (std::vector<SEvent>{{false, pen}, {true, loaderInfo}, {false, loaderInfo}, {true, pen}}));
+  EXPECT_EQ(watcher.WaitFor(6), (std::vector<SEvent>{{false, pen},
+                                                     {false, penVendor},
+                                                     {true, loaderInfo},
+                                                     {false, loaderInfo},
+                                                     {true, pen},
+                                                     {true, penVendor}}));
   registry.StopWatching();
   thread.join();  // hangs here if the watch's poll is not woken
 }

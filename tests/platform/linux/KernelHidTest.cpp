@@ -108,15 +108,17 @@ TEST_F(KernelHid, RegistryListsAUsblessHidDeviceAndWatchesItComeAndGo) {
   auto second = std::make_shared<CLabPenController>();
   CUhidLabDevice other(mBus, second);
   mBus->Plug(second);
-  const auto events = watcher.WaitFor(2);
+  // One event for each of the two collections, each way.
+  const auto events = watcher.WaitFor(4);
   mRegistry->StopWatching();
   thread.join();
-  ASSERT_EQ(events.size(), 2u);
-  EXPECT_EQ(events[0].first, '-');
-  EXPECT_EQ(events[0].second.locationId, entry.info.locationId);
-  EXPECT_EQ(events[1].first, '+');
-  EXPECT_EQ(events[1].second.productId, kNormal);
-  EXPECT_NE(events[1].second.locationId, entry.info.locationId) << "a new HID device, a new place";
+  ASSERT_EQ(events.size(), 4u);
+  EXPECT_EQ(events[1].first, '-');
+  EXPECT_EQ(events[1].second, entry.info);
+  EXPECT_EQ(events[3].first, '+');
+  EXPECT_EQ(events[3].second.productId, kNormal);
+  EXPECT_EQ(events[3].second.usagePage, 0xFF00u);
+  EXPECT_NE(events[3].second.locationId, entry.info.locationId) << "a new HID device, a new place";
 }
 
 TEST_F(KernelHid, FeatureReportsCrossTheHidCoreAndErrorsComeBackAsTheKernelGivesThem) {
