@@ -28,8 +28,10 @@
 class CUhidLabDevice {
  public:
   CUhidLabDevice(std::shared_ptr<CLabBus> bus_I, std::shared_ptr<CLabBoard> board_I)
-      : mBus(std::move(bus_I)), mBoard(std::move(board_I)),
-        mFd(::open("/dev/uhid", O_RDWR | O_CLOEXEC)), mWake(eventfd(0, EFD_CLOEXEC)) {
+      : mBus(std::move(bus_I)),
+        mBoard(std::move(board_I)),
+        mFd(::open("/dev/uhid", O_RDWR | O_CLOEXEC)),
+        mWake(eventfd(0, EFD_CLOEXEC)) {
     if (mFd < 0) return;
     mListener = mBus->AddListener([this](const SLabInterface&, bool) { Wake(); });
     mThread = std::thread([this] { Serve(); });
@@ -59,9 +61,14 @@ class CUhidLabDevice {
     for (const SLabInterface& entry : interfaces_I) {
       const uint32_t page = entry.info.usagePage;
       const uint32_t usage = entry.info.usage;
-      bytes.insert(bytes.end(), {0x06, uint8_t(page), uint8_t(page >> 8), 0x0A, uint8_t(usage),
-                                 uint8_t(usage >> 8), 0xA1, 0x01, 0x09, 0x01, 0x15, 0x00, 0x26, 0xFF,
-                                 0x00, 0x75, 0x08, 0x95, 0x01, 0xB1, 0x02, 0xC0});
+      bytes.insert(bytes.end(), {0x06, uint8_t(page),  uint8_t(page >> 8),
+                                 0x0A, uint8_t(usage), uint8_t(usage >> 8),
+                                 0xA1, 0x01,           0x09,
+                                 0x01, 0x15,           0x00,
+                                 0x26, 0xFF,           0x00,
+                                 0x75, 0x08,           0x95,
+                                 0x01, 0xB1,           0x02,
+                                 0xC0});
     }
     return bytes;
   }
@@ -146,9 +153,8 @@ class CUhidLabDevice {
       reply.type = UHID_GET_REPORT_REPLY;
       reply.u.get_report_reply.id = get.id;
       size_t length = 0;
-      mBus->WithBoard(mBinding, [&](CLabBoard& board_I) {
-        length = board_I.GetFeatureLength(get.rnum);
-      });
+      mBus->WithBoard(mBinding,
+                      [&](CLabBoard& board_I) { length = board_I.GetFeatureLength(get.rnum); });
       std::vector<uint8_t> report(std::max<size_t>(length, 1), 0);
       report[0] = get.rnum;
       const bool ok = length > 0 && mBus->GetFeature(mBinding, report) == EHidStatus::eSuccess;
