@@ -88,14 +88,18 @@ TEST_F(RealBinary, UpdatesThePenThroughItsLoaderAndBack) {
 }
 
 TEST_F(RealBinary, APenPulledMidUpdateFailsWithItsMessage) {
-  // Gone from the bus, and so from sysfs, at its 200th report: in its loader.
-  mBus->AddFaults({{ELabFaultKind::eVanish, 200, ""}}, 1);
+  // Gone from the bus, and so from sysfs, at its 100th report: in its loader,
+  // with blocks erased.
+  mBus->AddFaults({{ELabFaultKind::eVanish, 100, ""}}, 1);
   std::string output;
   EXPECT_EQ(Run(output), 1) << output;
   EXPECT_NE(output.find("pen controller of Lab Classic Tablet: failed:"), std::string::npos)
       << output;
   EXPECT_TRUE(mPen->IsUnplugged());
-  EXPECT_EQ(mPen->GetMode(), CLabLoaderBoard::EMode::eLoader) << "pulled while programming";
+  EXPECT_EQ(mPen->GetReportCount(), 100u) << "nothing reaches a pulled board";
+  EXPECT_EQ(mPen->GetMode(), CLabLoaderBoard::EMode::eLoader);
+  EXPECT_FALSE(mPen->GetLoader().IsImageValid()) << "pulled while programming";
+  EXPECT_NE(output.find("Result: the update failed."), std::string::npos) << output;
 }
 
 }  // namespace
