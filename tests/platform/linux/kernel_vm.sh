@@ -33,14 +33,20 @@ if [ ! -f "$CACHE/kernel/ready" ]; then
   vmlinuz="$(ls "$CACHE"/kernel/root/boot/vmlinuz-* | head -1)"
   # TCG boots the uncompressed kernel faster than it decompresses one: take
   # the xz payload of the bzImage, or boot the bzImage where there is none.
-  offset="$(grep -abo $'\xfd7zXZ\x00' "$vmlinuz" 2>/dev/null | head -1 | cut -d: -f1)"
+  offset="$(LC_ALL=C grep -abo $'\xfd7zXZ\x00' "$vmlinuz" 2>/dev/null | head -1 | cut -d: -f1)"
   if [ -n "$offset" ] && tail -c +$((offset + 1)) "$vmlinuz" | xz -dcq >"$CACHE/kernel/vmlinux" 2>/dev/null ||
      [ -s "$CACHE/kernel/vmlinux" ]; then :; fi
   [ -s "$CACHE/kernel/vmlinux" ] || cp "$vmlinuz" "$CACHE/kernel/vmlinux"
+  # Only the three HID modules are kept of the package's few hundred MB.
+  mkdir -p "$CACHE/kernel/hid"
+  for module in hid uhid hid-generic; do
+    cp "$CACHE"/kernel/root/lib/modules/*/kernel/drivers/hid/"$module".ko* "$CACHE/kernel/hid/" ||
+      skip "the kernel package holds no $module module"
+  done
+  rm -rf "$CACHE/kernel/root"
   touch "$CACHE/kernel/ready"
 fi
-MODULES="$(ls -d "$CACHE"/kernel/root/lib/modules/*/kernel/drivers/hid 2>/dev/null | head -1)"
-[ -n "$MODULES" ] || skip "the kernel package holds no HID modules"
+MODULES="$CACHE/kernel/hid"
 
 # The initramfs: busybox, the three modules, the guest program with the
 # libraries it links, and an init that reports through isa-debug-exit.
