@@ -13,6 +13,7 @@ PACKAGES=(
   umockdev libumockdev-dev libglib2.0-dev edid-decode
   srecord binutils python3 dbus-daemon
   openssl
+  qemu-system-x86 busybox-static
 )
 
 missing=()

@@ -60,6 +60,11 @@ class CLabBoard {
   EUsbStatus Control(uint8_t requestType_I, uint8_t request_I, uint16_t value_I, uint16_t index_I,
                      std::vector<uint8_t>& data_IO, size_t& transferred_O);
 
+  // The length of get report `reportId_I` as the board's report descriptor
+  // declares it, for a link that passes no length with its request (uhid);
+  // 0 for a report the board does not declare.
+  virtual size_t GetFeatureLength(uint8_t /*reportId_I*/) const { return 0; }
+
   CLabFaults& Faults() { return mFaults; }
   // A copy: the board is driven from the seam's thread while tests read it.
   std::vector<SLabTraceEntry> GetTrace() const {

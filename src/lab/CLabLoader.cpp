@@ -117,6 +117,25 @@ bool CLabLoader::Expect(const std::vector<uint8_t>& report_I, size_t length_I, c
   return false;
 }
 
+size_t CLabLoader::GetReportLength(uint8_t reportId_I) const {
+  const std::optional<uint32_t> command = CommandOf(reportId_I, 0);
+  if (!command) return 0;
+  const CLabFlash& flash = Current();
+  const size_t blocks = flash.GetBlockCount();
+  switch (*command) {
+    case cReadData: return flash.GetLayout().readSize + 5u;
+    case cGetStatus: return 5;
+    case cGetParameters: return 13;
+    case cGetDescriptor: return 10 * blocks + 1;
+    case cGetChecksums: return 4 * blocks + 5;
+    case cGetDeviceInfo: return 34;
+    case cGetStartReason: return 2;
+    case cGetCpu:
+    case cGetCpuCount: return 3;
+    default: return 0;
+  }
+}
+
 std::pair<size_t, size_t> CLabLoader::DataRange(const std::vector<uint8_t>& report_I) const {
   if (report_I.empty()) return {0, 0};
   const std::optional<uint32_t> command = CommandOf(report_I[0], report_I.size());

@@ -39,6 +39,10 @@ class CLabLoader {
   // A get report: fills the vector from byte 0; false when stalled.
   bool GetReport(std::vector<uint8_t>& report_IO);
 
+  // The length of get report `reportId_I` with the current flash; 0 for a
+  // report that is not one of the engine's get reports.
+  size_t GetReportLength(uint8_t reportId_I) const;
+
   // The payload of a report that carries flash data, as [begin, end);
   // empty for any other report.
   std::pair<size_t, size_t> DataRange(const std::vector<uint8_t>& report_I) const;
@@ -74,6 +78,7 @@ class CLabLoader {
   bool Expect(const std::vector<uint8_t>& report_I, size_t length_I, const char* name_I);
   void Trace(SLabTraceEntry::EKind kind_I, const std::vector<uint8_t>& bytes_I, bool ok_I);
   CLabFlash& Current() { return mCpus[mCurrentCpu]; }
+  const CLabFlash& Current() const { return mCpus[mCurrentCpu]; }
 
   ELabProtocol mProtocol;
   std::vector<CLabFlash> mCpus;

@@ -95,6 +95,12 @@ bool CLabLoaderBoard::OnNormalGetFeature(std::vector<uint8_t>& report_IO) {
   return false;
 }
 
+size_t CLabLoaderBoard::GetFeatureLength(uint8_t reportId_I) const {
+  if (mMode == EMode::eLoader || SpeaksLoaderInNormalMode())
+    return mLoader.GetReportLength(reportId_I);
+  return 0;
+}
+
 std::pair<size_t, size_t> CLabLoaderBoard::DataRange(const std::vector<uint8_t>& report_I) const {
   if (mMode == EMode::eLoader || SpeaksLoaderInNormalMode()) return mLoader.DataRange(report_I);
   return {0, 0};

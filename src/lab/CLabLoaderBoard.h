@@ -31,6 +31,7 @@ class CLabLoaderBoard : public CLabBoard {
   std::vector<SLabInterface> GetInterfaces() const override;
   void PowerOn() override;
   std::vector<std::string> GetViolations() const override;
+  size_t GetFeatureLength(uint8_t reportId_I) const override;
 
  protected:
   bool OnSetFeature(const DeviceInfo& interface_I, const std::vector<uint8_t>& report_I) override;

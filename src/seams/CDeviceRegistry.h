@@ -15,8 +15,10 @@
 //   false when it cannot be set up. RunWatch() then blocks on the calling
 //   thread and calls the watcher for every HID interface that is added or
 //   removed, until StopWatching() is called from another thread (a stop that
-//   came first ends the next RunWatch at once). Each event carries the
-//   interface's primary (first) usage pair. A removal carries the identity
+//   came first ends the next RunWatch at once). Each top-level usage
+//   pair of the interface gets an event of its own, with the identity its
+//   ListHidInterfaces entry has, so that a watcher matching on one pair sees
+//   an interface whose first collection is another. A removal carries the identity
 //   the interface had when it was added, since a removed node can no longer
 //   be read. Events of one watch arrive on the RunWatch thread, in order.
 // - Errors never leave the seam as errno values: a list that cannot be read

@@ -24,6 +24,8 @@ constexpr std::streamsize kMaxDescriptorSize = 64 * 1024;
 constexpr int kBusNumberShift = 24;
 constexpr int kFirstPortShift = 20;
 constexpr int kPortBits = 4;
+// Without a USB device the bus byte stays 0, which no USB bus number is.
+constexpr int kNonUsbBusTypeShift = 16;
 
 struct SUdevUnref {
   void operator()(udev* udev_I) const { udev_unref(udev_I); }
@@ -94,18 +96,44 @@ bool ReadReportDescriptor(udev_device* hidraw_I, std::vector<uint8_t>& bytes_O) 
   return !in.bad();
 }
 
+// A HID device with no USB device above it (Bluetooth, I2C, uhid): the ids
+// come from its HID_ID ("BBBB:VVVVVVVV:PPPPPPPP"), the location from its bus
+// type and the sequence number the HID core gave it ("...PPPP.NNNN"), which
+// holds while it stays attached. There is no release number to read.
+bool ReadNonUsbHid(udev_device* hidraw_I, SUsbEntry& entry_O) {
+  udev_device* hid = udev_device_get_parent_with_subsystem_devtype(hidraw_I, "hid", nullptr);
+  if (hid == nullptr) return false;
+  const char* id = udev_device_get_property_value(hid, "HID_ID");
+  const char* name = udev_device_get_sysname(hid);
+  if (id == nullptr || name == nullptr) return false;
+  const std::vector<std::string> fields = StringUtilities::Tokenize(id, ":", false);
+  const char* dot = std::strrchr(name, '.');
+  uint32_t busType = 0;
+  uint32_t sequence = 0;
+  if (fields.size() != 3 || dot == nullptr || !ParseNumber(fields[0].c_str(), 16, busType) ||
+      !ParseNumber(fields[1].c_str(), 16, entry_O.vendorId) ||
+      !ParseNumber(fields[2].c_str(), 16, entry_O.productId) ||
+      !ParseNumber(dot + 1, 16, sequence)) {
+    return false;
+  }
+  entry_O.locationId = CLinuxDeviceRegistry::LocationIdWithoutUsb(busType, sequence);
+  entry_O.version = 0;
+  return true;
+}
+
 // The identity shared by every usage pair of one hidraw node.
 bool ReadInterfaceBase(udev_device* hidraw_I, SHidEntry& base_O) {
   udev_device* usb = UsbDeviceAbove(hidraw_I);
   SUsbEntry usbEntry;
-  if (!ReadUsbDevice(usb, usbEntry)) return false;
+  if (usb == nullptr ? !ReadNonUsbHid(hidraw_I, usbEntry) : !ReadUsbDevice(usb, usbEntry))
+    return false;
   base_O.info.vendorId = usbEntry.vendorId;
   base_O.info.productId = usbEntry.productId;
   base_O.info.locationId = usbEntry.locationId;
   base_O.version = usbEntry.version;
   const char* node = udev_device_get_devnode(hidraw_I);
   base_O.nodePath = node != nullptr ? node : std::string();
-  ReadParentHub(usb, base_O.parentUsbVendorId, base_O.parentUsbProductId);
+  if (usb != nullptr) ReadParentHub(usb, base_O.parentUsbVendorId, base_O.parentUsbProductId);
   return true;
 }
 
@@ -121,19 +149,22 @@ std::vector<SHidEntry> EntriesForPairs(
   return entries;
 }
 
-// The identity a watch event carries: the first usage pair, or none.
-bool ReadWatchedIdentity(udev_device* hidraw_I, DeviceInfo& info_O) {
+// The identities watch events carry: one per top-level usage pair, or one
+// with usage 0 where the descriptor gives none.
+bool ReadWatchedIdentities(udev_device* hidraw_I, std::vector<DeviceInfo>& infos_O) {
   SHidEntry base;
   if (!ReadInterfaceBase(hidraw_I, base)) return false;
-  info_O = base.info;
+  infos_O.clear();
   std::vector<uint8_t> descriptor;
   if (ReadReportDescriptor(hidraw_I, descriptor)) {
-    const auto pairs = HIDReportDescriptor::TopLevelUsagePairs(descriptor);
-    if (!pairs.empty()) {
-      info_O.usage = pairs.front().usage;
-      info_O.usagePage = pairs.front().usagePage;
+    for (const auto& pair : HIDReportDescriptor::TopLevelUsagePairs(descriptor)) {
+      DeviceInfo info = base.info;
+      info.usage = pair.usage;
+      info.usagePage = pair.usagePage;
+      infos_O.push_back(info);
     }
   }
+  if (infos_O.empty()) infos_O.push_back(base.info);
   return true;
 }
 
@@ -172,6 +203,10 @@ uint32_t CLinuxDeviceRegistry::LocationIdFromTopology(uint32_t busNumber_I,
     shift -= kPortBits;
   }
   return locationId;
+}
+
+uint32_t CLinuxDeviceRegistry::LocationIdWithoutUsb(uint32_t busType_I, uint32_t sequence_I) {
+  return (busType_I & 0xFF) << kNonUsbBusTypeShift | (sequence_I & 0xFFFF);
 }
 
 std::vector<SHidEntry> CLinuxDeviceRegistry::ListHidInterfaces(uint32_t vendorId_I) {
@@ -215,7 +250,11 @@ bool CLinuxDeviceRegistry::OpenWatch() {
   if (mWakeFd < 0) return false;
   mWatchUdev = udev_new();
   if (mWatchUdev == nullptr) return false;
-  mMonitor = udev_monitor_new_from_netlink(mWatchUdev, "udev");
+  // Without a udev daemon (an initramfs, a container) nothing is sent to
+  // the "udev" group and a watch there would wait for ever; the kernel's own
+  // events carry the same add and remove, and devtmpfs has made the node.
+  const bool udevRunning = access("/run/udev/control", F_OK) == 0;
+  mMonitor = udev_monitor_new_from_netlink(mWatchUdev, udevRunning ? "udev" : "kernel");
   if (mMonitor == nullptr ||
       udev_monitor_filter_add_match_subsystem_devtype(mMonitor, "hidraw", nullptr) < 0 ||
       udev_monitor_enable_receiving(mMonitor) < 0) {
@@ -231,9 +270,9 @@ bool CLinuxDeviceRegistry::OpenWatch() {
 
 void CLinuxDeviceRegistry::RememberPresentInterfaces() {
   ForEachDevice(mWatchUdev, "hidraw", [this](udev_device* hidraw_I) {
-    DeviceInfo info;
-    if (ReadWatchedIdentity(hidraw_I, info))
-      mKnownInterfaces[udev_device_get_syspath(hidraw_I)] = info;
+    std::vector<DeviceInfo> infos;
+    if (ReadWatchedIdentities(hidraw_I, infos))
+      mKnownInterfaces[udev_device_get_syspath(hidraw_I)] = infos;
   });
 }
 
@@ -266,26 +305,26 @@ void CLinuxDeviceRegistry::DeliverEvent(udev_device* device_I, CRegistryWatcher&
   const char* sysPath = udev_device_get_syspath(device_I);
   if (action == nullptr || sysPath == nullptr) return;
   if (std::strcmp(action, "add") == 0) {
-    DeviceInfo info;
-    if (!ReadWatchedIdentity(device_I, info)) return;
+    std::vector<DeviceInfo> infos;
+    if (!ReadWatchedIdentities(device_I, infos)) return;
     auto known = mKnownInterfaces.find(sysPath);
     if (known != mKnownInterfaces.end()) {
       // Present when the watch opened and announced again: already known.
-      if (known->second == info) return;
+      if (known->second == infos) return;
       // A node cannot change identity in place; its departure was missed.
-      const DeviceInfo gone = known->second;
-      known->second = info;
-      watcher_I.DeviceRemoved(gone);
+      const std::vector<DeviceInfo> gone = known->second;
+      known->second = infos;
+      for (const DeviceInfo& info : gone) watcher_I.DeviceRemoved(info);
     } else {
-      mKnownInterfaces[sysPath] = info;
+      mKnownInterfaces[sysPath] = infos;
     }
-    watcher_I.DeviceAdded(info);
+    for (const DeviceInfo& info : infos) watcher_I.DeviceAdded(info);
   } else if (std::strcmp(action, "remove") == 0) {
     auto known = mKnownInterfaces.find(sysPath);
     if (known == mKnownInterfaces.end()) return;
-    const DeviceInfo info = known->second;
+    const std::vector<DeviceInfo> infos = known->second;
     mKnownInterfaces.erase(known);
-    watcher_I.DeviceRemoved(info);
+    for (const DeviceInfo& info : infos) watcher_I.DeviceRemoved(info);
   }
 }
 

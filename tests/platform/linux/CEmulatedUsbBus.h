@@ -92,13 +92,14 @@ class CEmulatedUsbBus {
     return node;
   }
 
-  // A HID interface on a bus other than USB, as an I2C touch panel has.
+  // A HID interface on a bus other than USB, as an I2C touch panel has,
+  // with the HID_ID the kernel gives it.
   SHidNode AddNonUsbHidInterface(unsigned hidrawIndex_I, const std::vector<uint8_t>& descriptor_I) {
     SHidNode node;
     node.hidSysPath = "/devices/platform/i2c-0/0018:7A5D:0001.00" + std::to_string(++mHidCount);
     node.hidrawSysPath = node.hidSysPath + "/hidraw/hidraw" + std::to_string(hidrawIndex_I);
     node.nodePath = "/dev/hidraw" + std::to_string(hidrawIndex_I);
-    AddHidAndNode(node, hidrawIndex_I, descriptor_I);
+    AddHidAndNode(node, hidrawIndex_I, descriptor_I, "E: HID_ID=0018:00007A5D:00000001\n");
     return node;
   }
 
@@ -139,9 +140,9 @@ class CEmulatedUsbBus {
  private:
   // An empty descriptor leaves the attribute out, as if it could not be read.
   void AddHidAndNode(const SHidNode& node_I, unsigned hidrawIndex_I,
-                     const std::vector<uint8_t>& descriptor_I) {
+                     const std::vector<uint8_t>& descriptor_I, const std::string& more_I = "") {
     const std::string hidraw = "hidraw" + std::to_string(hidrawIndex_I);
-    Add("P: " + node_I.hidSysPath + "\nE: SUBSYSTEM=hid\n" +
+    Add("P: " + node_I.hidSysPath + "\nE: SUBSYSTEM=hid\n" + more_I +
         (descriptor_I.empty() ? std::string()
                               : "H: report_descriptor=" + Hex(descriptor_I) + "\n"));
     Add("P: " + node_I.hidrawSysPath + "\nE: SUBSYSTEM=hidraw\nE: DEVNAME=" + node_I.nodePath +

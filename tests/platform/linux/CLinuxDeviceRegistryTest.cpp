@@ -221,18 +221,20 @@ TEST_F(CLinuxDeviceRegistryTest, ListsOneEntryPerTopLevelPairWithIdentityAndNode
   mBus->AddHidInterface(behindHub, 1, 1, kLongItemThenVendor);
   const std::string foreign = mBus->AddUsbDevice(mRootHub, 1, "5", kOtherVendor, 0x1, 0x0001);
   mBus->AddHidInterface(foreign, 0, 2, kVendorOnly);
-  // Left out: a descriptor that cannot be read, and a HID node not on USB.
+  // Left out: a descriptor that cannot be read.
   mBus->AddHidInterface(tablet, 1, 3, {});
+  // Not on USB: its HID bus type (I2C) and sequence number (5) place it.
   mBus->AddNonUsbHidInterface(4, kVendorOnly);
 
   // The hub's ids go with the device behind it; a root port gives none.
   CLinuxDeviceRegistry registry;
   Texts expected{"7A5D:374 @1200000 2/D /dev/hidraw0 v102 under 0:0",
                  "7A5D:374 @1200000 1/FF00 /dev/hidraw0 v102 under 0:0",
-                 "7A5D:3A0 @1430000 2/FF0D /dev/hidraw1 v215 under 5E3:610"};
+                 "7A5D:3A0 @1430000 2/FF0D /dev/hidraw1 v215 under 5E3:610",
+                 "7A5D:1 @180005 1/FF00 /dev/hidraw4 v0 under 0:0"};
   EXPECT_EQ(TextsOf(registry.ListHidInterfaces(kVendor)), expected);
   // Vendor 0 lists every vendor.
-  expected.push_back("1234:1 @1500000 1/FF00 /dev/hidraw2 v1 under 0:0");
+  expected.insert(expected.begin() + 3, "1234:1 @1500000 1/FF00 /dev/hidraw2 v1 under 0:0");
   EXPECT_EQ(TextsOf(registry.ListHidInterfaces(0)), expected);
   EXPECT_TRUE(registry.ListHidInterfaces(0x4321).empty());
 }
@@ -275,17 +277,23 @@ TEST_F(CLinuxDeviceRegistryTest, WatchFollowsADeviceThatReenumeratesUnderAnother
   const auto loaderNode = mBus->AddHidInterface(loader, 0, 0, kVendorOnly);
   // Read before it goes: a node unplugged before its arrival is read shows
   // no usage, as with real hardware that vanishes that fast.
-  watcher.WaitFor(2);
+  watcher.WaitFor(3);
   mBus->Unplug(loaderNode);
   const std::string back = mBus->AddUsbDevice(mRootHub, 1, "3", kVendor, 0x374, 0x0103);
   mBus->AddHidInterface(back, 0, 0, kPenAndVendor);
 
   using SEvent = CRecordingWatcher::SEvent;
+  // One event per top-level pair: the pen's vendor collection, behind its
+  // digitizer one, is seen as well.
   const DeviceInfo pen{kVendor, 0x374, 0x01300000, 0x02, 0x0D};
+  const DeviceInfo penVendor{kVendor, 0x374, 0x01300000, 0x01, 0xFF00};
   const DeviceInfo loaderInfo{kVendor, 0x94, 0x01300000, 0x01, 0xFF00};
-  EXPECT_EQ(
-      watcher.WaitFor(4),
-      (std::vector<SEvent>{{false, pen}, {true, loaderInfo}, {false, loaderInfo}, {true, pen}}));
+  EXPECT_EQ(watcher.WaitFor(6), (std::vector<SEvent>{{false, pen},
+                                                     {false, penVendor},
+                                                     {true, loaderInfo},
+                                                     {false, loaderInfo},
+                                                     {true, pen},
+                                                     {true, penVendor}}));
   registry.StopWatching();
   thread.join();  // hangs here if the watch's poll is not woken
 }
