@@ -4,6 +4,7 @@
 
 #include <cerrno>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 #include <filesystem>
 
@@ -35,7 +36,17 @@ bool LabStateFolderWritable(const std::string& folder_I, std::string& error_O) {
   return true;
 }
 
+bool IsSet(const char* name_I) {
+  const char* value = std::getenv(name_I);
+  return value != nullptr && value[0] != '\0';
+}
+
 }  // namespace
+
+bool CUpdateCommand::UsesWindow(bool headless_I) {
+  if (headless_I) return false;
+  return IsSet("WAYLAND_DISPLAY") || IsSet("DISPLAY") || IsSet("QT_QPA_PLATFORM");
+}
 
 int CUpdateCommand::Run() {
   std::string error;
@@ -96,6 +107,7 @@ int CUpdateCommand::Run() {
     options.processArguments.push_back(argument);
   }
   options.assumeYes = mCommandLine.GetYes();
+  options.window = UsesWindow(mCommandLine.GetHeadless());
   CLabSession* sessionToFinish = session.get();
   options.beforeExit = [sessionToFinish] {
     if (sessionToFinish != nullptr) sessionToFinish->Finish();
