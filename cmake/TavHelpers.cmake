@@ -34,10 +34,10 @@ function(tav_library name)
   tav_target_options(${name})
 endfunction()
 
-# tav_test_suite(NAME SOURCES... [DEPS ...]): one GoogleTest executable,
-# registered with CTest test by test.
+# tav_test_suite(NAME SOURCES... [DEPS ...] [ENVIRONMENT VAR=VALUE...]): one
+# GoogleTest executable, registered with CTest test by test.
 function(tav_test_suite name)
-  cmake_parse_arguments(ARG "" "" "SOURCES;DEPS" ${ARGN})
+  cmake_parse_arguments(ARG "" "" "SOURCES;DEPS;ENVIRONMENT" ${ARGN})
   add_executable(${name} ${ARG_SOURCES})
   target_include_directories(${name} PRIVATE ${PROJECT_SOURCE_DIR}/src ${PROJECT_SOURCE_DIR}/tests)
   target_link_libraries(${name} PRIVATE ${ARG_DEPS} GTest::gmock GTest::gtest GTest::gmock_main Threads::Threads)
@@ -47,6 +47,7 @@ function(tav_test_suite name)
   if(TAV_SANITIZE)
     set(timeout 1200)
   endif()
+  set(environment "TMPDIR=${CMAKE_CURRENT_BINARY_DIR}" ${ARG_ENVIRONMENT})
   gtest_discover_tests(${name} DISCOVERY_MODE PRE_TEST
-    PROPERTIES ENVIRONMENT "TMPDIR=${CMAKE_CURRENT_BINARY_DIR}" TIMEOUT ${timeout})
+    PROPERTIES ENVIRONMENT "${environment}" TIMEOUT ${timeout})
 endfunction()

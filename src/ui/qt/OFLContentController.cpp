@@ -30,6 +30,8 @@ OFLContentController::OFLContentController(QWidget* parent_I) : QWidget(parent_I
   mBrowseButton = new QPushButton(T("B&rowse..."), this);
   mProgramButton = new QPushButton(T("&Program"), this);
   mProgramButton->setDefault(true);
+  // Nothing to program until a file is taken.
+  mProgramButton->setEnabled(false);
   mPenFirmwareVersion = MakeField("Pen firmware version");
   mPenOldChecksum = MakeField("Pen checksum");
   mPenNewChecksum = MakeField("Pen checksum of the new firmware");

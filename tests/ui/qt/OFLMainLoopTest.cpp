@@ -1,0 +1,142 @@
+// The window run's threads on a real Qt event loop: dispatches from other
+// threads run on the GUI thread in order and hold their thread until done,
+// progress is on the bar when the dispatch returns, and an end requested
+// while the main thread is still in the set-up neither hangs nor skips the
+// terminate handler.
+#include <QElapsedTimer>
+#include <QProgressBar>
+#include <QThread>
+#include <thread>
+
+#include "common/CMainThreadLoop.h"
+#include "common/OSUtils.h"
+#include "ui/qt/OFLUpdateController.h"
+#include "ui/qt/QtWindowFixture.h"
+
+namespace qt_test {
+namespace {
+
+// The loop of a window run: dispatches to the main thread are drained by
+// the window's loop, as the program wires them.
+struct SWindowLoop {
+  explicit SWindowLoop(OFLWindowController& window_I) {
+    loop.RegisterMainThread();
+    loop.SetWakeHook([this, &window_I] { window_I.PostToMainLoop([this] { loop.RunPending(); }); });
+  }
+  ~SWindowLoop() { loop.Unregister(); }
+  CMainThreadLoop loop;
+};
+
+// Runs the window's loop, but never longer than ten seconds.
+bool RunForAtMostTenSeconds(OFLWindowController& window_I) {
+  bool timedOut = false;
+  QTimer::singleShot(10000, &QtApp(), [&window_I, &timedOut] {
+    timedOut = true;
+    window_I.QuitMainLoop();
+  });
+  window_I.RunMainLoop();
+  return !timedOut;
+}
+
+class QtMainLoop : public QtWindowFixture {};
+
+TEST_F(QtMainLoop, DispatchesRunOnTheGuiThreadInOrderAndProgressIsDrawnBeforeTheyReturn) {
+  OFLWindowController window;
+  window.initForDialog(true);
+  SWindowLoop wiring(window);
+  std::vector<std::pair<int, int>> ran;  // thread, sequence; touched on the GUI thread only
+  bool offGuiThread = false;
+  std::vector<int> barAfterDispatch;
+  auto worker = [&](int thread_I) {
+    for (int sequence = 0; sequence < 50; ++sequence) {
+      OSUtils::DispatchOnMainThread([&, thread_I, sequence] {
+        offGuiThread |= QThread::currentThread() != QtApp().thread();
+        ran.emplace_back(thread_I, sequence);
+      });
+    }
+    if (thread_I != 0) return;
+    for (int percent : {10, 55, 100}) {
+      OSUtils::DispatchOnMainThread([&window, percent] { window.setStatusProgress(percent); });
+      barAfterDispatch.push_back(window.GetUpdate()->GetProgressBar()->value());
+    }
+  };
+  std::thread first(worker, 0), second(worker, 1);
+  std::thread quitter([&] {
+    first.join();
+    second.join();
+    window.QuitMainLoop();
+  });
+  const bool ended = RunForAtMostTenSeconds(window);
+  quitter.join();
+  ASSERT_TRUE(ended) << "the dispatches hung";
+  EXPECT_FALSE(offGuiThread);
+  ASSERT_EQ(ran.size(), 100u);
+  std::vector<int> next(2, 0);
+  for (const auto& [thread, sequence] : ran) EXPECT_EQ(sequence, next[thread]++);
+  EXPECT_EQ(barAfterDispatch, (std::vector<int>{11, 56, 100}));
+
+  // A quit while no loop runs ends the next run at once; a task for later
+  // comes once the clock has passed its delay.
+  window.QuitMainLoop();
+  QElapsedTimer elapsed;
+  elapsed.start();
+  window.RunMainLoop();
+  EXPECT_LT(elapsed.elapsed(), 1000);
+  window.PostToMainLoopAfter(2.0, [&window] { window.QuitMainLoop(); });
+  mClock->Advance(2.0);
+  EXPECT_TRUE(RunForAtMostTenSeconds(window));
+}
+
+// Journals the end of a run: the driver given back and the notification.
+class CJournalDesktop : public CDesktop {
+ public:
+  int GetLaunchSenderPid() override { return 0; }
+  std::string GetApplicationIdOfProcess(int) override { return ""; }
+  bool IsApplicationProcess(int) override { return false; }
+  int GetProcessArgumentCount() override { return 1; }
+  std::vector<int> RunningApplications(const std::string&) override { return {}; }
+  bool TerminateApplication(int) override { return true; }
+  bool IsTerminated(int) override { return true; }
+  bool LaunchApplication(const std::string& id_I) override {
+    mJournal.Add("launch:" + id_I);
+    return true;
+  }
+  void PostNotification(const std::string& name_I,
+                        const std::map<std::string, std::string>&) override {
+    mJournal.Add("notify:" + name_I);
+  }
+  bool RequestHidAccess() override { return true; }
+  CJournal mJournal;
+};
+
+TEST_F(QtMainLoop, AnEndDuringTheSetUpRunsTheTerminateHandlerWithoutHanging) {
+  AttachPen();
+  mRegistry->mCanWatch = false;  // the device thread gives up during setupUpdate
+  OFLWindowController window;
+  window.SetInteractive(false);
+  SWindowLoop wiring(window);
+  auto desktop = std::make_shared<CJournalDesktop>();
+  OFLUpdater::Configure(Setup({"prog", "-p", "", "-f", mConfig}));
+  int status = -100;
+  FLAppDelegate app(SApplicationSetup{.window = &window,
+                                      .desktop = desktop,
+                                      .terminal = false,
+                                      .exitProcess =
+                                          [&status, &window](int status_I) {
+                                            status = status_I;
+                                            window.QuitMainLoop();
+                                          },
+                                      .printResult = nullptr,
+                                      .printError = nullptr});
+  window.PostToMainLoop([&app] { app.applicationDidFinishLaunching(); });
+  ASSERT_TRUE(RunForAtMostTenSeconds(window)) << "the run hung";
+  EXPECT_TRUE(app.HasTerminated());
+  EXPECT_EQ(status, 0);
+  EXPECT_EQ(desktop->mJournal.Get(),
+            (Words{"notify:com.tavik.removeTavikTablet.closeModalDialog",
+                   "launch:com.tavik.taviktablet", "launch:com.tavik.TabletDriver",
+                   "launch:com.tavik.TavikTouchDriver", "notify:com.tavik.TFUCompleted"}));
+}
+
+}  // namespace
+}  // namespace qt_test
