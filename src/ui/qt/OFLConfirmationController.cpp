@@ -5,6 +5,7 @@
 #include <QVBoxLayout>
 
 #include "host/CLanguageManager.h"
+#include "ui/qt/OFLImages.h"
 #include "ui/qt/OFLSvgView.h"
 
 namespace {
@@ -23,6 +24,7 @@ OFLConfirmationController::OFLConfirmationController(const SAlert& question_I, Q
     : QDialog(parent_I) {
   setWindowTitle(QString::fromStdString(question_I.message));
   setModal(true);
+  setWindowIcon(OFLImages::ApplicationIcon());
 
   auto* icons = new QHBoxLayout;
   icons->addStretch();
@@ -56,7 +58,11 @@ OFLConfirmationController::OFLConfirmationController(const SAlert& question_I, Q
   layout->addWidget(message);
   layout->addWidget(text);
   layout->addLayout(buttons);
-  setMinimumWidth(440);
+  // Sized from its content, the wrapped text's height included, at any
+  // scale; a text cut off at the bottom is worse than a window that
+  // cannot be resized.
+  text->setMinimumWidth(text->fontMetrics().averageCharWidth() * 56);
+  layout->setSizeConstraint(QLayout::SetFixedSize);
 
   connect(mUpdateButton, &QPushButton::clicked, this,
           &OFLConfirmationController::actionButtonUpdate);

@@ -2,6 +2,7 @@
 
 #include <QDir>
 #include <QFileDialog>
+#include <QFontDatabase>
 #include <QGridLayout>
 #include <QHBoxLayout>
 #include <QLabel>
@@ -45,32 +46,30 @@ OFLContentController::OFLContentController(QWidget* parent_I) : QWidget(parent_I
   auto* fileLabel = new QLabel(T("F&irmware file:"), this);
   fileLabel->setBuddy(mBoardVersion);
 
-  auto* form = new QGridLayout;
-  form->setHorizontalSpacing(10);
-  form->addWidget(boardLabel, 0, 0);
-  form->addWidget(mBoardList, 0, 1);
-  form->addWidget(fileLabel, 1, 0);
-  auto* fileRow = new QHBoxLayout;
-  fileRow->addWidget(mBoardVersion, 1);
-  fileRow->addWidget(mBrowseButton);
-  form->addLayout(fileRow, 1, 1, 1, 3);
-  form->setColumnStretch(3, 1);
-
-  // Boards as rows; what the board runs now, then what the file brings.
-  auto* versions = new QGridLayout;
-  versions->setHorizontalSpacing(10);
-  versions->addWidget(new QLabel(T("Firmware version"), this), 0, 1);
-  versions->addWidget(new QLabel(T("Checksum"), this), 0, 2);
-  versions->addWidget(new QLabel(T("New checksum"), this), 0, 3);
-  versions->addWidget(new QLabel(T("Pen"), this), 1, 0);
-  versions->addWidget(mPenFirmwareVersion, 1, 1);
-  versions->addWidget(mPenOldChecksum, 1, 2);
-  versions->addWidget(mPenNewChecksum, 1, 3);
-  versions->addWidget(new QLabel(T("Touch"), this), 2, 0);
-  versions->addWidget(mTouchFirmwareVersion, 2, 1);
-  versions->addWidget(mTouchOldChecksum, 2, 2);
-  versions->addWidget(mTouchNewChecksum, 2, 3);
-  for (int column = 1; column <= 3; ++column) versions->setColumnStretch(column, 1);
+  // One grid, so that the board, the file and the boards' fields share
+  // their columns. Boards as rows: what the board runs now, then what the
+  // file brings.
+  auto* grid = new QGridLayout;
+  grid->setHorizontalSpacing(10);
+  grid->addWidget(boardLabel, 0, 0);
+  grid->addWidget(mBoardList, 0, 1);
+  grid->addWidget(fileLabel, 1, 0);
+  grid->addWidget(mBoardVersion, 1, 1, 1, 2);
+  grid->addWidget(mBrowseButton, 1, 3);
+  grid->addWidget(new QLabel(T("Firmware version"), this), 2, 1);
+  grid->addWidget(new QLabel(T("Checksum"), this), 2, 2);
+  grid->addWidget(new QLabel(T("New checksum"), this), 2, 3);
+  grid->addWidget(new QLabel(T("Pen"), this), 3, 0);
+  grid->addWidget(mPenFirmwareVersion, 3, 1);
+  grid->addWidget(mPenOldChecksum, 3, 2);
+  grid->addWidget(mPenNewChecksum, 3, 3);
+  grid->addWidget(new QLabel(T("Touch"), this), 4, 0);
+  grid->addWidget(mTouchFirmwareVersion, 4, 1);
+  grid->addWidget(mTouchOldChecksum, 4, 2);
+  grid->addWidget(mTouchNewChecksum, 4, 3);
+  for (int column = 1; column <= 3; ++column) grid->setColumnStretch(column, 1);
+  // Room between the file and the table's headings.
+  grid->setRowMinimumHeight(2, grid->rowMinimumHeight(2) + 8);
 
   auto* buttons = new QHBoxLayout;
   buttons->addStretch();
@@ -79,8 +78,7 @@ OFLContentController::OFLContentController(QWidget* parent_I) : QWidget(parent_I
   auto* layout = new QVBoxLayout(this);
   layout->setContentsMargins(16, 14, 16, 14);
   layout->setSpacing(12);
-  layout->addLayout(form);
-  layout->addLayout(versions);
+  layout->addLayout(grid);
   layout->addWidget(mStatusView);
   layout->addLayout(buttons);
 
@@ -105,6 +103,8 @@ QLineEdit* OFLContentController::MakeField(const char* name_I) {
   auto* field = new QLineEdit(this);
   field->setReadOnly(true);
   field->setAccessibleName(T(name_I));
+  // Fixed pitch, so that the checksums' padding lines their digits up.
+  field->setFont(QFontDatabase::systemFont(QFontDatabase::FixedFont));
   field->setMinimumWidth(field->fontMetrics().horizontalAdvance(QStringLiteral("0000.00.0")) + 16);
   return field;
 }
