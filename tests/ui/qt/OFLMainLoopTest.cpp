@@ -4,13 +4,16 @@
 // while the main thread is still in the set-up neither hangs nor skips the
 // terminate handler.
 #include <QElapsedTimer>
+#include <QFileDialog>
 #include <QProgressBar>
+#include <QTest>
 #include <QThread>
 #include <thread>
 
 #include "common/CMainThreadLoop.h"
 #include "common/OSUtils.h"
 #include "lab/CLabDesktop.h"
+#include "ui/qt/OFLContentController.h"
 #include "ui/qt/OFLUpdateController.h"
 #include "ui/qt/QtWindowFixture.h"
 
@@ -114,6 +117,33 @@ TEST_F(QtMainLoop, AnEndDuringTheSetUpRunsTheTerminateHandlerWithoutHanging) {
   // The terminate handler ran: the driver's stop was announced, and the end.
   EXPECT_EQ(desktop->GetNotifications(),
             (Words{"com.tavik.removeTavikTablet.closeModalDialog", "com.tavik.TFUCompleted"}));
+}
+
+TEST_F(QtMainLoop, AFileChosenInTheFullDialogIsProgrammedWithTheStatesComingThroughTheLoop) {
+  AttachPen();
+  Make({});
+  SWindowLoop wiring(*mWindow);
+  mWindow->SetAssumeYes(true);
+  OFLContentController& content = *mWindow->GetContent();
+  OnModal([this](QWidget& dialog_I) {
+    auto& chooser = dynamic_cast<QFileDialog&>(dialog_I);
+    chooser.selectFile(QString::fromStdString((mFolder / "cfg" / "Firmware" / "pen.pen").string()));
+    QMetaObject::invokeMethod(&chooser, "accept", Qt::DirectConnection);
+  });
+  mWindow->PostToMainLoop([&content] {
+    QTest::mouseClick(content.GetBrowseButton(), Qt::LeftButton);
+    QTest::mouseClick(content.GetProgramButton(), Qt::LeftButton);
+  });
+  QTimer ended;
+  QObject::connect(&ended, &QTimer::timeout, [this] {
+    if (mExitStatus != -100) mWindow->QuitMainLoop();
+  });
+  ended.start(5);
+  ASSERT_TRUE(RunForAtMostTenSeconds(*mWindow)) << "the update did not end";
+  EXPECT_TRUE(mJournal.Has("pen.ProgramBoard"));
+  EXPECT_EQ(mWindow->GetStatusText(), T("Programming Successful"));
+  EXPECT_EQ(mWindow->GetStatusProgress(), 100);
+  EXPECT_EQ(mExitStatus, 0);
 }
 
 }  // namespace
