@@ -16,8 +16,8 @@ class CUpdateCommand {
   int Run();
 
   // The window, not the terminal: there is a display to open it on (a
-  // Wayland or X display named in the environment, or a Qt platform given)
-  // and --headless was not asked for.
+  // Wayland or X display named in the environment whose socket is there,
+  // or a Qt platform given) and --headless was not asked for.
   static bool UsesWindow(bool headless_I);
 
  private:
