@@ -12,7 +12,6 @@ class OFLSvgView : public QWidget {
   OFLSvgView(const QString& name_I, int side_I, QWidget* parent_I = nullptr);
 
   QSize sizeHint() const override { return QSize(mSide, mSide); }
-  bool IsValid() const { return mRenderer.isValid(); }
 
  protected:
   void paintEvent(QPaintEvent* event_I) override;

@@ -47,22 +47,10 @@ TEST(ScalarConfirmation, OnlyItsButtonsChangeTheAnswer) {
 
 class QtDialogs : public QtWindowFixture {};
 
-TEST_F(QtDialogs, AlertsKeepTheirButtonOrderAndEscapeOrReturnGivesTheSafeOne) {
+TEST_F(QtDialogs, QuestionsGiveTheSafeAnswerOnEscapeOrReturn) {
   AttachPen();
   FLAppDelegate& app = Make({});
   mWindow->SetInteractive(true);
-  QStringList order;
-  OnModal([&order](QWidget& box_I) {
-    std::map<int, QString> byPosition;
-    for (QPushButton* button : box_I.findChildren<QPushButton*>()) {
-      byPosition[button->mapTo(&box_I, QPoint()).x()] = button->text();
-    }
-    for (const auto& [x, text] : byPosition) order << text;
-    QTest::keyClick(&box_I, Qt::Key_Escape);
-  });
-  EXPECT_EQ(mWindow->ShowAlert({EALERT_STYLE_CRITICAL, "M", "I", {"First", "Second", "Third"}}), 0);
-  EXPECT_EQ(order, (QStringList{"First", "Second", "Third"}));
-
   const SAlert question{EALERT_STYLE_WARNING, "Title", "Text", {"No", "Yes"}};
   Answer("Yes");
   EXPECT_TRUE(mWindow->AskYesNo(question));

@@ -19,13 +19,12 @@ namespace {
 
 class QtStateTable : public QtWindowFixture {
  protected:
+  // The title bar's button and every menu, which must agree.
   bool CloseEnabled() const {
     const OFLMainWindow& window = *mWindow->GetWindow();
-    bool menus = true;
-    for (QMenu* menu : window.GetMenus()) menus &= menu->menuAction()->isEnabled();
-    EXPECT_EQ(menus, window.GetCloseEnabled());
-    EXPECT_EQ(window.windowFlags().testFlag(Qt::WindowCloseButtonHint), window.GetCloseEnabled());
-    return window.GetCloseEnabled();
+    const bool enabled = window.windowFlags().testFlag(Qt::WindowCloseButtonHint);
+    for (QMenu* menu : window.GetMenus()) EXPECT_EQ(menu->menuAction()->isEnabled(), enabled);
+    return enabled;
   }
 };
 
