@@ -101,11 +101,10 @@ int RunInWindow(SRunSeams seams_I, SRunOptions options_I) {
   window.SetAssumeYes(options_I.assumeYes);
   // The images lie where the configuration of the run is found: beside the
   // program in the build tree, else in the installed data folder.
-  const std::string dataFolder =
-      std::filesystem::exists(LinuxPaths::AppendPathComponent(seams_I.executableFolder,
-                                                              "fw_loader.ini"))
-          ? seams_I.executableFolder
-          : seams_I.installedDataFolder;
+  const std::string dataFolder = std::filesystem::exists(LinuxPaths::AppendPathComponent(
+                                     seams_I.executableFolder, "fw_loader.ini"))
+                                     ? seams_I.executableFolder
+                                     : seams_I.installedDataFolder;
   window.SetDataFolder(dataFolder);
   CRun run(std::move(seams_I), std::move(options_I), window);
   auto print = [](const std::string& line_I) {

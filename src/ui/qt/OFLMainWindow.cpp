@@ -45,5 +45,6 @@ void OFLMainWindow::closeEvent(QCloseEvent* event_I) {
 void OFLMainWindow::ShowAbout() {
   QMessageBox::about(this, T("Tavik Firmware Update Utility"),
                      T("Tavik Firmware Update Utility") + QStringLiteral(" ") +
-                         QString::fromStdString(OSUtils::GetMainBundleVersion().AsString(FileVersion::EStyleThreePart)));
+                         QString::fromStdString(OSUtils::GetMainBundleVersion().AsString(
+                             FileVersion::EStyleThreePart)));
 }

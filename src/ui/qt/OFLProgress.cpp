@@ -29,7 +29,8 @@ QLabel* MakeStatusLine(QWidget* parent_I) {
 void Show(QProgressBar& bar_I, double value_I) {
   // QProgressBar ignores a value outside its range; the bar shows the
   // nearest end instead.
-  const int shown = std::isnan(value_I) ? 0 : static_cast<int>(std::lround(std::clamp(value_I, 0.0, 100.0)));
+  const int shown =
+      std::isnan(value_I) ? 0 : static_cast<int>(std::lround(std::clamp(value_I, 0.0, 100.0)));
   bar_I.setValue(shown);
   bar_I.repaint();
 }

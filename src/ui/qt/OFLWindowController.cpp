@@ -236,7 +236,8 @@ int OFLWindowController::ShowAlert(const SAlert& alert_I) {
     default: {
       // The default style shows the program's own icon.
       const qreal ratio = box.devicePixelRatio();
-      QPixmap icon = OFLImages::ApplicationIcon().pixmap(QSize(kAlertIconSide, kAlertIconSide), ratio);
+      QPixmap icon =
+          OFLImages::ApplicationIcon().pixmap(QSize(kAlertIconSide, kAlertIconSide), ratio);
       box.setIconPixmap(icon);
       break;
     }

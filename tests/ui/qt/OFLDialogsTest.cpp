@@ -28,10 +28,14 @@ TEST(ScalarConfirmation, OnlyItsButtonsChangeTheAnswer) {
   QtApp();
   // The answer of an earlier showing, how this one ends, and the answer.
   const std::vector<std::tuple<const char*, const char*, Qt::Key, bool>> rows = {
-      {"", "Update", Qt::Key_unknown, true},     {"", "Cancel", Qt::Key_unknown, false},
-      {"", "", Qt::Key_Escape, false},           {"", "", Qt::Key_Return, false},
-      {"", "closed", Qt::Key_unknown, false},    {"Update", "", Qt::Key_Escape, true},
-      {"Update", "closed", Qt::Key_unknown, true}, {"Update", "Cancel", Qt::Key_unknown, false},
+      {"", "Update", Qt::Key_unknown, true},
+      {"", "Cancel", Qt::Key_unknown, false},
+      {"", "", Qt::Key_Escape, false},
+      {"", "", Qt::Key_Return, false},
+      {"", "closed", Qt::Key_unknown, false},
+      {"Update", "", Qt::Key_Escape, true},
+      {"Update", "closed", Qt::Key_unknown, true},
+      {"Update", "Cancel", Qt::Key_unknown, false},
   };
   for (const auto& [before, button, key, answer] : rows) {
     SCOPED_TRACE(std::string(before) + "/" + button + "/" + std::to_string(key));

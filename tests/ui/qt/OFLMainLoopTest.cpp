@@ -77,7 +77,6 @@ TEST_F(QtMainLoop, DispatchesRunOnTheGuiThreadInOrderAndProgressIsDrawnBeforeThe
   std::vector<int> next(2, 0);
   for (const auto& [thread, sequence] : ran) EXPECT_EQ(sequence, next[thread]++);
   EXPECT_EQ(barAfterDispatch, (std::vector<int>{11, 56, 100}));
-
 }
 
 TEST_F(QtMainLoop, AnEndDuringTheSetUpRunsTheTerminateHandlerWithoutHanging) {

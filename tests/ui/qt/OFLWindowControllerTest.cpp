@@ -32,8 +32,8 @@ TEST_F(QtStateTable, EachStateDrivesBothDialogs) {
   AttachPen();
   struct SRow {
     ECONTROLLER_STATE state;
-    std::string text;  // the status line afterwards
-    bool close;        // close button and menus
+    std::string text;                    // the status line afterwards
+    bool close;                          // close button and menus
     std::optional<bool> panel, program;  // the full dialog's; unset: not touched
     std::string alert;                   // the dialog it shows, if any
     bool terminated;

@@ -77,13 +77,13 @@ class QtWindowFixture : public UpdateFixture {
     arguments_I.insert(arguments_I.begin(), "prog");
     arguments_I.insert(arguments_I.end(), {"-f", mConfig});
     mExitStatus = -100;
-    mApp = std::make_unique<FLAppDelegate>(SApplicationSetup{
-        .window = mWindow.get(),
-        .desktop = nullptr,
-        .terminal = false,
-        .exitProcess = [this](int status_I) { mExitStatus = status_I; },
-        .printResult = nullptr,
-        .printError = nullptr});
+    mApp = std::make_unique<FLAppDelegate>(
+        SApplicationSetup{.window = mWindow.get(),
+                          .desktop = nullptr,
+                          .terminal = false,
+                          .exitProcess = [this](int status_I) { mExitStatus = status_I; },
+                          .printResult = nullptr,
+                          .printError = nullptr});
     mWindow->SetApplication(mApp.get());
     SUpdaterSetup setup = Setup(arguments_I);
     setup.delegate = mApp.get();
