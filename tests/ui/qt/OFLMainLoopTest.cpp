@@ -123,11 +123,15 @@ TEST_F(QtMainLoop, AFileChosenInTheFullDialogIsProgrammedWithTheStatesComingThro
     QTest::mouseClick(content.GetProgramButton(), Qt::LeftButton);
   });
   QTimer ended;
+  // The update thread still reports after the end; the window must outlive it.
   QObject::connect(&ended, &QTimer::timeout, [this] {
-    if (mExitStatus != -100) mWindow->QuitMainLoop();
+    if (mExitStatus != -100 && OFLUpdater::updater()->programThreadFinished()) {
+      mWindow->QuitMainLoop();
+    }
   });
   ended.start(5);
   ASSERT_TRUE(RunForAtMostTenSeconds(*mWindow)) << "the update did not end";
+  OFLUpdater::updater()->joinProgramThread();
   EXPECT_TRUE(mJournal.Has("pen.ProgramBoard"));
   EXPECT_EQ(mWindow->GetStatusText(), T("Programming Successful"));
   EXPECT_EQ(mWindow->GetStatusProgress(), 100);
