@@ -105,7 +105,8 @@ TEST_F(QtDialogs, FileChooserOpensInTheDevicesFirmwareFolderAndHandsThePickedFil
       auto& chooser = dynamic_cast<QFileDialog&>(dialog_I);
       folder = chooser.directory().absolutePath();
       filter = chooser.nameFilters().join('|');
-      chooser.selectFile(QString::fromStdString(file.string()));
+      // Typed, as a user would; selectFile leaves a focused name field alone.
+      chooser.findChild<QLineEdit*>("fileNameEdit")->setText(QString::fromStdString(file.string()));
       QMetaObject::invokeMethod(&chooser, "accept", Qt::DirectConnection);
     });
     QTest::mouseClick(content.GetBrowseButton(), Qt::LeftButton);

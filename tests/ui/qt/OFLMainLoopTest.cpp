@@ -4,6 +4,7 @@
 // while the main thread is still in the set-up neither hangs nor skips the
 // terminate handler.
 #include <QFileDialog>
+#include <QLineEdit>
 #include <QProgressBar>
 #include <QTest>
 #include <QThread>
@@ -115,7 +116,8 @@ TEST_F(QtMainLoop, AFileChosenInTheFullDialogIsProgrammedWithTheStatesComingThro
   OFLContentController& content = *mWindow->GetContent();
   OnModal([this](QWidget& dialog_I) {
     auto& chooser = dynamic_cast<QFileDialog&>(dialog_I);
-    chooser.selectFile(QString::fromStdString((mFolder / "cfg" / "Firmware" / "pen.pen").string()));
+    chooser.findChild<QLineEdit*>("fileNameEdit")
+        ->setText(QString::fromStdString((mFolder / "cfg" / "Firmware" / "pen.pen").string()));
     QMetaObject::invokeMethod(&chooser, "accept", Qt::DirectConnection);
   });
   mWindow->PostToMainLoop([&content] {
