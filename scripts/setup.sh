@@ -9,7 +9,7 @@ PACKAGES=(
   googletest libgtest-dev libgmock-dev libbenchmark-dev
   libxml2-dev libxml2-utils zlib1g-dev
   libudev-dev libusb-1.0-0-dev libftdi1-dev libsystemd-dev
-  qt6-base-dev gettext
+  qt6-base-dev qt6-svg-dev gettext
   umockdev libumockdev-dev libglib2.0-dev edid-decode
   srecord binutils python3 dbus-daemon
   openssl

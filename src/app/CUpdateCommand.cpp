@@ -4,6 +4,7 @@
 
 #include <cerrno>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 #include <filesystem>
 
@@ -38,7 +39,35 @@ bool LabStateFolderWritable(const std::string& folder_I, std::string& error_O) {
   return true;
 }
 
+bool IsSet(const char* name_I) {
+  const char* value = std::getenv(name_I);
+  return value != nullptr && value[0] != '\0';
+}
+
+// A local display whose socket is missing cannot be opened, and Qt would
+// abort the run on it; a display on another host is taken on trust.
+bool DisplayReachable() {
+  std::error_code error;
+  if (IsSet("WAYLAND_DISPLAY")) {
+    const std::string name = std::getenv("WAYLAND_DISPLAY");
+    const char* runtime = std::getenv("XDG_RUNTIME_DIR");
+    const std::string socket =
+        name.front() == '/' ? name : std::string(runtime != nullptr ? runtime : "") + "/" + name;
+    if (std::filesystem::exists(socket, error)) return true;
+  }
+  if (!IsSet("DISPLAY")) return false;
+  const std::string display = std::getenv("DISPLAY");
+  if (display.front() != ':') return true;
+  const std::string number = display.substr(1, display.find('.') - 1);
+  return std::filesystem::exists("/tmp/.X11-unix/X" + number, error);
+}
+
 }  // namespace
+
+bool CUpdateCommand::UsesWindow(bool headless_I) {
+  if (headless_I) return false;
+  return IsSet("QT_QPA_PLATFORM") || DisplayReachable();
+}
 
 int CUpdateCommand::Run() {
   std::string error;
@@ -106,6 +135,7 @@ int CUpdateCommand::Run() {
     options.processArguments.push_back(argument);
   }
   options.assumeYes = mCommandLine.GetYes();
+  options.window = UsesWindow(mCommandLine.GetHeadless());
   CLabSession* sessionToFinish = session.get();
   options.beforeExit = [sessionToFinish] {
     if (sessionToFinish != nullptr) sessionToFinish->Finish();

@@ -15,6 +15,11 @@ class CUpdateCommand {
   // error, with the status to exit with.
   int Run();
 
+  // The window, not the terminal: there is a display to open it on (a
+  // Wayland or X display named in the environment whose socket is there,
+  // or a Qt platform given) and --headless was not asked for.
+  static bool UsesWindow(bool headless_I);
+
  private:
   const CCommandLine& mCommandLine;
   std::string mProgramPath;

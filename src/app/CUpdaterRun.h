@@ -1,6 +1,6 @@
 #pragma once
-// One update run as the program makes it: the terminal window on the main
-// thread's loop, the updater driver with the run's seams, and the
+// One update run as the program makes it: the window (Qt's, or the
+// terminal's) on the main thread's loop, the updater driver with the run's seams, and the
 // application object that ends the process through its terminate handler.
 
 #include <functional>
@@ -25,9 +25,9 @@ struct SRunSeams {
 
 struct SRunOptions {
   std::vector<std::string> processArguments;  // program name first
-  // Reports per board and ends with the outcome as its status. Every run is
-  // one until the program has a window.
-  bool terminal = true;
+  // The window instead of the terminal. A terminal run reports per board
+  // and ends with the outcome as its status; a window run ends with 0.
+  bool window = false;
   bool assumeYes = false;
   // Runs just before the process ends (a lab run saves its boards here).
   std::function<void()> beforeExit;

@@ -113,6 +113,10 @@ class CWindowController {
   // True only when the user chose yes; closing, end of input and "nobody
   // can answer" are no, unless the form was told to assume yes.
   virtual bool AskYesNo(const SAlert& question_I) = 0;
+  // The confirmation before a scalar is written through its bridge, with
+  // `buttons` {cancel, update}. A form with windows gives it a window of its
+  // own; otherwise it is asked like any question.
+  virtual bool RunScalarConfirmation(const SAlert& question_I) { return AskYesNo(question_I); }
 
   // The main thread's task loop. RunMainLoop runs posted tasks one at a
   // time, in the order they were posted, until QuitMainLoop; a Quit made

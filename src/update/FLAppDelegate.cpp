@@ -125,6 +125,7 @@ void FLAppDelegate::applicationDidFinishLaunching() {
 void FLAppDelegate::presentDialog() {
   mWindowController = mSetup.window;
   if (mWindowController == nullptr) return;
+  if (mUpdater == nullptr) mUpdater = OFLUpdater::updater();
   mWindowController->initForDialog(mUpdater != nullptr && mUpdater->isCommandLine());
   mWindowController->showWindow();
   mWindowController->SetCloseHandler([this] { terminate(ERUN_DECLINED); });
@@ -176,8 +177,19 @@ void FLAppDelegate::ExitBeforeStart(const std::string& error_I, int status_I) {
 
 bool FLAppDelegate::confirmProgram() {
   if (mSetup.window == nullptr) return false;
-  // The scalar over the bridge has a confirmation of its own; until that
-  // path exists, it is asked the same way.
+  // The type before any entry of the list applied its own: a run that names
+  // a scalar still has the pen's here. Only a scalar picked in the board
+  // list gets the scalar's own window.
+  if (mUpdater != nullptr && mUpdater->getUpdateType() == EUPDATE_SCALAR_FTDI) {
+    SAlert scalar{EALERT_STYLE_WARNING,
+                  T("Tavik Firmware Update Utility"),
+                  T("You are about to update the firmware of the display.") + "\n\n" +
+                      T("Keep the display connected to power and to the computer, and do not "
+                        "switch it off until the update has finished.") +
+                      "\n\n" + T("Do you want to continue?"),
+                  {T("Cancel"), T("Update")}};
+    return mSetup.window->RunScalarConfirmation(scalar);
+  }
   SAlert question{EALERT_STYLE_WARNING,
                   T("Tavik Firmware Update Utility"),
                   T("You are about to update the firmware.") + "\n\n" +

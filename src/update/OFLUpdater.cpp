@@ -310,7 +310,10 @@ bool OFLUpdater::setupUpdate() {
     Terminate(ERUN_FAILED);
     return false;
   }
-  mFlagCommandLine = true;
+  // Arguments that name no board leave the choice to the user: the window
+  // then offers the board list and the file chooser. (A terminal run
+  // refuses to start without a board before it gets here.)
+  mFlagCommandLine = !mDeviceUpdates.empty();
   mHIDMgrSemaphore->ReleaseSemaphore();
   return true;
 }

@@ -83,6 +83,8 @@ class OFLUpdater : public CRegistryWatcher {
   void deviceAdded(const DeviceInfo& info_I);
   void deviceRemoved(const DeviceInfo& info_I);
 
+  // True after setupUpdate when the arguments name a board to update;
+  // false leaves the board and the file to the user.
   bool isCommandLine() const { return mFlagCommandLine; }
   int updateIndex() const { return mUpdateIndex; }
   void setUpdateIndex(int index_I) { mUpdateIndex = index_I; }

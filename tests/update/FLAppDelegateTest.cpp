@@ -266,15 +266,15 @@ TEST_F(Application, TerminalRunReportsEveryBoardAndCountsEachOne) {
                    T("Result: no supported tablet is connected.")}));
 }
 
-TEST_F(Application, AWindowRunWithoutABoardWaitsUntilItIsEndedFromOutside) {
+TEST_F(Application, AWindowRunWithoutABoardLeavesBoardAndFileToTheUser) {
   AttachPen();
   FLAppDelegate& window = Make({}, /*terminal=*/false);
   RunToTheEnd(window);
-  EXPECT_EQ(window.state(), ESTATE_PROGRAM);
+  // The full dialog: nothing is asked or programmed until the user acts.
+  EXPECT_FALSE(OFLUpdater::updater()->isCommandLine());
+  EXPECT_FALSE(mWindow.mCalls.Has("ask"));
+  EXPECT_FALSE(mJournal.Has("pen.ProgramBoard"));
   EXPECT_FALSE(window.HasTerminated());
-  EXPECT_TRUE(mWindow.mCalls.Has("close:0"));  // the window cannot be closed either
-  window.terminate(ERUN_DECLINED);
-  EXPECT_EQ(mExitStatus, 0);
 }
 
 TEST_F(Application, WatchThatCannotBeSetUpEndsTheRunOnARealMainLoop) {
