@@ -106,8 +106,10 @@ bool CLabProgrammingBoard::OnSetFeature(const DeviceInfo&, const std::vector<uin
       if (!mRefusedSinceStart) {
         mStoredSum = ImageSum();
         mSumStored = true;
-        // The module restarts in place into the image it now holds.
+        // The module restarts in place into the image it now holds; one
+        // that was under its loader identity comes back under its own.
         mRelease = FindLabRelease(mImage.data(), mImage.size()).value_or(mDescription.release);
+        if (mMode == EMode::eLoader) Reenumerate([this] { mMode = EMode::eNormal; });
       }
       mSession = false;
       mBusyUntil = now + mDescription.endBusy;
