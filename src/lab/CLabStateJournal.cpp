@@ -19,7 +19,8 @@ constexpr size_t kBatchHeader = 12;
 constexpr uint64_t kFoldSlack = 1u << 20;
 
 void PutWord(std::vector<uint8_t>& out_IO, uint32_t value_I) {
-  for (int shift = 0; shift < 32; shift += 8) out_IO.push_back(static_cast<uint8_t>(value_I >> shift));
+  for (int shift = 0; shift < 32; shift += 8)
+    out_IO.push_back(static_cast<uint8_t>(value_I >> shift));
 }
 
 uint32_t GetWord(const uint8_t* bytes_I) {

@@ -47,9 +47,10 @@ SLoaded LoadFolder(const std::string& path_I) {
 class LabStateJournal : public ::testing::Test {
  protected:
   void TearDown() override { std::filesystem::remove_all(mFolder); }
-  std::filesystem::path mFolder = std::filesystem::temp_directory_path() /
-                                  ("tavik-lab-journal-" + std::to_string(::getpid()));
-  std::string mPath = (std::filesystem::create_directories(mFolder), mFolder / "pen.state").string();
+  std::filesystem::path mFolder =
+      std::filesystem::temp_directory_path() / ("tavik-lab-journal-" + std::to_string(::getpid()));
+  std::string mPath =
+      (std::filesystem::create_directories(mFolder), mFolder / "pen.state").string();
 };
 
 TEST_F(LabStateJournal, AKillBetweenAnyTwoWritesLeavesTheStateOfAWholeReport) {
@@ -98,7 +99,8 @@ TEST_F(LabStateJournal, AKillBetweenAnyTwoWritesLeavesTheStateOfAWholeReport) {
   }
   for (size_t size : cuts) {
     WriteFile(CLabStateJournal::LogPath(cut), log, size);
-    const size_t whole = std::upper_bound(logSizes.begin(), logSizes.end(), size) - logSizes.begin() - 1;
+    const size_t whole =
+        std::upper_bound(logSizes.begin(), logSizes.end(), size) - logSizes.begin() - 1;
     ASSERT_EQ(LoadFolder(cut), after[whole]) << "log cut at " << size;
   }
   // A damaged batch ends the replay where it starts.

@@ -1,7 +1,7 @@
 #include "platform/linux/CLinuxPowerInhibitor.h"
 
-#include <systemd/sd-bus.h>
 #include <fcntl.h>
+#include <systemd/sd-bus.h>
 #include <unistd.h>
 
 #include <cstring>

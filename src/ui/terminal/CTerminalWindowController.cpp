@@ -7,8 +7,8 @@
 #include <cerrno>
 #include <cmath>
 #include <csignal>
-#include <utility>
 #include <cstdlib>
+#include <utility>
 
 #include "common/StringUtilities.h"
 #include "common/TavLog.h"
