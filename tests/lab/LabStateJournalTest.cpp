@@ -13,18 +13,10 @@
 namespace {
 
 using Bytes = std::vector<uint8_t>;
-const char* const kKeys[] = {"flash", "mode", "status"};
-
-struct SLoaded {
-  Bytes flash, mode, status;
-  bool operator==(const SLoaded&) const = default;
-};
+using SLoaded = std::vector<Bytes>;
 
 SLoaded Snapshot(const CLabStateFile& state_I) {
-  SLoaded loaded;
-  Bytes* fields[] = {&loaded.flash, &loaded.mode, &loaded.status};
-  for (size_t i = 0; i < std::size(kKeys); ++i) state_I.GetBytes(kKeys[i], *fields[i]);
-  return loaded;
+  return {state_I.Entry("flash"), state_I.Entry("mode"), state_I.Entry("status")};
 }
 
 Bytes ReadFile(const std::string& path_I) {
