@@ -1,8 +1,10 @@
 #!/usr/bin/env bash
 # The program killed (SIGKILL) in the middle of an update, as a user or a
-# power cut does it, then run again: the second run must complete the
-# update (status 0), and leave every board's state exactly as an update
-# that was never interrupted leaves it, flash and checksums included.
+# power cut does it, then run again. A kill during programming must leave
+# the boards' written-through state in the folder; the second run must
+# complete the update (status 0), and leave every board's state exactly as
+# an update that was never interrupted leaves it, flash and checksums
+# included.
 #
 # For each programming procedure, TAV_KILL_SAMPLES seeded kill points
 # (default 2): a seed's kill comes once the run's progress reaches a
@@ -87,7 +89,7 @@ for entry in "${procedures[@]}"; do
         case "$line" in
           *"PROGRESS: "*)
             progress="${line##*PROGRESS: }"
-            if ((${progress%%[!0-9]*} >= target)); then kill -KILL "$pid"; break; fi ;;
+            if ((${progress%%[!0-9]*} >= target)); then kill -KILL "$pid" 2>/dev/null; break; fi ;;
         esac
       done <"$WORK/pipe"
     else
@@ -100,10 +102,16 @@ for entry in "${procedures[@]}"; do
     wait "$pid" 2>/dev/null
     killed_at="$(last_progress "$log")"
     kills=$((kills + 1))
+    # What the kill left, before the next run changes it.
+    ls "$state"/*.state.log >/dev/null 2>&1 && left=1 || left=""
     output="$(update "$state" "$product" "$flag" "$value" 2>&1)"
     status=$?
     what="$name, seed $seed, kill $how (progress ${killed_at:-none})"
-    if [ "$status" -ne 0 ]; then
+    if [ "${killed_at:-0}" -ge 1 ] && [ "${killed_at}" -lt 100 ] &&
+      [ -z "$left" ]; then
+      echo "FAIL: $what: the kill left nothing of the boards in the state folder"
+      failures=$((failures + 1))
+    elif [ "$status" -ne 0 ]; then
       echo "FAIL: $what: the run after the kill exits $status"; echo "$output" | tail -5
       failures=$((failures + 1))
     elif ! difference="$(same_boards "$reference" "$state")"; then
