@@ -1,8 +1,11 @@
 #include "app/CFirmwareReportCommand.h"
 
+#include <unistd.h>
+
 #include <algorithm>
 #include <cerrno>
 #include <charconv>
+#include <cstdio>
 #include <cstring>
 #include <vector>
 
@@ -116,12 +119,16 @@ class CReasonListener {
 
 class CImageWriter {
  public:
+  // Writes beside `path_I` and takes its place only once whole.
   explicit CImageWriter(const std::string& path_I)
-      : mPath(path_I), mFile(std::fopen(path_I.c_str(), "wb")) {
+      : mPath(path_I),
+        mTemporary(path_I + ".tmp" + std::to_string(getpid())),
+        mFile(std::fopen(mTemporary.c_str(), "wb")) {
     if (mFile == nullptr) Fail();
   }
   ~CImageWriter() {
     if (mFile != nullptr) std::fclose(mFile);
+    if (mFile != nullptr || mFailed) std::remove(mTemporary.c_str());
   }
   CImageWriter(const CImageWriter&) = delete;
   CImageWriter& operator=(const CImageWriter&) = delete;
@@ -138,8 +145,12 @@ class CImageWriter {
     }
   }
   bool Close(std::string& reason_O) {
-    if (mFile != nullptr && std::fclose(mFile) != 0) Fail();
-    mFile = nullptr;
+    if (mFile != nullptr) {
+      if (std::fflush(mFile) != 0 || fsync(fileno(mFile)) != 0) Fail();
+      if (std::fclose(mFile) != 0) Fail();
+      mFile = nullptr;
+    }
+    if (!mFailed && std::rename(mTemporary.c_str(), mPath.c_str()) != 0) Fail();
     if (!mFailed) return true;
     reason_O = "cannot write " + mPath + ": " + std::strerror(mError);
     return false;
@@ -152,6 +163,7 @@ class CImageWriter {
   }
 
   std::string mPath;
+  std::string mTemporary;
   std::FILE* mFile;
   bool mFailed = false;
   int mError = 0;

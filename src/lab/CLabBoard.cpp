@@ -38,6 +38,7 @@ void CLabBoard::Trace(SLabTraceEntry::EKind kind_I, std::vector<uint8_t> bytes_I
 
 void CLabBoard::AfterReport() {
   if (mFaults.VanishDue() && !mUnplugged && mBus != nullptr) mBus->Vanish(*this);
+  WriteChanges();
 }
 
 EHidStatus CLabBoard::SetFeature(const DeviceInfo& interface_I,
@@ -143,6 +144,11 @@ std::string CLabBoard::StatePath(const std::string& folder_I) const {
 }
 
 bool CLabBoard::SaveState(const std::string& folder_I) const {
+  if (mJournal && mJournalFolder == folder_I) {
+    mJournal->State().PutNumber("unplugged", mUnplugged ? 1 : 0);
+    Save(mJournal->State());
+    return mJournal->Fold();
+  }
   CLabStateFile state;
   state.PutNumber("unplugged", mUnplugged ? 1 : 0);
   Save(state);
@@ -152,7 +158,31 @@ bool CLabBoard::SaveState(const std::string& folder_I) const {
 bool CLabBoard::LoadState(const std::string& folder_I) {
   CLabStateFile state;
   if (!state.Load(StatePath(folder_I))) return false;
+  // What the last run wrote through after its last snapshot: all of it, if
+  // that run was killed.
+  CLabStateJournal::Replay(CLabStateJournal::LogPath(StatePath(folder_I)), state);
   // A board that was unplugged comes back as after a power cycle.
   Load(state, state.GetNumber("unplugged", 0) != 0);
   return true;
+}
+
+bool CLabBoard::WriteThrough(const std::string& folder_I) {
+  mJournal = std::make_unique<CLabStateJournal>();
+  mJournalFolder = folder_I;
+  mJournal->State().PutNumber("unplugged", mUnplugged ? 1 : 0);
+  Save(mJournal->State());
+  if (mJournal->Open(StatePath(folder_I))) return true;
+  mJournal.reset();
+  return false;
+}
+
+void CLabBoard::WriteChanges() {
+  if (!mJournal) return;
+  const uint64_t revision = StateRevision();
+  if (revision != 0 && revision == mWrittenRevision && mUnplugged == mWrittenUnplugged) return;
+  mWrittenRevision = revision;
+  mWrittenUnplugged = mUnplugged;
+  mJournal->State().PutNumber("unplugged", mUnplugged ? 1 : 0);
+  Save(mJournal->State());
+  mJournal->Record();
 }

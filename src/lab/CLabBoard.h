@@ -9,6 +9,7 @@
 
 #include <cstdint>
 #include <functional>
+#include <memory>
 #include <mutex>
 #include <string>
 #include <utility>
@@ -16,6 +17,7 @@
 
 #include "lab/CLabFaults.h"
 #include "lab/CLabStateFile.h"
+#include "lab/CLabStateJournal.h"
 #include "lab/LabTypes.h"
 #include "seams/CHidNode.h"
 #include "seams/CUsbControl.h"
@@ -83,9 +85,15 @@ class CLabBoard {
 
   // The board's file in a state folder.
   std::string StatePath(const std::string& folder_I) const;
+  // While the board writes through to `folder_I`, folds its log instead.
   bool SaveState(const std::string& folder_I) const;
   // False, leaving the board as it is, when the folder has no state of it.
   bool LoadState(const std::string& folder_I);
+  // From now on every change goes to the folder as it happens, after each
+  // report and each re-enumeration.
+  bool WriteThrough(const std::string& folder_I);
+  // Writes what changed since the last call; nothing unless writing through.
+  void WriteChanges();
 
   // Set by the bus.
   bool IsAttached() const { return mAttached; }
@@ -106,6 +114,10 @@ class CLabBoard {
 
   virtual void Save(CLabStateFile& state_IO) const = 0;
   virtual void Load(const CLabStateFile& state_I, bool powerCycled_I) = 0;
+  // A number that goes up whenever what Save writes changes, so that
+  // writing through can skip a board that did not change; 0, the default,
+  // means the board keeps none and is compared after every report.
+  virtual uint64_t StateRevision() const { return 0; }
 
   // Drops off the bus, runs `boot_I`, and comes back with the interfaces
   // of the mode it then has. The delays are the bus's.
@@ -135,4 +147,8 @@ class CLabBoard {
   bool mReenumerating = false;
   uint32_t mLocationId = 0;
   uint64_t mGeneration = 0;
+  std::unique_ptr<CLabStateJournal> mJournal;
+  std::string mJournalFolder;
+  uint64_t mWrittenRevision = 0;
+  bool mWrittenUnplugged = false;
 };

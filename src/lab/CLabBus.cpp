@@ -118,6 +118,7 @@ void CLabBus::ScheduleReenumerate(CLabBoard& board_I, std::function<void()> boot
       std::lock_guard<std::recursive_mutex> guard(bus->mLock);
       if (board->mUnplugged) return;
       bus->Detach(*board);
+      board->WriteChanges();
     }
     bus->DeliverEvents();
   });
@@ -130,6 +131,7 @@ void CLabBus::ScheduleReenumerate(CLabBoard& board_I, std::function<void()> boot
       board->mReenumerating = false;
       boot_I();
       bus->Attach(*board);
+      board->WriteChanges();
     }
     bus->DeliverEvents();
   });
@@ -161,6 +163,15 @@ bool CLabBus::SaveState(const std::string& folder_I) const {
   for (const std::shared_ptr<CLabBoard>& board : mBoards)
     saved = board->SaveState(folder_I) && saved;
   return saved;
+}
+
+bool CLabBus::WriteThrough(const std::string& folder_I) {
+  if (!MakeFolders(folder_I)) return false;
+  std::lock_guard<std::recursive_mutex> guard(mLock);
+  bool opened = true;
+  for (const std::shared_ptr<CLabBoard>& board : mBoards)
+    opened = board->WriteThrough(folder_I) && opened;
+  return opened;
 }
 
 int CLabBus::LoadState(const std::string& folder_I) {

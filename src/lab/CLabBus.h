@@ -64,6 +64,9 @@ class CLabBus : public std::enable_shared_from_this<CLabBus> {
   bool SaveState(const std::string& folder_I) const;
   // Boards with a saved state take it; returns how many did.
   int LoadState(const std::string& folder_I);
+  // Every board writes its state through to the folder from now on, so a
+  // run that is killed leaves the boards as the kill found them.
+  bool WriteThrough(const std::string& folder_I);
   // Gives every board the faults meant for it.
   void AddFaults(const std::vector<SLabFault>& faults_I, uint64_t seed_I);
 

@@ -79,6 +79,7 @@ class CLabFTDIBridge : public CLabBoard {
  protected:
   void Save(CLabStateFile& state_IO) const override;
   void Load(const CLabStateFile& state_I, bool powerCycled_I) override;
+  uint64_t StateRevision() const override { return mFlash.GetRevision(); }
 
  private:
   LabViolationSink Sink();

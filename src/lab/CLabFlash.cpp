@@ -48,6 +48,8 @@ CLabFlash::CLabFlash(SLabFlashLayout layout_I) : mLayout(std::move(layout_I)) {
   mRomChecksums.assign(count, 0);
   mBlankSinceErase.assign(count, false);
   mEraseCounts.assign(count, 0);
+  mContentRevisions.assign(count, 0);
+  for (uint32_t i = 0; i < count; ++i) Touch(i);
 }
 
 void CLabFlash::FactoryImage(uint32_t seed_I) {
@@ -57,6 +59,7 @@ void CLabFlash::FactoryImage(uint32_t seed_I) {
       state = state * 1103515245u + 12345u;
       byte = static_cast<uint8_t>(state >> 16);
     }
+    Touch(i);
     CalculateChecksum(i);
   }
   CommitChecksums();
@@ -85,6 +88,7 @@ bool CLabFlash::Erase(uint32_t block_I) {
   }
   if (mBlankSinceErase[block_I]) ++mNeedlessErases;
   std::fill(mContent[block_I].begin(), mContent[block_I].end(), 0xFF);
+  Touch(block_I);
   mBlankSinceErase[block_I] = true;
   ++mEraseCounts[block_I];
   return true;
@@ -110,6 +114,7 @@ bool CLabFlash::Program(uint32_t address_I, const uint8_t* data_I, size_t size_I
     Violation("write at " + Hex(address_I) + ", off the word grid");
   }
   std::vector<uint8_t>& content = mContent[index];
+  Touch(static_cast<uint32_t>(index));
   bool overUnerased = false;
   for (size_t i = 0; i < size_I; ++i) {
     uint8_t& cell = content[offset + i];
@@ -182,7 +187,7 @@ void CLabFlash::Boot() {
 
 void CLabFlash::Save(CLabStateFile& state_IO, const std::string& prefix_I) const {
   for (uint32_t i = 0; i < GetBlockCount(); ++i) {
-    state_IO.PutBytes(prefix_I + ".block" + std::to_string(i), mContent[i]);
+    state_IO.PutBytes(prefix_I + ".block" + std::to_string(i), mContent[i], mContentRevisions[i]);
   }
   state_IO.PutBytes(prefix_I + ".checksums", NumbersToBytes(mChecksums));
   state_IO.PutBytes(prefix_I + ".rom-checksums", NumbersToBytes(mRomChecksums));
@@ -196,6 +201,7 @@ void CLabFlash::Load(const CLabStateFile& state_I, const std::string& prefix_I) 
     if (state_I.GetBytes(prefix_I + ".block" + std::to_string(i), content) &&
         content.size() == mContent[i].size()) {
       mContent[i] = std::move(content);
+      Touch(i);
     }
   }
   std::vector<uint8_t> bytes;

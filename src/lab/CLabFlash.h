@@ -98,9 +98,14 @@ class CLabFlash {
 
  private:
   void Violation(const std::string& text_I);
+  void Touch(uint32_t block_I) { mContentRevisions[block_I] = ++mLastRevision; }
 
   SLabFlashLayout mLayout;
   std::vector<std::vector<uint8_t>> mContent;
+  // Per block, a value that changes with its content, so that a board saved
+  // after every report compares only the blocks that were written.
+  std::vector<uint64_t> mContentRevisions;
+  uint64_t mLastRevision = 0;
   std::vector<uint32_t> mChecksums;
   std::vector<uint32_t> mRomChecksums;
   uint32_t mMagicWord = 0;

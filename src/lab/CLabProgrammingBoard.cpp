@@ -20,6 +20,7 @@ void CLabProgrammingBoard::FactoryReset(uint32_t seed_I) {
     state = state * 1103515245u + 12345u;
     byte = static_cast<uint8_t>(state >> 16);
   }
+  ++mImageRevision;
   mStoredSum = ImageSum();
   mSumStored = true;
   PowerOn();
@@ -60,6 +61,7 @@ bool CLabProgrammingBoard::Store(uint32_t address_I, const uint8_t* data_I, size
     return false;
   }
   std::copy(data_I, data_I + size_I, mImage.begin() + (address_I - mDescription.imageBase));
+  ++mImageRevision;
   return true;
 }
 
@@ -84,6 +86,7 @@ bool CLabProgrammingBoard::OnSetFeature(const DeviceInfo&, const std::vector<uin
   switch (phase) {
     case 1:
       std::fill(mImage.begin(), mImage.end(), 0xFF);
+      ++mImageRevision;
       mSumStored = false;
       mStoredSum = 0;
       mSession = true;
@@ -106,8 +109,10 @@ bool CLabProgrammingBoard::OnSetFeature(const DeviceInfo&, const std::vector<uin
       if (!mRefusedSinceStart) {
         mStoredSum = ImageSum();
         mSumStored = true;
-        // The module restarts in place into the image it now holds.
+        // The module restarts in place into the image it now holds; one
+        // that was under its loader identity comes back under its own.
         mRelease = FindLabRelease(mImage.data(), mImage.size()).value_or(mDescription.release);
+        if (mMode == EMode::eLoader) Reenumerate([this] { mMode = EMode::eNormal; });
       }
       mSession = false;
       mBusyUntil = now + mDescription.endBusy;
@@ -136,7 +141,7 @@ std::pair<size_t, size_t> CLabProgrammingBoard::DataRange(
 }
 
 void CLabProgrammingBoard::Save(CLabStateFile& state_IO) const {
-  state_IO.PutBytes("image", mImage);
+  state_IO.PutBytes("image", mImage, mImageRevision);
   state_IO.PutNumber("sum", mStoredSum);
   state_IO.PutNumber("sum-stored", mSumStored ? 1 : 0);
   state_IO.PutNumber("mode", mMode == EMode::eLoader ? 1 : 0);
@@ -145,6 +150,7 @@ void CLabProgrammingBoard::Save(CLabStateFile& state_IO) const {
 void CLabProgrammingBoard::Load(const CLabStateFile& state_I, bool powerCycled_I) {
   std::vector<uint8_t> image;
   if (state_I.GetBytes("image", image) && image.size() == mImage.size()) mImage = image;
+  ++mImageRevision;
   mStoredSum = static_cast<uint32_t>(state_I.GetNumber("sum", 0));
   mSumStored = state_I.GetNumber("sum-stored", 0) != 0;
   PowerOn();

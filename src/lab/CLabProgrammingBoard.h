@@ -96,6 +96,9 @@ class CLabProgrammingBoard : public CLabBoard {
 
   SLabProgrammingDescription mDescription;
   std::vector<uint8_t> mImage;
+  // Goes up with every change of mImage: saving after each report then
+  // compares the image only when a report wrote to it.
+  uint64_t mImageRevision = 1;
   uint32_t mStoredSum = 0;
   bool mSumStored = false;
   EMode mMode = EMode::eNormal;

@@ -32,6 +32,7 @@ CLabSerialFlash::CLabSerialFlash(size_t blocks_I, bool threeStatusRegisters_I,
 void CLabSerialFlash::SetData(std::vector<uint8_t> data_I) {
   data_I.resize(mData.size(), 0xFF);
   mData = std::move(data_I);
+  ++mRevision;
 }
 
 std::vector<uint8_t> CLabSerialFlash::Execute(uint8_t opcode_I, const std::vector<uint8_t>& out_I,
@@ -103,6 +104,7 @@ void CLabSerialFlash::WriteStatus(size_t register_I, uint8_t value_I, bool prote
   }
   // The busy and write-enable bits are not stored.
   mStatus[register_I] = register_I == 0 ? static_cast<uint8_t>(value_I & 0xFC) : value_I;
+  ++mRevision;
 }
 
 void CLabSerialFlash::Erase(uint32_t address_I) {
@@ -113,6 +115,7 @@ void CLabSerialFlash::Erase(uint32_t address_I) {
     return;
   }
   std::fill_n(mData.begin() + static_cast<std::ptrdiff_t>(first), kBlockSize, 0xFF);
+  ++mRevision;
   ++mErases;
 }
 
@@ -124,6 +127,7 @@ void CLabSerialFlash::Program(uint32_t address_I, const std::vector<uint8_t>& da
     return;
   }
   bool overwrote = false;
+  ++mRevision;
   for (size_t i = 0; i < data_I.size(); ++i) {
     uint8_t& cell = mData[address_I + i];
     overwrote |= (cell & data_I[i]) != data_I[i];
@@ -139,15 +143,17 @@ uint8_t CLabSerialFlash::Crc(uint32_t first_I, uint32_t last_I) const {
 }
 
 void CLabSerialFlash::Save(CLabStateFile& state_IO) const {
-  state_IO.PutBytes("flash", mData);
+  state_IO.PutBytes("flash", mData, mRevision);
   state_IO.PutBytes("flashStatus", {mStatus[0], mStatus[1], mStatus[2]});
 }
 
 void CLabSerialFlash::Load(const CLabStateFile& state_I) {
   std::vector<uint8_t> bytes;
   if (state_I.GetBytes("flash", bytes) && bytes.size() == mData.size()) mData = bytes;
+  ++mRevision;
   if (state_I.GetBytes("flashStatus", bytes) && bytes.size() == 3) {
     std::copy(bytes.begin(), bytes.end(), mStatus);
   }
+  ++mRevision;
   mWriteEnabled = false;
 }

@@ -46,6 +46,8 @@ class CLabSerialFlash {
   uint8_t GetStatus() const { return mStatus[0]; }
   bool IsProtected() const { return (mStatus[0] & 0x1C) != 0; }
   size_t GetErases() const { return mErases; }
+  // Goes up with every change of what Save writes.
+  uint64_t GetRevision() const { return mRevision; }
 
   void Save(CLabStateFile& state_IO) const;
   void Load(const CLabStateFile& state_I);
@@ -56,6 +58,9 @@ class CLabSerialFlash {
   void WriteStatus(size_t register_I, uint8_t value_I, bool protectPinHigh_I);
 
   std::vector<uint8_t> mData;
+  // Goes up with every change of mData and mStatus: saving after each
+  // transfer then costs nothing while nothing was programmed.
+  uint64_t mRevision = 1;
   bool mThreeStatusRegisters;
   LabViolationSink mViolation;
   uint8_t mStatus[3] = {kFactoryStatus, 0, 0};

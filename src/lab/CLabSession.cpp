@@ -14,6 +14,9 @@ int CLabSession::Start() {
   if (mOptions.GetFast()) CClock::Set(std::make_shared<CVirtualClock>(CClock::Get()->Now()));
   const int loaded = mBus->LoadState(mOptions.GetStateFolder());
   mBus->AddFaults(mOptions.GetFaults(), mOptions.GetSeed());
+  if (!mBus->WriteThrough(mOptions.GetStateFolder())) {
+    TavLog::Error("Lab state not written through to %s\n", mOptions.GetStateFolder().c_str());
+  }
   for (const SLabFault& fault : mOptions.GetFaults()) {
     TavLog::Info("Lab fault: %s\n", LabFaultText(fault).c_str());
   }

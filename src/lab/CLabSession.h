@@ -1,9 +1,10 @@
 #pragma once
 // One lab run: at its start the boards take their saved state and their
-// faults, and with --lab-fast the process runs on a virtual clock; at its
-// end every board's state goes back to the state folder, so that a second
-// run finds the boards as this one left them (an unplugged board as after
-// a power cycle).
+// faults, and with --lab-fast the process runs on a virtual clock; from
+// then on every board writes its state through to the state folder as it
+// changes, as a chip keeps what was programmed into it, so that a second
+// run finds the boards as this one left them, even when this one was
+// killed (an unplugged board as after a power cycle).
 
 #include <memory>
 

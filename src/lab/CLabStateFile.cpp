@@ -1,19 +1,51 @@
 #include "lab/CLabStateFile.h"
 
+#include <algorithm>
 #include <cstdio>
+#include <cstring>
 #include <fstream>
 
 namespace {
 const char kHeader[] = "tavik-lab-state 1\n";
 }
 
-void CLabStateFile::PutBytes(const std::string& key_I, const std::vector<uint8_t>& bytes_I) {
-  mEntries[key_I] = bytes_I;
+void CLabStateFile::PutBytes(const std::string& key_I, const std::vector<uint8_t>& bytes_I,
+                             uint64_t revision_I) {
+  if (revision_I != 0) {
+    uint64_t& known = mRevisions[key_I];
+    if (known == revision_I && mEntries.count(key_I) != 0) return;
+    known = revision_I;
+  }
+  auto [entry, added] = mEntries.try_emplace(key_I);
+  std::vector<uint8_t>& bytes = entry->second;
+  if (added || bytes.size() != bytes_I.size()) {
+    bytes = bytes_I;
+    mChanges.push_back({key_I, bytes.size(), 0, bytes.size()});
+    return;
+  }
+  // Compared before copied, chunk by chunk: a page programmed changes one.
+  for (size_t offset = 0; offset < bytes.size(); offset += kChunkSize) {
+    const size_t length = std::min(kChunkSize, bytes.size() - offset);
+    if (std::memcmp(bytes.data() + offset, bytes_I.data() + offset, length) == 0) continue;
+    std::memcpy(bytes.data() + offset, bytes_I.data() + offset, length);
+    mChanges.push_back({key_I, bytes.size(), offset, length});
+  }
+}
+
+void CLabStateFile::PutRange(const std::string& key_I, size_t size_I, size_t offset_I,
+                             const uint8_t* data_I, size_t length_I) {
+  std::vector<uint8_t>& bytes = mEntries[key_I];
+  bytes.resize(size_I);
+  if (offset_I <= size_I && length_I <= size_I - offset_I) {
+    std::copy(data_I, data_I + length_I, bytes.begin() + static_cast<std::ptrdiff_t>(offset_I));
+  }
+  mRevisions.erase(key_I);
+  mChanges.push_back({key_I, size_I, offset_I, length_I});
 }
 
 void CLabStateFile::PutNumber(const std::string& key_I, uint64_t value_I) {
   const std::string text = std::to_string(value_I);
-  mEntries[key_I] = std::vector<uint8_t>(text.begin(), text.end());
+  PutBytes(key_I, std::vector<uint8_t>(text.begin(), text.end()));
 }
 
 bool CLabStateFile::GetBytes(const std::string& key_I, std::vector<uint8_t>& bytes_O) const {
@@ -21,6 +53,12 @@ bool CLabStateFile::GetBytes(const std::string& key_I, std::vector<uint8_t>& byt
   if (found == mEntries.end()) return false;
   bytes_O = found->second;
   return true;
+}
+
+const std::vector<uint8_t>& CLabStateFile::Entry(const std::string& key_I) const {
+  static const std::vector<uint8_t> kNone;
+  auto found = mEntries.find(key_I);
+  return found == mEntries.end() ? kNone : found->second;
 }
 
 uint64_t CLabStateFile::GetNumber(const std::string& key_I, uint64_t default_I) const {
@@ -53,6 +91,8 @@ bool CLabStateFile::Save(const std::string& path_I) const {
 
 bool CLabStateFile::Load(const std::string& path_I) {
   mEntries.clear();
+  mRevisions.clear();
+  mChanges.clear();
   std::ifstream in(path_I, std::ios::binary | std::ios::ate);
   if (!in) return false;
   const std::streamoff fileSize = in.tellg();

@@ -6,6 +6,7 @@
 
 #include "common/TavAssert.h"
 #include "common/TavLog.h"
+#include "common/TavReplaceFile.h"
 #include "settings/ASN1Coding.h"
 #include "settings/CSettingsArray.h"
 #include "settings/CSettingsBool.h"
@@ -325,14 +326,16 @@ std::string CSettingsObject::GetJSONString() const {
 bool CSettingsObject::SaveJSONToFile(const std::string& path_I) const {
   try {
     if (!IsContainer(*this)) return false;
-    std::ofstream out(path_I, std::ios::binary | std::ios::trunc);
-    if (!out.good()) return false;
     std::string json = GetJSONString();
     if (json.empty()) json = "{}";
-    out << json << std::endl;
-    out.close();
-    // A full disk shows only here; a document half written is no success.
-    return !out.fail();
+    return TavReplaceFile(path_I, [&json](const std::string& temporary_I) {
+      std::ofstream out(temporary_I, std::ios::binary | std::ios::trunc);
+      if (!out.good()) return false;
+      out << json << std::endl;
+      out.close();
+      // A full disk shows only here; a document half written is no success.
+      return !out.fail();
+    });
   } catch (const std::exception& error) {
     TavLog::Info("SaveJSONToFile: %s\n", error.what());
   }

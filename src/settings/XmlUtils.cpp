@@ -11,6 +11,7 @@
 #include "common/StringUtilities.h"
 #include "common/TavAssert.h"
 #include "common/TavLog.h"
+#include "common/TavReplaceFile.h"
 
 namespace XmlUtils {
 
@@ -109,14 +110,16 @@ xmlDocPtr LoadXmlDocumentFromMemory(const std::string& buffer_I) {
 bool SaveXmlDocument(const std::string& path_I, xmlDocPtr doc_I, int options_I) {
   TavLog::Info("XmlUtils::SaveXmlDocument - saving to file: %s...\n", path_I.c_str());
   SilenceLibraryOutput();
-  xmlSaveCtxtPtr context = xmlSaveToFilename(path_I.c_str(), "UTF-8", options_I);
-  if (context == nullptr) {
+  return TavReplaceFile(path_I, [doc_I, options_I](const std::string& temporary_I) {
+    xmlSaveCtxtPtr context = xmlSaveToFilename(temporary_I.c_str(), "UTF-8", options_I);
+    if (context == nullptr) {
+      TraceXmlError();
+      return false;
+    }
+    xmlSaveDoc(context, doc_I);
     TraceXmlError();
-    return false;
-  }
-  xmlSaveDoc(context, doc_I);
-  TraceXmlError();
-  return xmlSaveClose(context) >= 0;
+    return xmlSaveClose(context) >= 0;
+  });
 }
 
 std::string GetDocumentStringAndFormat(xmlDocPtr doc_I, bool format_I, bool withDeclaration_I) {

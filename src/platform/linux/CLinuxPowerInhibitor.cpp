@@ -1,7 +1,7 @@
 #include "platform/linux/CLinuxPowerInhibitor.h"
 
-#include <systemd/sd-bus.h>
 #include <fcntl.h>
+#include <systemd/sd-bus.h>
 #include <unistd.h>
 
 #include <cstring>
@@ -11,16 +11,18 @@
 
 namespace {
 
-// Holds logind's descriptor; closing it ends the inhibition.
+// Holds logind's descriptors; closing them ends the inhibitions.
 class CInhibitLease : public CPowerAssertion {
  public:
-  explicit CInhibitLease(int fd_I) : mFd(fd_I) {}
+  CInhibitLease(int idleFd_I, int shutdownFd_I) : mIdleFd(idleFd_I), mShutdownFd(shutdownFd_I) {}
   ~CInhibitLease() override {
-    if (mFd >= 0) close(mFd);
+    if (mShutdownFd >= 0) close(mShutdownFd);
+    if (mIdleFd >= 0) close(mIdleFd);
   }
 
  private:
-  int mFd;
+  int mIdleFd;
+  int mShutdownFd;
 };
 
 // Nothing can idle the machine to sleep: granted, with nothing to hold.
@@ -31,6 +33,24 @@ bool MeansNoLogind(const sd_bus_error& error_I) {
          sd_bus_error_has_name(&error_I, SD_BUS_ERROR_NAME_HAS_NO_OWNER) ||
          sd_bus_error_has_name(&error_I, SD_BUS_ERROR_UNKNOWN_OBJECT) ||
          sd_bus_error_has_name(&error_I, SD_BUS_ERROR_UNKNOWN_METHOD);
+}
+
+// Logind's Inhibit; the descriptor of the lock, our own copy, or -1 with
+// `error_O` or `status_O` saying why.
+int Inhibit(sd_bus* bus_I, const char* what_I, const std::string& why_I, const char* mode_I,
+            sd_bus_error& error_O, int& status_O) {
+  sd_bus_message* reply = nullptr;
+  status_O = sd_bus_call_method(bus_I, "org.freedesktop.login1", "/org/freedesktop/login1",
+                                "org.freedesktop.login1.Manager", "Inhibit", &error_O, &reply,
+                                "ssss", what_I, CLinuxPowerInhibitor::kWho, why_I.c_str(), mode_I);
+  int kept = -1;
+  int fd = -1;
+  if (status_O >= 0 && sd_bus_message_read(reply, "h", &fd) >= 0 && fd >= 0) {
+    // The descriptor belongs to the message; keep a copy of our own.
+    kept = fcntl(fd, F_DUPFD_CLOEXEC, 3);
+  }
+  sd_bus_message_unref(reply);
+  return kept;
 }
 
 }  // namespace
@@ -47,10 +67,7 @@ std::unique_ptr<CPowerAssertion> CLinuxPowerInhibitor::Create(const std::string&
   sd_bus_set_method_call_timeout(bus, 5 * 1000 * 1000);
 
   sd_bus_error error = SD_BUS_ERROR_NULL;
-  sd_bus_message* reply = nullptr;
-  status = sd_bus_call_method(bus, "org.freedesktop.login1", "/org/freedesktop/login1",
-                              "org.freedesktop.login1.Manager", "Inhibit", &error, &reply, "ssss",
-                              "idle:sleep", kWho, name_I.c_str(), "block");
+  const int idleFd = Inhibit(bus, "idle:sleep", name_I, "block", error, status);
   std::unique_ptr<CPowerAssertion> result;
   if (status < 0) {
     if (MeansNoLogind(error)) {
@@ -60,17 +77,21 @@ std::unique_ptr<CPowerAssertion> CLinuxPowerInhibitor::Create(const std::string&
       TavLog::Error("Power assertion refused: %s\n",
                     error.message != nullptr ? error.message : TavSysErrStr(-status).c_str());
     }
+  } else if (idleFd < 0) {
+    TavLog::Error("Power assertion: logind's answer carried no descriptor\n");
   } else {
-    int fd = -1;
-    if (sd_bus_message_read(reply, "h", &fd) >= 0 && fd >= 0) {
-      // The descriptor belongs to the message; keep a copy of our own.
-      const int kept = fcntl(fd, F_DUPFD_CLOEXEC, 3);
-      if (kept >= 0) result = std::make_unique<CInhibitLease>(kept);
+    // A shutdown waits for the board to leave its loader, as long as
+    // logind lets a delay last; without this lock the update still runs.
+    sd_bus_error shutdownError = SD_BUS_ERROR_NULL;
+    const int shutdownFd = Inhibit(bus, "shutdown", name_I, "delay", shutdownError, status);
+    if (shutdownFd < 0) {
+      TavLog::Warning("A shutdown will not wait for the update: %s\n",
+                      shutdownError.message != nullptr ? shutdownError.message : "no descriptor");
     }
-    if (!result) TavLog::Error("Power assertion: logind's answer carried no descriptor\n");
+    sd_bus_error_free(&shutdownError);
+    result = std::make_unique<CInhibitLease>(idleFd, shutdownFd);
   }
   sd_bus_error_free(&error);
-  sd_bus_message_unref(reply);
   sd_bus_flush_close_unref(bus);
   return result;
 }

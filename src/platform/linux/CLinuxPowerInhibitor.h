@@ -1,7 +1,9 @@
 #pragma once
 // Keeps the machine awake during an update through systemd-logind's
-// Inhibit("idle:sleep", ...) on the system bus. The lock holds while the
-// file descriptor logind handed out stays open.
+// Inhibit("idle:sleep", ..., "block") on the system bus, and makes a
+// shutdown wait for the update with Inhibit("shutdown", ..., "delay"). Each
+// lock holds while the file descriptor logind handed out stays open. Only
+// the first decides whether the assertion is granted.
 
 #include <string>
 

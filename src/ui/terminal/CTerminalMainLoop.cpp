@@ -36,7 +36,7 @@ struct CTerminalMainLoop::SShared {
 
 namespace {
 
-constexpr int kCaughtSignals[] = {SIGINT, SIGHUP};
+constexpr int kCaughtSignals[] = {SIGINT, SIGHUP, SIGTERM};
 
 // Shared with the signal handler, hence lock-free atomics only.
 std::atomic<int> gSignalWakeFd{-1};

@@ -1,7 +1,7 @@
 #pragma once
 // The main thread's task loop for the terminal front-end. Any thread posts
 // tasks; a pipe wakes the loop. When the loop catches signals, the interrupt
-// (Ctrl-C) and hang-up signals only leave a note and a byte in that pipe,
+// (Ctrl-C), hang-up and terminate signals only leave a note and a byte in that pipe,
 // and the loop acts on them between tasks, outside the signal handler.
 //
 // One loop at a time may catch signals; it puts the previous handlers back
@@ -33,7 +33,8 @@ class CTerminalMainLoop {
   void PostAfter(double delay_I, std::function<void()> task_I);
   bool IsLoopThread() const { return std::this_thread::get_id() == mThread; }
 
-  // Catches SIGINT and SIGHUP; `handler_I` gets each on the loop's thread.
+  // Catches SIGINT, SIGHUP and SIGTERM; `handler_I` gets each on the loop's
+  // thread.
   // False (and nothing changes) when another loop holds them already.
   bool CatchSignals(std::function<void(int signal_I)> handler_I);
   void ReleaseSignals();

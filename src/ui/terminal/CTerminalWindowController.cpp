@@ -8,6 +8,7 @@
 #include <cmath>
 #include <csignal>
 #include <cstdlib>
+#include <utility>
 
 #include "common/StringUtilities.h"
 #include "common/TavLog.h"
@@ -130,7 +131,14 @@ void CTerminalWindowController::initForDialog(bool /*commandLine_I*/) {
 
 void CTerminalWindowController::showWindow() {}
 
-void CTerminalWindowController::enableClose(bool enable_I) { mCloseEnabled = enable_I; }
+void CTerminalWindowController::enableClose(bool enable_I) {
+  mCloseEnabled = enable_I;
+  if (!enable_I || mDeferredSignal == 0) return;
+  const int signal = std::exchange(mDeferredSignal, 0);
+  // Posted, not run here: the state that enabled closing finishes first,
+  // and a run that ends by itself keeps its own outcome.
+  mLoop->Post([this, signal] { OnSignal(signal); });
+}
 
 void CTerminalWindowController::SetCloseHandler(std::function<void()> handler_I) {
   mCloseHandler = std::move(handler_I);
@@ -352,9 +360,12 @@ void CTerminalWindowController::OnSignal(int signal_I) {
     }
     return;
   }
-  if (signal_I == SIGHUP) {
-    // The terminal is gone; the update goes on without it.
-    TavLog::Warning("Hang-up ignored: closing is disabled while the update runs\n");
+  if (signal_I == SIGHUP || signal_I == SIGTERM) {
+    // The terminal, the session or the machine is going away; the board
+    // must not be left in its loader, so the end waits for it.
+    TavLog::Warning("%s deferred: closing is disabled while the update runs\n",
+                    signal_I == SIGHUP ? "Hang-up" : "Terminate");
+    mDeferredSignal = signal_I;
     return;
   }
   TavLog::Warning("Interrupt refused: closing is disabled while the update runs\n");

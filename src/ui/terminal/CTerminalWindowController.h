@@ -18,10 +18,14 @@
 // off, nobody can answer: a question is answered no and an alert with its
 // first button, and the answer is printed with the reason.
 //
-// Closing the window maps to the interrupt and hang-up signals, caught by
-// the main loop: while closing is enabled they run the close handler (an
-// interrupt during a question answers it with its safe answer); while it
-// is disabled they are refused, so Ctrl-C cannot cut off a running update.
+// Closing the window maps to the interrupt, hang-up and terminate signals,
+// caught by the main loop: while closing is enabled they run the close
+// handler (an interrupt during a question answers it with its safe
+// answer). While it is disabled, that is while a board is on its way into
+// its loader, in it or on its way out, Ctrl-C is refused, so it cannot cut
+// off a running update; a hang-up or a terminate (a closed terminal, a
+// session or a machine shutting down) is kept and takes effect once
+// closing is enabled again, after the board has left its loader.
 // Ctrl-\ still ends the process at once, as a last resort.
 //
 // Its few words of its own ("[y/N]", the not-interactive notes, the refusal
@@ -108,6 +112,8 @@ class CTerminalWindowController : public CWindowController {
   int mColumns = 0;
   bool mAssumeYes = false;
   bool mCloseEnabled = true;
+  // A hang-up or terminate that came while closing was disabled, or 0.
+  int mDeferredSignal = 0;
   std::function<void()> mCloseHandler;
   std::unique_ptr<CTerminalMainLoop> mLoop;
 

@@ -16,7 +16,7 @@ namespace {
 // sees when the caller lets go: the read end reports end of file.
 class CFakeLogind {
  public:
-  enum class EMode { kGrant, kRefuse };
+  enum class EMode { kGrant, kRefuse, kRefuseShutdown };
 
   explicit CFakeLogind(EMode mode_I) : mMode(mode_I) {
     if (sd_bus_open_system(&mBus) < 0) return;
@@ -42,16 +42,17 @@ class CFakeLogind {
   }
 
   bool IsReady() const { return mReady; }
-  std::vector<std::string> LastArguments() const { return mArguments; }
-  int LastReadEnd() const { return mReadEnds.empty() ? -1 : mReadEnds.back(); }
+  std::vector<std::vector<std::string>> Calls() const { return mCalls; }
+  std::vector<int> ReadEnds() const { return mReadEnds; }
 
  private:
   static int OnInhibit(sd_bus_message* message_I, void* self_I, sd_bus_error* error_O) {
     auto* self = static_cast<CFakeLogind*>(self_I);
     const char *what = nullptr, *who = nullptr, *why = nullptr, *mode = nullptr;
     sd_bus_message_read(message_I, "ssss", &what, &who, &why, &mode);
-    self->mArguments = {what, who, why, mode};
-    if (self->mMode == EMode::kRefuse) {
+    self->mCalls.push_back({what, who, why, mode});
+    if (self->mMode == EMode::kRefuse ||
+        (self->mMode == EMode::kRefuseShutdown && std::string(what) == "shutdown")) {
       return sd_bus_error_set(error_O, SD_BUS_ERROR_ACCESS_DENIED, "not for you");
     }
     int ends[2];
@@ -67,11 +68,11 @@ class CFakeLogind {
   bool mReady = false;
   std::atomic<bool> mStop{false};
   std::thread mThread;
-  std::vector<std::string> mArguments;
+  std::vector<std::vector<std::string>> mCalls;
   std::vector<int> mReadEnds;
 };
 
-TEST(LinuxPowerInhibitor, HoldsLogindsLockUntilTheAssertionGoesAndIsRefusedOnlyByLogind) {
+TEST(LinuxPowerInhibitor, HoldsIdleAndShutdownLocksUntilTheAssertionGoesAndIsRefusedOnlyByLogind) {
   CPrivateBus bus;
   if (!bus.IsUp()) GTEST_SKIP() << "dbus-daemon is not installed";
   CLinuxPowerInhibitor inhibitor;
@@ -80,13 +81,31 @@ TEST(LinuxPowerInhibitor, HoldsLogindsLockUntilTheAssertionGoesAndIsRefusedOnlyB
     ASSERT_TRUE(logind.IsReady());
     auto assertion = inhibitor.Create("Updating Tavik tablet firmware");
     ASSERT_NE(assertion, nullptr);
-    EXPECT_EQ(logind.LastArguments(),
-              (std::vector<std::string>{"idle:sleep", "tavik-fwupdater",
-                                        "Updating Tavik tablet firmware", "block"}));
-    pollfd entry{logind.LastReadEnd(), POLLIN, 0};
-    EXPECT_EQ(poll(&entry, 1, 0), 0) << "still held";
+    // Idle sleep blocked, and a shutdown delayed until the update lets go.
+    EXPECT_EQ(logind.Calls(),
+              (std::vector<std::vector<std::string>>{
+                  {"idle:sleep", "tavik-fwupdater", "Updating Tavik tablet firmware", "block"},
+                  {"shutdown", "tavik-fwupdater", "Updating Tavik tablet firmware", "delay"}}));
+    ASSERT_EQ(logind.ReadEnds().size(), 2u);
+    for (int readEnd : logind.ReadEnds()) {
+      pollfd entry{readEnd, POLLIN, 0};
+      EXPECT_EQ(poll(&entry, 1, 0), 0) << "still held";
+    }
     assertion.reset();
-    EXPECT_EQ(poll(&entry, 1, 2000), 1) << "let go";
+    for (int readEnd : logind.ReadEnds()) {
+      pollfd entry{readEnd, POLLIN, 0};
+      EXPECT_EQ(poll(&entry, 1, 2000), 1) << "let go";
+    }
+  }
+  {
+    // Without the shutdown lock the update still runs, keeping the idle one.
+    CFakeLogind logind(CFakeLogind::EMode::kRefuseShutdown);
+    ASSERT_TRUE(logind.IsReady());
+    auto assertion = inhibitor.Create("x");
+    ASSERT_NE(assertion, nullptr);
+    ASSERT_EQ(logind.ReadEnds().size(), 1u);
+    pollfd entry{logind.ReadEnds()[0], POLLIN, 0};
+    EXPECT_EQ(poll(&entry, 1, 0), 0) << "idle lock still held";
   }
   {
     CFakeLogind logind(CFakeLogind::EMode::kRefuse);

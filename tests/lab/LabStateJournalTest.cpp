@@ -1,0 +1,126 @@
+// A board's state written through as it changes: whatever moment a kill
+// comes at, the folder loads as the state after some whole report.
+#include <gtest/gtest.h>
+#include <unistd.h>
+
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <set>
+
+#include "lab/CLabStateJournal.h"
+
+namespace {
+
+using Bytes = std::vector<uint8_t>;
+using SLoaded = std::vector<Bytes>;
+
+SLoaded Snapshot(const CLabStateFile& state_I) {
+  return {state_I.Entry("flash"), state_I.Entry("mode"), state_I.Entry("status")};
+}
+
+Bytes ReadFile(const std::string& path_I) {
+  std::ifstream in(path_I, std::ios::binary);
+  return Bytes(std::istreambuf_iterator<char>(in), {});
+}
+
+void WriteFile(const std::string& path_I, const Bytes& bytes_I, size_t size_I) {
+  std::ofstream(path_I, std::ios::binary | std::ios::trunc)
+      .write(reinterpret_cast<const char*>(bytes_I.data()), static_cast<std::streamsize>(size_I));
+}
+
+SLoaded LoadFolder(const std::string& path_I) {
+  CLabStateFile state;
+  EXPECT_TRUE(state.Load(path_I));
+  CLabStateJournal::Replay(CLabStateJournal::LogPath(path_I), state);
+  return Snapshot(state);
+}
+
+class LabStateJournal : public ::testing::Test {
+ protected:
+  void TearDown() override { std::filesystem::remove_all(mFolder); }
+  std::filesystem::path mFolder =
+      std::filesystem::temp_directory_path() / ("tavik-lab-journal-" + std::to_string(::getpid()));
+  std::string mPath =
+      (std::filesystem::create_directories(mFolder), mFolder / "pen.state").string();
+};
+
+TEST_F(LabStateJournal, AKillBetweenAnyTwoWritesLeavesTheStateOfAWholeReport) {
+  CLabStateJournal journal;
+  Bytes flash(3 * CLabStateFile::kChunkSize, 0xFF);
+  journal.State().PutBytes("flash", flash);
+  journal.State().PutNumber("mode", 0);
+  ASSERT_TRUE(journal.Open(mPath));
+
+  // One report each: a page programmed, a mode change, two chunks and a new
+  // entry at once, nothing at all, a page over a chunk's end.
+  struct SStep {
+    size_t offset, length;
+    uint8_t value;
+    int mode;
+    bool status;
+  };
+  const SStep steps[] = {{0, 256, 0x11, 0, false},
+                         {0, 0, 0, 1, false},
+                         {4000, 4500, 0x22, 1, true},
+                         {0, 0, 0, 1, true},
+                         {8100, 200, 0x00, 0, true}};
+  std::vector<SLoaded> after{Snapshot(journal.State())};
+  std::vector<size_t> logSizes{0};
+  for (const SStep& step : steps) {
+    std::fill_n(flash.begin() + static_cast<std::ptrdiff_t>(step.offset), step.length, step.value);
+    journal.State().PutBytes("flash", flash);
+    journal.State().PutNumber("mode", step.mode);
+    if (step.status) journal.State().PutBytes("status", {0x9C, 0x00});
+    ASSERT_TRUE(journal.Record());
+    after.push_back(Snapshot(journal.State()));
+    logSizes.push_back(std::filesystem::file_size(CLabStateJournal::LogPath(mPath)));
+  }
+  EXPECT_EQ(logSizes[3], logSizes[4]) << "a report that changed nothing writes nothing";
+  EXPECT_LT(logSizes[1], 2 * CLabStateFile::kChunkSize) << "a page costs one chunk";
+
+  const Bytes log = ReadFile(CLabStateJournal::LogPath(mPath));
+  const std::string cut = mFolder / "cut.state";
+  std::filesystem::copy_file(mPath, cut);
+  // Every byte around each batch's edges, and a stride through the rest.
+  std::set<size_t> cuts;
+  for (size_t size = 0; size <= log.size(); size += 97) cuts.insert(size);
+  for (size_t edge : logSizes) {
+    for (size_t size = edge > 24 ? edge - 24 : 0; size <= std::min(edge + 24, log.size()); ++size)
+      cuts.insert(size);
+  }
+  for (size_t size : cuts) {
+    WriteFile(CLabStateJournal::LogPath(cut), log, size);
+    const size_t whole =
+        std::upper_bound(logSizes.begin(), logSizes.end(), size) - logSizes.begin() - 1;
+    ASSERT_EQ(LoadFolder(cut), after[whole]) << "log cut at " << size;
+  }
+  // A damaged batch ends the replay where it starts.
+  Bytes damaged = log;
+  damaged[logSizes[2] + 40] ^= 0x01;
+  WriteFile(CLabStateJournal::LogPath(cut), damaged, damaged.size());
+  EXPECT_EQ(LoadFolder(cut), after[2]);
+}
+
+TEST_F(LabStateJournal, FoldingEmptiesTheLogAndALogLeftOverFromBeforeChangesNothing) {
+  CLabStateJournal journal;
+  Bytes flash(2 * CLabStateFile::kChunkSize, 0xFF);
+  journal.State().PutBytes("flash", flash);
+  ASSERT_TRUE(journal.Open(mPath));
+  for (int page = 0; page < 8; ++page) {
+    std::fill_n(flash.begin() + page * 256, 256, static_cast<uint8_t>(page));
+    journal.State().PutBytes("flash", flash);
+    journal.State().PutNumber("mode", page % 2);
+    ASSERT_TRUE(journal.Record());
+  }
+  const Bytes log = ReadFile(CLabStateJournal::LogPath(mPath));
+  ASSERT_TRUE(journal.Fold());
+  EXPECT_EQ(std::filesystem::file_size(CLabStateJournal::LogPath(mPath)), 0u);
+  const SLoaded folded = LoadFolder(mPath);
+  EXPECT_EQ(folded, Snapshot(journal.State()));
+  // A kill between the new snapshot and emptying the log.
+  WriteFile(CLabStateJournal::LogPath(mPath), log, log.size());
+  EXPECT_EQ(LoadFolder(mPath), folded);
+}
+
+}  // namespace
