@@ -2,6 +2,7 @@
 
 #include <unistd.h>
 
+#include <algorithm>
 #include <cmath>
 #include <stdexcept>
 
@@ -428,6 +429,23 @@ void FLAppDelegate::PrintBoardResults() {
   }
 }
 
+std::string FLAppDelegate::ResultLine(ERunOutcome outcome_I) const {
+  // A run the user ended after some boards were done must not say that
+  // nothing was updated.
+  if (outcome_I == ERUN_DECLINED && mUpdater != nullptr) {
+    const std::vector<SBoardResult> boards = mUpdater->boardResults().Get();
+    const auto updated = std::count_if(boards.begin(), boards.end(), [](const SBoardResult& b) {
+      return b.outcome == EBOARD_UPDATED;
+    });
+    if (updated > 0) {
+      return StringUtilities::Format(
+          T("Result: the run was ended after %d of %d boards were updated.").c_str(),
+          static_cast<int>(updated), static_cast<int>(boards.size()));
+    }
+  }
+  return T(OutcomeText(outcome_I));
+}
+
 void FLAppDelegate::terminate(ERunOutcome outcome_I) {
   if (mTerminated) return;
   mTerminated = true;
@@ -436,7 +454,7 @@ void FLAppDelegate::terminate(ERunOutcome outcome_I) {
   if (mSetup.terminal) {
     if (mUpdater != nullptr) outcome = mUpdater->boardResults().Outcome(outcome_I);
     PrintBoardResults();
-    if (mSetup.printResult) mSetup.printResult(T(OutcomeText(outcome)));
+    if (mSetup.printResult) mSetup.printResult(ResultLine(outcome));
   }
   const int status = mSetup.terminal ? static_cast<int>(outcome) : 0;
   if (mSetup.exitProcess) mSetup.exitProcess(status);

@@ -75,6 +75,7 @@ class FLAppDelegate : public CApplicationDelegate {
   // A terminal run with nothing to update ends before the driver is
   // touched; false when it did.
   bool CheckTerminalArguments();
+  std::string ResultLine(ERunOutcome outcome_I) const;
   void PrintBoardResults();
   // Leaves without the terminate handler: nothing was taken yet.
   void ExitBeforeStart(const std::string& error_I, int status_I);

@@ -33,6 +33,8 @@ for signal in TERM HUP; do
     fail "SIG$signal: the pen's update was not completed"
   grep -q "touch controller of Lab Classic Tablet: not updated: the run ended before it" "$WORK/out" ||
     fail "SIG$signal: the run went on to the next board"
+  grep -q "Result: the run was ended after 1 of 2 boards were updated." "$WORK/out" ||
+    fail "SIG$signal: the result line does not say the pen was updated"
   [ "$status" -eq 4 ] || fail "SIG$signal: exit $status, expected 4 (ended by the user)"
   "$PROGRAM" --list --lab classic-tablet --lab-state "$state" | grep -q "in normal mode" ||
     fail "SIG$signal: the tablet was left in its loader"
