@@ -69,6 +69,11 @@ bool CLabProgrammingBoard::IsFrame(const std::vector<uint8_t>& report_I) const {
 }
 
 bool CLabProgrammingBoard::OnSetFeature(const DeviceInfo&, const std::vector<uint8_t>& report_I) {
+  // The host asks every main interface to go to its loader and checks it is
+  // alive; a board with no loader refuses those reports as unknown ones.
+  const bool modeOrProbe = (report_I.size() == 3 && (report_I[0] == 0xCC || report_I[0] == 0xCD)) ||
+                           (report_I.size() == 2 && report_I[0] == 0x02);
+  if (modeOrProbe) return false;
   if (!IsFrame(report_I)) {
     Violation("not a programming report of this target");
     return false;
@@ -106,8 +111,11 @@ bool CLabProgrammingBoard::OnSetFeature(const DeviceInfo&, const std::vector<uin
       if (!mRefusedSinceStart) {
         mStoredSum = ImageSum();
         mSumStored = true;
-        // The module restarts in place into the image it now holds.
+        // The module restarts in place into the image it now holds; one that
+        // came up in its boot code after a cut-off update leaves it too, where
+        // both show the same identity and nothing has to re-enumerate.
         mRelease = FindLabRelease(mImage.data(), mImage.size()).value_or(mDescription.release);
+        if (mDescription.loaderProductId == mDescription.productId) mMode = EMode::eNormal;
       }
       mSession = false;
       mBusyUntil = now + mDescription.endBusy;
