@@ -152,8 +152,7 @@ bool CLabFaults::Empty() const {
   return mVanishAfter == 0 && !mVanishDue && mFailReads == 0 && mFailWrites == 0 && mStalls == 0 &&
          mBusy == 0 && !mRefuseSwitch && mBadDataReports.empty() && mFlakyOneIn == 0 &&
          mNakBytes.empty() && !mStuckBusy && mBadCrcs.empty() && !mRefuseOpen &&
-         mNotReady.empty() && mStale.empty() && mNoReplies == 0 &&
-         mPending.empty();
+         mNotReady.empty() && mStale.empty() && mNoReplies == 0 && mPending.empty();
 }
 
 ELabFaultAction CLabFaults::OnReport(bool isRead_I, bool isData_I, bool ownBusy_I) {

@@ -31,9 +31,8 @@ TEST(LabFaults, ParsingTheCommandLineForm) {
   EXPECT_EQ(fault, (SLabFault{ELabFaultKind::eBadCrc, 3, "bluetooth"}));
   ASSERT_TRUE(ParseLabFault("refuse-switch", fault, error));
   EXPECT_EQ(fault.kind, ELabFaultKind::eRefuseSwitch);
-  for (const char* text :
-       {"fail-read@1", "fail-write@2", "stall@3", "busy@4", "flaky@5", "refuse-switch:pen",
-        "no-reply@6"}) {
+  for (const char* text : {"fail-read@1", "fail-write@2", "stall@3", "busy@4", "flaky@5",
+                           "refuse-switch:pen", "no-reply@6"}) {
     ASSERT_TRUE(ParseLabFault(text, fault, error)) << text;
     EXPECT_EQ(LabFaultText(fault), text);
   }
