@@ -104,7 +104,9 @@ class CTableWriter : public ::testing::Environment {
            "second run / failed. A + marks cells where a changed byte was programmed unseen, "
            "as the procedure checks no data, and the second run mended the board. "
            "\"By index\": the cut left the scalar without running firmware, so no display "
-           "gives its serial; the second run opened the bridge by its index.\n\n"
+           "gives its serial; the second run opened the bridge by its index. On the FTDI "
+           "scalar, busy is a reply not ready yet and bad CRC a wrong CRC from the scalar's "
+           "engine; n/a: the transport has no I2C bus of the lab's own to refuse a byte.\n\n"
            "| procedure |";
     for (const SFaultColumn& column : kColumns) out << ' ' << column.name << " |";
     out << "\n|---|";
