@@ -66,6 +66,9 @@ const SProcedure kProcedures[] = {
     {"FTDI scalar", "display-ftdi", "scalar", "LABFT0701", false},
 };
 
+// Test names and failures name the procedure.
+void PrintTo(const SProcedure& procedure_I, std::ostream* out_I) { *out_I << procedure_I.name; }
+
 // The columns, and the lab fault each stands for on a board reached by HID
 // or USB control, and on the FTDI bridge. A kind a transport cannot meet
 // (a NAK needs an I2C bus of the lab's own) is left out: no cell, "n/a".
