@@ -243,7 +243,7 @@ std::string CCommandLine::HelpText() {
         "                            fail-write@N, stall@N, busy@N, refuse-switch, bad-crc@N,\n"
         "                            flaky@N; on a display's FTDI scalar also nak@N,\n"
         "                            stuck-busy, crc-mismatch@N, refuse-open, not-ready@N,\n"
-        "                            stale@N; KIND@N:BOARD names one board\n"
+        "                            stale@N, no-reply@N; KIND@N:BOARD names one board\n"
         "      --lab-state DIR       where the lab keeps its boards between runs\n"
         "      --lab-fast            run the lab on a virtual clock: no real waiting\n"
         "\n"

@@ -52,6 +52,7 @@ EHidStatus CLabBoard::SetFeature(const DeviceInfo& interface_I,
   switch (mFaults.OnReport(false, isData, AnswersBusyItself())) {
     case ELabFaultAction::eFail: status = EHidStatus::eOther; break;
     case ELabFaultAction::eBusy: status = EHidStatus::eBusy; break;
+    case ELabFaultAction::eNoReply: status = EHidStatus::eTimeout; break;
     case ELabFaultAction::eStall:
       OnSetFeature(interface_I, received);
       status = EHidStatus::eStall;
@@ -77,6 +78,7 @@ EHidStatus CLabBoard::GetFeature(const DeviceInfo& interface_I, std::vector<uint
     case ELabFaultAction::eFail: status = EHidStatus::eOther; break;
     case ELabFaultAction::eBusy: status = EHidStatus::eBusy; break;
     case ELabFaultAction::eStall: status = EHidStatus::eStall; break;
+    case ELabFaultAction::eNoReply: status = EHidStatus::eTimeout; break;
     case ELabFaultAction::eCorrupt:
     case ELabFaultAction::ePass:
       status = OnGetFeature(interface_I, report_IO) ? EHidStatus::eSuccess : EHidStatus::eStall;
@@ -102,6 +104,7 @@ EUsbStatus CLabBoard::Control(uint8_t requestType_I, uint8_t request_I, uint16_t
   switch (mFaults.OnReport(isRead, false, AnswersBusyItself())) {
     case ELabFaultAction::eFail: status = EUsbStatus::eOther; break;
     case ELabFaultAction::eBusy: status = EUsbStatus::eBusy; break;
+    case ELabFaultAction::eNoReply: status = EUsbStatus::eTimeout; break;
     case ELabFaultAction::eStall:
       if (!isRead) answer();
       status = EUsbStatus::eStall;

@@ -9,6 +9,10 @@
 
 namespace {
 
+// A read that gets no answer holds its caller this long, as the kernel's
+// wait on a feature report or a control transfer does.
+constexpr double kReportTimeoutSeconds = 1.0;
+
 bool MakeFolders(const std::string& path_I) {
   for (size_t slash = path_I.find('/', 1);; slash = path_I.find('/', slash + 1)) {
     const std::string part = path_I.substr(0, slash);
@@ -298,6 +302,7 @@ EHidStatus CLabBus::GetFeature(const SBinding& binding_I, std::vector<uint8_t>& 
     if (Holds(binding_I)) status = binding_I.board->GetFeature(binding_I.info, report_IO);
   }
   DeliverEvents();
+  if (status == EHidStatus::eTimeout) TavSleep(kReportTimeoutSeconds);
   return status;
 }
 
@@ -314,6 +319,7 @@ EUsbStatus CLabBus::Control(const SBinding& binding_I, uint8_t requestType_I, ui
     }
   }
   DeliverEvents();
+  if (status == EUsbStatus::eTimeout) TavSleep(kReportTimeoutSeconds);
   return status;
 }
 

@@ -92,10 +92,14 @@ FT_STATUS CLabFTDIBridge::Write(const uint8_t* data_I, uint32_t size_I, uint32_t
 
 FT_STATUS CLabFTDIBridge::Read(uint8_t* data_O, uint32_t size_I, uint32_t& read_O) {
   read_O = 0;
-  const bool taken = TakeTransfer(true);
+  const ELabFaultAction action = Faults().OnReport(true, false, false);
+  const bool taken = action == ELabFaultAction::ePass || action == ELabFaultAction::eCorrupt;
   if (taken) read_O = static_cast<uint32_t>(mEngine.Read(data_O, size_I));
+  // The answer is lost on the way: the read comes back empty after its
+  // time-out, and the bytes never arrive.
+  if (action == ELabFaultAction::eNoReply) mEngine.Purge(true, false);
   AfterReport();
-  return taken ? FT_OK : FT_IO_ERROR;
+  return taken || action == ELabFaultAction::eNoReply ? FT_OK : FT_IO_ERROR;
 }
 
 uint32_t CLabFTDIBridge::QueueStatus() const { return static_cast<uint32_t>(mEngine.Pending()); }

@@ -24,6 +24,7 @@ constexpr SKindName kKindNames[] = {
     {ELabFaultKind::eRefuseOpen, "refuse-open"},
     {ELabFaultKind::eNotReady, "not-ready"},
     {ELabFaultKind::eStale, "stale"},
+    {ELabFaultKind::eNoReply, "no-reply"},
 };
 
 bool TakesCount(ELabFaultKind kind_I) {
@@ -118,7 +119,16 @@ void CLabFaults::Add(const SLabFault& fault_I) {
     case ELabFaultKind::eRefuseOpen: mRefuseOpen = true; break;
     case ELabFaultKind::eNotReady: mNotReady.push_back(fault_I.count); break;
     case ELabFaultKind::eStale: mStale.push_back(fault_I.count); break;
+    case ELabFaultKind::eNoReply: mNoReplies += fault_I.count; break;
   }
+}
+
+void CLabFaults::AddAt(uint64_t reports_I, const SLabFault& fault_I) {
+  if (reports_I <= mReports) {
+    Add(fault_I);
+    return;
+  }
+  mPending.emplace_back(reports_I, fault_I);
 }
 
 void CLabFaults::Clear() {
@@ -134,19 +144,34 @@ void CLabFaults::Clear() {
   mRefuseOpen = false;
   mNotReady.clear();
   mStale.clear();
+  mNoReplies = 0;
+  mPending.clear();
 }
 
 bool CLabFaults::Empty() const {
   return mVanishAfter == 0 && !mVanishDue && mFailReads == 0 && mFailWrites == 0 && mStalls == 0 &&
          mBusy == 0 && !mRefuseSwitch && mBadDataReports.empty() && mFlakyOneIn == 0 &&
          mNakBytes.empty() && !mStuckBusy && mBadCrcs.empty() && !mRefuseOpen &&
-         mNotReady.empty() && mStale.empty();
+         mNotReady.empty() && mStale.empty() && mNoReplies == 0 && mPending.empty();
 }
 
 ELabFaultAction CLabFaults::OnReport(bool isRead_I, bool isData_I, bool ownBusy_I) {
+  for (auto pending = mPending.begin(); pending != mPending.end();) {
+    if (pending->first > mReports) {
+      ++pending;
+      continue;
+    }
+    Add(pending->second);
+    pending = mPending.erase(pending);
+  }
+  ++mReports;
   if (mVanishAfter != 0 && --mVanishAfter == 0) mVanishDue = true;
 
   const bool corrupt = isData_I && CountDown(mBadDataReports);
+  if (isRead_I && mNoReplies != 0) {
+    --mNoReplies;
+    return ELabFaultAction::eNoReply;
+  }
   if (isRead_I && mFailReads != 0) {
     --mFailReads;
     return ELabFaultAction::eFail;

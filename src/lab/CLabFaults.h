@@ -19,6 +19,8 @@
 //                 with one payload byte changed
 //   flaky@N       each report fails with a chance of 1 in N, drawn from
 //                 the wrapper's seeded generator
+//   no-reply@N    the next N reads get no answer: a get-report or a control
+//                 read runs out its time-out, a bridge read returns nothing
 //
 // On an FTDI bridge each FT_Write and FT_Read counts as one report, so
 // vanish@N there cuts the bridge off after N transfers, mid-block if N says
@@ -38,7 +40,9 @@
 //   stale@N       the Nth reply comes after two stale bytes left on the bus
 //
 // A fault may name its board: KIND@N:board. The generator is seeded, so a
-// run with the same faults and seed fails the same reports.
+// run with the same faults and seed fails the same reports. A fault can also
+// be held back until the wrapper has seen a number of reports (AddAt), so a
+// campaign can strike one step of a sequence.
 
 #include <cstdint>
 #include <random>
@@ -60,6 +64,7 @@ enum class ELabFaultKind {
   eRefuseOpen,
   eNotReady,
   eStale,
+  eNoReply,
 };
 
 struct SLabFault {
@@ -83,11 +88,16 @@ enum class ELabFaultAction {
   eStall,    // stalled; a written report still reaches the board
   eBusy,     // busy; the board never sees it
   eCorrupt,  // a payload byte is changed before the board sees it
+  eNoReply,  // a read that never gets its answer; the board never sees it
 };
 
 class CLabFaults {
  public:
   void Add(const SLabFault& fault_I);
+  // Adds the fault once `reports_I` reports have passed the wrapper.
+  void AddAt(uint64_t reports_I, const SLabFault& fault_I);
+  // Reports that have passed the wrapper since it was made.
+  uint64_t GetReportCount() const { return mReports; }
   void Clear();
   void SetSeed(uint64_t seed_I) { mRandom.seed(seed_I); }
   bool Empty() const;
@@ -129,5 +139,8 @@ class CLabFaults {
   bool mRefuseOpen = false;
   std::vector<uint32_t> mNotReady;  // countdowns, one per not-ready fault
   std::vector<uint32_t> mStale;     // countdowns, one per stale fault
+  uint32_t mNoReplies = 0;
+  uint64_t mReports = 0;
+  std::vector<std::pair<uint64_t, SLabFault>> mPending;  // held back by AddAt
   std::mt19937_64 mRandom{0x7A5Cu};
 };

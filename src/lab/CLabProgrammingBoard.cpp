@@ -71,6 +71,11 @@ bool CLabProgrammingBoard::IsFrame(const std::vector<uint8_t>& report_I) const {
 }
 
 bool CLabProgrammingBoard::OnSetFeature(const DeviceInfo&, const std::vector<uint8_t>& report_I) {
+  // The host asks every main interface to go to its loader and checks it is
+  // alive; a board with no loader refuses those reports as unknown ones.
+  const bool modeOrProbe = (report_I.size() == 3 && (report_I[0] == 0xCC || report_I[0] == 0xCD)) ||
+                           (report_I.size() == 2 && report_I[0] == 0x02);
+  if (modeOrProbe) return false;
   if (!IsFrame(report_I)) {
     Violation("not a programming report of this target");
     return false;
@@ -110,9 +115,17 @@ bool CLabProgrammingBoard::OnSetFeature(const DeviceInfo&, const std::vector<uin
         mStoredSum = ImageSum();
         mSumStored = true;
         // The module restarts in place into the image it now holds; one
-        // that was under its loader identity comes back under its own.
+        // that came up in its boot code after a cut-off update leaves it
+        // too: under its own identity again, re-enumerating only where the
+        // two identities differ.
         mRelease = FindLabRelease(mImage.data(), mImage.size()).value_or(mDescription.release);
-        if (mMode == EMode::eLoader) Reenumerate([this] { mMode = EMode::eNormal; });
+        if (mMode == EMode::eLoader) {
+          if (mDescription.loaderProductId == mDescription.productId) {
+            mMode = EMode::eNormal;
+          } else {
+            Reenumerate([this] { mMode = EMode::eNormal; });
+          }
+        }
       }
       mSession = false;
       mBusyUntil = now + mDescription.endBusy;

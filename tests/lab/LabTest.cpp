@@ -31,8 +31,8 @@ TEST(LabFaults, ParsingTheCommandLineForm) {
   EXPECT_EQ(fault, (SLabFault{ELabFaultKind::eBadCrc, 3, "bluetooth"}));
   ASSERT_TRUE(ParseLabFault("refuse-switch", fault, error));
   EXPECT_EQ(fault.kind, ELabFaultKind::eRefuseSwitch);
-  for (const char* text :
-       {"fail-read@1", "fail-write@2", "stall@3", "busy@4", "flaky@5", "refuse-switch:pen"}) {
+  for (const char* text : {"fail-read@1", "fail-write@2", "stall@3", "busy@4", "flaky@5",
+                           "refuse-switch:pen", "no-reply@6"}) {
     ASSERT_TRUE(ParseLabFault(text, fault, error)) << text;
     EXPECT_EQ(LabFaultText(fault), text);
   }
@@ -62,6 +62,16 @@ TEST(LabFaults, EachKindMeetsOnlyItsReports) {
   EXPECT_EQ(faults.OnReport(false, false, true), ELabFaultAction::ePass) << "board's own busy";
   EXPECT_TRUE(faults.TakeBusy());
   EXPECT_FALSE(faults.TakeBusy());
+
+  faults.Add({ELabFaultKind::eNoReply, 1, ""});
+  EXPECT_EQ(faults.OnReport(false, false, false), ELabFaultAction::ePass) << "a write";
+  EXPECT_EQ(faults.OnReport(true, false, false), ELabFaultAction::eNoReply);
+
+  // Held back until the given report, counted from the wrapper's start.
+  faults.AddAt(faults.GetReportCount() + 2, {ELabFaultKind::eFailWrite, 1, ""});
+  EXPECT_EQ(faults.OnReport(false, false, false), ELabFaultAction::ePass);
+  EXPECT_EQ(faults.OnReport(false, false, false), ELabFaultAction::ePass);
+  EXPECT_EQ(faults.OnReport(false, false, false), ELabFaultAction::eFail);
 
   faults.Add({ELabFaultKind::eVanish, 2, ""});
   faults.OnReport(true, false, false);

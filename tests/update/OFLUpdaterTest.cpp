@@ -1,8 +1,7 @@
 // The updater driver: arguments, set-up, the device and update threads, and
 // how status and progress reach the application.
-#include "update/UpdateDoubles.h"
-
 #include "scalar/DisplayUtils.h"
+#include "update/UpdateDoubles.h"
 
 namespace update_test {
 namespace {
@@ -100,6 +99,23 @@ TEST_F(Updater, SetupGivesUpWithoutADeviceAWatchOrAValueForTheLastOption) {
   EXPECT_EQ(
       mDelegate.mJournal.Get(),
       (Words{"dialog:Error: An option at the end of the arguments has no value.", "terminate:1"}));
+}
+
+TEST_F(Updater, SetupWaitsForTheDeviceWatchWithoutBoundAndGoesOnOnceItStands) {
+  AttachPen();
+  std::promise<void> watchReady;
+  mRegistry->mWatchReady = watchReady.get_future().share();
+  std::atomic<bool> setupDone{false};
+  std::atomic<bool> stillWaiting{false};
+  mClock->Schedule(3600.0, [&] {
+    stillWaiting = !setupDone;
+    watchReady.set_value();
+  });
+  const bool ready = Make({"prog", "-p", ""})->setupUpdate();
+  setupDone = true;
+  EXPECT_TRUE(stillWaiting) << "gave up within the hour";
+  EXPECT_TRUE(ready);
+  EXPECT_LT(mClock->Now(), 3600.0 + 2.0) << "went on waiting once the watch stood";
 }
 
 TEST_F(Updater, SetupParsesTheArgumentsOnceTheWatchStandsAndTheWatchFilters) {

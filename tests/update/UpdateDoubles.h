@@ -11,6 +11,7 @@
 #include <atomic>
 #include <filesystem>
 #include <fstream>
+#include <future>
 #include <map>
 #include <set>
 
@@ -153,10 +154,14 @@ class CFakeRegistry : public CDeviceRegistry {
  public:
   std::vector<SHidEntry> ListHidInterfaces(uint32_t) override { return mEntries; }
   std::vector<SUsbEntry> ListUsbDevices(uint32_t) override { return {}; }
-  bool OpenWatch() override { return mCanWatch; }
+  bool OpenWatch() override {
+    if (mWatchReady.valid()) mWatchReady.wait();
+    return mCanWatch;
+  }
   void RunWatch(CRegistryWatcher&) override {}
   void StopWatching() override {}
-  std::atomic<bool> mCanWatch{true};  // read by a device thread that may still run
+  std::atomic<bool> mCanWatch{true};     // read by a device thread that may still run
+  std::shared_future<void> mWatchReady;  // when set, the watch stands only once it is ready
   std::vector<SHidEntry> mEntries;
 };
 
