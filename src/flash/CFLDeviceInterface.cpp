@@ -12,6 +12,11 @@
 
 bool __DUMP_WRITE_COMMAND__ = true;
 
+namespace {
+// Asks before a loader counts as one without block checksums.
+constexpr int kChecksumSupportTries = 3;
+}  // namespace
+
 using FlashText::Dec;
 using FlashText::Hex;
 
@@ -244,8 +249,15 @@ bool CFLDeviceInterface::Init(const std::vector<SContinuousDataBlock>& data_I) {
   }
   ReportLog(description);
 
+  // A loader without checksums refuses the request every time; one failed
+  // read (the tunnel asks the loader's mode afresh for each command) must
+  // not pass for that, or programming would leave the old sums in place
+  // and report success over an image that will not start.
   FLASH_CHECKSUM_STRUC checksums;
-  mChecksumsSupported = FLProtGetChecksums(checksums);
+  mChecksumsSupported = false;
+  for (int attempt = 0; attempt < kChecksumSupportTries && !mChecksumsSupported; ++attempt) {
+    mChecksumsSupported = FLProtGetChecksums(checksums);
+  }
   ReportLog(std::string("Checksum Support: ") + (mChecksumsSupported ? "Yes" : "No"));
 
   if (!InitFlashVector()) {
