@@ -11,8 +11,8 @@
 #include <memory>
 #include <vector>
 
+#include "FuzzInstantClock.h"
 #include "common/CClock.h"
-#include "common/CVirtualClock.h"
 #include "flash/CFLProtocol.h"
 #include "flash/CI2CFLDeviceInterface.h"
 
@@ -54,7 +54,7 @@ class CFuzzedMaster : public CI2CFLDeviceInterface {
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data_I, size_t size_I) {
   static const bool clockSet = [] {
-    CClock::Set(std::make_shared<CVirtualClock>());
+    CClock::Set(std::make_shared<CInstantClock>());
     __DUMP_WRITE_COMMAND__ = false;
     return true;
   }();
