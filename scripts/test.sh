@@ -1,16 +1,18 @@
 #!/usr/bin/env bash
 # Sets everything up, builds the debug preset and runs every test, then the
 # same suite under ASan with UBSan and under TSan, then the bounded fuzzing.
-# Each stage reports its time.
+# Each stage reports its time; every stage runs even after one failed, so a
+# run shows all its failures, and the script fails if any stage did.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 
+failed=()
 stage() {
-  local name=$1 start=$SECONDS
+  local name=$1 start=$SECONDS status=ok
   shift
   echo "== $name"
-  "$@"
-  echo "== $name: $((SECONDS - start)) s"
+  "$@" || { status=FAILED; failed+=("$name"); }
+  echo "== $name: $status, $((SECONDS - start)) s"
 }
 
 suite() {
@@ -22,3 +24,8 @@ stage debug suite debug
 stage asan suite asan
 stage tsan suite tsan
 stage fuzz bash scripts/fuzz.sh
+
+if [ ${#failed[@]} -gt 0 ]; then
+  echo "== failed: ${failed[*]}"
+  exit 1
+fi
