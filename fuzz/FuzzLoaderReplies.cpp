@@ -9,8 +9,8 @@
 #include <memory>
 #include <vector>
 
+#include "FuzzInstantClock.h"
 #include "common/CClock.h"
-#include "common/CVirtualClock.h"
 #include "flash/CFLDeviceInterface.h"
 #include "flash/CFLProtocol.h"
 
@@ -55,7 +55,7 @@ class FuzzedLoader : public CFLDeviceInterface {
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data_I, size_t size_I) {
   static const bool clockSet = [] {
-    CClock::Set(std::make_shared<CVirtualClock>());
+    CClock::Set(std::make_shared<CInstantClock>());
     __DUMP_WRITE_COMMAND__ = false;
     return true;
   }();

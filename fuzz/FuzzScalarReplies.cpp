@@ -11,6 +11,7 @@
 #include <memory>
 #include <vector>
 
+#include "FuzzInstantClock.h"
 #include "common/CClock.h"
 #include "common/TavLog.h"
 #include "scalar/CI2CConnectorFTDI.h"
@@ -79,17 +80,6 @@ class CFuzzedBridge : public CFTDIExAPI32 {
   FuzzedDataProvider& mData;
   std::deque<uint8_t> mPending;
   uint64_t mSilentReads = 0;
-};
-
-// Time moves only by sleeps, on the caller's thread: nothing here schedules.
-class CInstantClock : public CClock {
- public:
-  void Sleep(double seconds_I) override { mNow += seconds_I; }
-  double Now() const override { return mNow; }
-  void Schedule(double, std::function<void()>) override { std::abort(); }
-
- private:
-  double mNow = 0;
 };
 
 // One of each family the readers tell apart.

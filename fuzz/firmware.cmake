@@ -9,3 +9,6 @@ tav_fuzz_target(fuzz_firmware_intel_hex SOURCES ${CMAKE_CURRENT_LIST_DIR}/FuzzFi
   DEPS tav_firmware)
 tav_fuzz_target(fuzz_firmware_binary SOURCES ${CMAKE_CURRENT_LIST_DIR}/FuzzFirmwareBinary.cpp
   DEPS tav_firmware)
+# The front-end: extension and link pick the reader, as in a run.
+tav_fuzz_target(fuzz_firmware_front_end SOURCES ${CMAKE_CURRENT_LIST_DIR}/FuzzFirmwareFrontEnd.cpp
+  DEPS tav_firmware)

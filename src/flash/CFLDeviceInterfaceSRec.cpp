@@ -93,22 +93,22 @@ bool CFLDeviceInterface::LoadSRecData(const std::vector<SContinuousDataBlock>& d
       TAVASSERT_TEXT("flash block word size > 0");
       return false;
     }
-    bool found = false;
-    for (uint32_t offset = 0; offset < block.GetSize(); offset += word) {
-      if (block.IsWordWritten(offset)) {
-        block.SetWriteStartOffset(offset);
-        block.SetWriteSize(word);
-        found = true;
-        break;
-      }
-    }
-    if (found && block.GetSize() >= word) {
-      const uint32_t start = block.GetWriteStartOffset();
-      for (uint32_t offset = block.GetSize() - word; offset > start; offset -= word) {
-        if (block.IsWordWritten(offset)) {
-          block.SetWriteSize(offset - start + word);
-          break;
-        }
+    // One pass over the bytes from each end rather than a call a word: a
+    // loader may describe blocks of 16 MiB.
+    const std::vector<uint8_t>& bytes = block.BlockData();
+    const auto written = [](uint8_t byte_I) { return byte_I < 0xFF; };
+    const auto first = std::find_if(bytes.begin(), bytes.end(), written);
+    if (first != bytes.end()) {
+      const uint32_t start = static_cast<uint32_t>(first - bytes.begin()) / word * word;
+      block.SetWriteStartOffset(start);
+      block.SetWriteSize(word);
+      if (block.GetSize() >= word) {
+        // The last written word on the grid that counts down from the end.
+        const int64_t last =
+            std::find_if(bytes.rbegin(), bytes.rend(), written).base() - bytes.begin() - 1;
+        const int64_t top = int64_t{block.GetSize()} - word;
+        const int64_t offset = last >= top ? top : top - (top - last + word - 1) / word * word;
+        if (offset > start) block.SetWriteSize(static_cast<uint32_t>(offset - start + word));
       }
     }
     mFlash.AddToTotalSize(block.GetWriteSize());

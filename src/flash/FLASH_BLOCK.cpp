@@ -23,11 +23,3 @@ void FLASH_BLOCK::CopyIn(uint32_t offset_I, const uint8_t* data_I, uint32_t coun
   if (count_I == 0) return;
   std::memcpy(mBlockData.data() + offset_I, data_I, count_I);
 }
-
-bool FLASH_BLOCK::IsWordWritten(uint32_t offset_I) const {
-  const size_t end = std::min<size_t>(mBlockData.size(), size_t{offset_I} + mWriteWordSize);
-  for (size_t i = offset_I; i < end; ++i) {
-    if (mBlockData[i] < 0xFF) return true;
-  }
-  return false;
-}

@@ -35,9 +35,6 @@ class FLASH_BLOCK {
   // already hold the block's size and the range must lie inside it.
   void CopyIn(uint32_t offset_I, const uint8_t* data_I, uint32_t count_I);
 
-  // True when a word of the image at `offset_I` holds a byte below 0xFF.
-  bool IsWordWritten(uint32_t offset_I) const;
-
  private:
   uint32_t mStartAddr = 0;
   uint32_t mSize = 0;

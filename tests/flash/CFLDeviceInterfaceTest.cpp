@@ -273,4 +273,24 @@ TEST_F(DeviceInterfaceBase, ABrokenDescriptorIsRefused) {
   EXPECT_FALSE(mDevice.LoadSRecData({Filled(0x1000, 8, 1)})) << "a word size of 0";
 }
 
+TEST_F(DeviceInterfaceBase, OnlyTheWordsFromTheFirstToTheLastWrittenAreSent) {
+  const struct {
+    uint32_t blockSize, wordSize, at, bytes, start, size;
+  } cases[] = {
+      {0x400, 4, 5, 6, 4, 8},                    // both edges inside a word
+      {0x400, 4, 0x3FF, 1, 0x3FC, 4},            // the last byte alone
+      {0x400, 2, 0, 0x400, 0, 0x400},            // the whole block
+      {0x402, 4, 0, 1, 0, 4},                    // a tail shorter than a word
+      {16u << 20, 1, 0xFFFFF0, 2, 0xFFFFF0, 2},  // the largest block a loader may describe
+  };
+  for (const auto& c : cases) {
+    mDevice.SetLayout(0x1000, c.blockSize, 1, c.wordSize, 0x100);
+    ASSERT_TRUE(mDevice.InitFlashVector());
+    ASSERT_TRUE(mDevice.LoadSRecData({Filled(0x1000 + c.at, c.bytes, 0x5A)}));
+    const Flash flash = mDevice.GetFlash();
+    EXPECT_EQ(flash.GetBlock(0).GetWriteStartOffset(), c.start) << c.at;
+    EXPECT_EQ(flash.GetBlock(0).GetWriteSize(), c.size) << c.at;
+  }
+}
+
 }  // namespace

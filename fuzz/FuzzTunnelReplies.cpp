@@ -1,0 +1,76 @@
+// A USB master whose every report comes from the fuzzer, in front of the
+// I2C tunnel: the mode report, the write status and the read reply. Mode
+// switches, Init and the S-record procedure must survive any master (ASan
+// and UBSan watch: a reply's length field must never carry a copy past the
+// caller's report) and end once the master falls silent; only a master that
+// keeps answering busy may hold the tunnel, and that takes input to say.
+#include <fuzzer/FuzzedDataProvider.h>
+
+#include <cstdint>
+#include <cstdlib>
+#include <memory>
+#include <vector>
+
+#include "FuzzInstantClock.h"
+#include "common/CClock.h"
+#include "flash/CFLProtocol.h"
+#include "flash/CI2CFLDeviceInterface.h"
+
+namespace {
+
+class CFuzzedMaster : public CI2CFLDeviceInterface {
+ public:
+  explicit CFuzzedMaster(FuzzedDataProvider& data_I) : mData(data_I) {}
+  bool Open() override {
+    mIsOpen = true;
+    return true;
+  }
+  void Close() override { mIsOpen = false; }
+
+  bool WriteMaster(std::vector<uint8_t>& report_IO) override {
+    Count();
+    return mData.remaining_bytes() > 0 && mData.ConsumeBool();
+  }
+  // A silent master answers no more: every loop over it must end.
+  bool ReadMaster(std::vector<uint8_t>& report_IO) override {
+    Count();
+    if (mData.remaining_bytes() == 0 || !mData.ConsumeBool()) return false;
+    const std::vector<uint8_t> reply = mData.ConsumeBytes<uint8_t>(report_IO.size());
+    std::copy(reply.begin(), reply.end(), report_IO.begin());
+    return true;
+  }
+
+ private:
+  void Count() {
+    if (++mReports > kReportBudget) std::abort();  // a loop that never ends
+  }
+  // Every retry of every command of a 1024-block loader stays far below.
+  static constexpr uint64_t kReportBudget = 50'000'000;
+  FuzzedDataProvider& mData;
+  uint64_t mReports = 0;
+};
+
+}  // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data_I, size_t size_I) {
+  static const bool clockSet = [] {
+    CClock::Set(std::make_shared<CInstantClock>());
+    __DUMP_WRITE_COMMAND__ = false;
+    return true;
+  }();
+  (void)clockSet;
+  FuzzedDataProvider data(data_I, size_I);
+  CFLProtocol::GetInstance()->SetProtocolType(data.ConsumeBool() ? EFL_PROTOCOL_NON_BL
+                                                                 : EFL_PROTOCOL_LOADER);
+  CFuzzedMaster master(data);
+  master.SetDataSourceFormat(static_cast<EDataSourceFormat>(data.ConsumeIntegralInRange(0, 2)));
+  std::vector<SContinuousDataBlock> image(1);
+  image[0].startAddress = data.ConsumeIntegral<uint32_t>();
+  image[0].data.assign(data.ConsumeIntegralInRange<size_t>(0, 2000), 0x5A);
+  if (!master.SwitchToBLMode()) return 0;
+  master.Open();
+  if (master.Init(image)) master.ProgramBoard();
+  master.IsAlive();
+  master.SwitchFromBLMode(false);
+  return 0;
+}
