@@ -396,6 +396,10 @@ void OFLUpdater::runThreadProgram() {
   }
   mResults.Reset(mDeviceUpdates);
   for (size_t index = 0; index < mDeviceUpdates.size(); ++index) {
+    // An end the user asked for while the last board was in its loader
+    // waits on the main thread; it runs there before the next board starts.
+    if (index > 0 && mDelegate != nullptr) OSUtils::DispatchOnMainThread([] {});
+    if (mStopping) break;
     const std::string& kind = mDeviceUpdates[index].first;
     const std::string& value = mDeviceUpdates[index].second;
     mResults.Begin(index);

@@ -97,12 +97,18 @@ TEST_F(LinuxDesktop, LaunchedApplicationRunsDetachedIsNamedAndQuitsOnRequest) {
   EXPECT_EQ(mDesktop.RunningApplications("com.tavik.TestDriver"), std::vector<int>{pid});
 
   const fs::path proc = "/proc/" + std::to_string(pid);
+  const std::vector<std::string> standard{"0:/dev/null", "1:/dev/null", "2:/dev/null"};
   std::vector<std::string> descriptors;
-  for (const auto& fd : fs::directory_iterator(proc / "fd")) {
-    descriptors.push_back(fd.path().filename().string() + ":" + ReadLink(fd.path()));
-  }
-  std::sort(descriptors.begin(), descriptors.end());
-  EXPECT_EQ(descriptors, (std::vector<std::string>{"0:/dev/null", "1:/dev/null", "2:/dev/null"}));
+  // The dynamic loader holds the libraries open for a moment after exec.
+  WaitFor([&] {
+    descriptors.clear();
+    for (const auto& fd : fs::directory_iterator(proc / "fd")) {
+      descriptors.push_back(fd.path().filename().string() + ":" + ReadLink(fd.path()));
+    }
+    std::sort(descriptors.begin(), descriptors.end());
+    return descriptors == standard;
+  });
+  EXPECT_EQ(descriptors, standard);
   EXPECT_NE(getsid(pid), getsid(0));
   std::ifstream cmdline(proc / "cmdline");
   std::string arguments((std::istreambuf_iterator<char>(cmdline)),
