@@ -115,7 +115,9 @@ TEST_F(Updater, SetupWaitsForTheDeviceWatchWithoutBoundAndGoesOnOnceItStands) {
   setupDone = true;
   EXPECT_TRUE(stillWaiting) << "gave up within the hour";
   EXPECT_TRUE(ready);
-  EXPECT_LT(mClock->Now(), 3600.0 + 2.0) << "went on waiting once the watch stood";
+  // The watch thread takes real time to stand while the virtual passes
+  // cost none, so a slow machine (a sanitizer build) sees a few of them.
+  EXPECT_LT(mClock->Now(), 3600.0 + 60.0) << "went on waiting once the watch stood";
 }
 
 TEST_F(Updater, SetupParsesTheArgumentsOnceTheWatchStandsAndTheWatchFilters) {
