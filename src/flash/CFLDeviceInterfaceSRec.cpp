@@ -89,8 +89,8 @@ bool CFLDeviceInterface::LoadSRecData(const std::vector<SContinuousDataBlock>& d
     FLASH_BLOCK& block = mFlash.GetBlock(i);
     if (block.IsEmpty()) continue;
     const uint32_t word = block.GetWriteWordSize();
-    if (word == 0) {
-      TAVASSERT_TEXT("flash block word size > 0");
+    if (word == 0 || word > block.GetSize()) {
+      TAVASSERT_TEXT("flash block word size > 0 and within the block");
       return false;
     }
     // One pass over the bytes from each end rather than a call a word: a
@@ -99,7 +99,11 @@ bool CFLDeviceInterface::LoadSRecData(const std::vector<SContinuousDataBlock>& d
     const auto written = [](uint8_t byte_I) { return byte_I < 0xFF; };
     const auto first = std::find_if(bytes.begin(), bytes.end(), written);
     if (first != bytes.end()) {
-      const uint32_t start = static_cast<uint32_t>(first - bytes.begin()) / word * word;
+      uint32_t start = static_cast<uint32_t>(first - bytes.begin()) / word * word;
+      // A block that is not a whole number of words ends in a short tail;
+      // data there is sent as the last whole word, on the grid that counts
+      // down from the end, never past the image.
+      if (start > block.GetSize() - word) start = block.GetSize() - word;
       block.SetWriteStartOffset(start);
       block.SetWriteSize(word);
       if (block.GetSize() >= word) {

@@ -271,6 +271,9 @@ TEST_F(DeviceInterfaceBase, ABrokenDescriptorIsRefused) {
   mDevice.SetLayout(0x1000, 0x400, 2, 0, 0x100);
   ASSERT_TRUE(mDevice.InitFlashVector());
   EXPECT_FALSE(mDevice.LoadSRecData({Filled(0x1000, 8, 1)})) << "a word size of 0";
+  mDevice.SetLayout(0x1000, 2, 1, 4, 0x100);
+  ASSERT_TRUE(mDevice.InitFlashVector());
+  EXPECT_FALSE(mDevice.LoadSRecData({Filled(0x1000, 1, 1)})) << "a word larger than its block";
 }
 
 TEST_F(DeviceInterfaceBase, OnlyTheWordsFromTheFirstToTheLastWrittenAreSent) {
@@ -281,6 +284,7 @@ TEST_F(DeviceInterfaceBase, OnlyTheWordsFromTheFirstToTheLastWrittenAreSent) {
       {0x400, 4, 0x3FF, 1, 0x3FC, 4},            // the last byte alone
       {0x400, 2, 0, 0x400, 0, 0x400},            // the whole block
       {0x402, 4, 0, 1, 0, 4},                    // a tail shorter than a word
+      {0x402, 4, 0x401, 1, 0x3FE, 4},            // data only in that tail
       {16u << 20, 1, 0xFFFFF0, 2, 0xFFFFF0, 2},  // the largest block a loader may describe
   };
   for (const auto& c : cases) {
