@@ -46,6 +46,19 @@ bool IsSpace(char character_I) {
   return std::isspace(static_cast<unsigned char>(character_I)) != 0;
 }
 
+// Stray characters between tokens are stepped over; a garbage file has
+// thousands of them, so a document reports only its first.
+bool& StrayReported() {
+  thread_local bool reported = false;
+  return reported;
+}
+
+void ReportStray(const char* text_I) {
+  if (StrayReported()) return;
+  StrayReported() = true;
+  TAVASSERT_TEXT(text_I);
+}
+
 bool IsContainer(const CSettingsObject& object_I) {
   const std::string type = object_I.GetTypeName();
   return type == CSettingsMap::GetClassTypeName() || type == CSettingsArray::GetClassTypeName();
@@ -262,6 +275,7 @@ std::shared_ptr<CSettingsObject> CSettingsObject::ReadFromJSONFile(const std::st
 
 std::shared_ptr<CSettingsObject> CSettingsObject::ReadFromJSONBuffer(const std::string& buffer_I) {
   CSettingsDepthGuard::Reset();
+  StrayReported() = false;
   size_t pos = 0;
   for (;;) {
     SkipComments(buffer_I, pos);
@@ -269,7 +283,7 @@ std::shared_ptr<CSettingsObject> CSettingsObject::ReadFromJSONBuffer(const std::
     const char c = buffer_I[pos];
     if (c == '[') return CSettingsArray::ReadFromJSONNode(buffer_I, pos);
     if (c == '{') return CSettingsMap::ReadFromJSONNode(buffer_I, pos);
-    if (!IsSpace(c)) TAVASSERT_TEXT("isspace((int)buffer_I[pos])");
+    if (!IsSpace(c)) ReportStray("isspace((int)buffer_I[pos])");
     ++pos;
   }
 }
@@ -314,7 +328,7 @@ std::shared_ptr<CSettingsObject> CSettingsObject::ReadFromJSONNode(const std::st
       if (fractional) return CSettingsDouble::ReadFromJSONNode(buffer_I, position_IO);
       return CSettingsInteger::ReadFromJSONNode(buffer_I, position_IO);
     }
-    if (!IsSpace(c)) TAVASSERT_TEXT("isspace((int)buffer_I[pos_IO])");
+    if (!IsSpace(c)) ReportStray("isspace((int)buffer_I[pos_IO])");
     ++position_IO;
   }
 }

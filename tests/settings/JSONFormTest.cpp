@@ -80,6 +80,15 @@ TEST(JSONReadTest, UnusableDocumentsGiveEmptyResults) {
                           R"({"s": "\u12G4"})", R"({"s": "no end})"}) {
     EXPECT_EQ(CSettingsObject::ReadFromJSONBuffer(bad), nullptr) << bad;
   }
+  // A garbage file is one report, not one per stray character; the next
+  // document reports its own.
+  const size_t before = capture.Assertions().size();
+  EXPECT_EQ(CSettingsObject::ReadFromJSONBuffer(std::string(5000, '#') + "[1, %%%% 2]")
+                ->GetTraceString(),
+            "array[0:integer[1], 0:integer[2]]");
+  EXPECT_EQ(capture.Assertions().size(), before + 1);
+  CSettingsObject::ReadFromJSONBuffer("# [1]");
+  EXPECT_EQ(capture.Assertions().size(), before + 2);
 }
 
 TEST(JSONWriteTest, WriterIndentsWithTabsAndDoesNotEscape) {
