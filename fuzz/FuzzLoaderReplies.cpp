@@ -5,11 +5,11 @@
 #include <fuzzer/FuzzedDataProvider.h>
 
 #include <cstdint>
-#include <cstdlib>
 #include <memory>
 #include <vector>
 
 #include "FuzzInstantClock.h"
+#include "FuzzedReplies.h"
 #include "common/CClock.h"
 #include "flash/CFLDeviceInterface.h"
 #include "flash/CFLProtocol.h"
@@ -18,7 +18,7 @@ namespace {
 
 class FuzzedLoader : public CFLDeviceInterface {
  public:
-  explicit FuzzedLoader(FuzzedDataProvider& data_I) : mData(data_I) {
+  explicit FuzzedLoader(FuzzedDataProvider& data_I) : mReplies(data_I, true) {
     mIsOpen = true;
     mIsFlashLoader = true;
   }
@@ -31,24 +31,12 @@ class FuzzedLoader : public CFLDeviceInterface {
   bool IsAlive() override { return true; }
   bool InitEEPROM() override { return false; }
 
-  bool Write(std::vector<uint8_t>& report_IO) override {
-    if (++mReports > kReportBudget) std::abort();  // a loop that never ends
-    return mData.remaining_bytes() == 0 || mData.ConsumeBool();
-  }
-  bool Read(std::vector<uint8_t>& report_IO) override {
-    if (++mReports > kReportBudget) std::abort();
-    if (mData.remaining_bytes() == 0) return true;
-    if (!mData.ConsumeBool()) return false;
-    const std::vector<uint8_t> reply = mData.ConsumeBytes<uint8_t>(report_IO.size());
-    std::copy(reply.begin(), reply.end(), report_IO.begin());
-    return true;
-  }
+  // A loader that falls silent has taken every report.
+  bool Write(std::vector<uint8_t>&) override { return mReplies.Write(); }
+  bool Read(std::vector<uint8_t>& report_IO) override { return mReplies.Read(report_IO); }
 
  private:
-  // Every retry of every command of a 1024-block loader stays far below.
-  static constexpr uint64_t kReportBudget = 50'000'000;
-  FuzzedDataProvider& mData;
-  uint64_t mReports = 0;
+  CFuzzedReplies mReplies;
 };
 
 }  // namespace

@@ -7,11 +7,11 @@
 #include <fuzzer/FuzzedDataProvider.h>
 
 #include <cstdint>
-#include <cstdlib>
 #include <memory>
 #include <vector>
 
 #include "FuzzInstantClock.h"
+#include "FuzzedReplies.h"
 #include "common/CClock.h"
 #include "flash/CFLProtocol.h"
 #include "flash/CI2CFLDeviceInterface.h"
@@ -20,34 +20,19 @@ namespace {
 
 class CFuzzedMaster : public CI2CFLDeviceInterface {
  public:
-  explicit CFuzzedMaster(FuzzedDataProvider& data_I) : mData(data_I) {}
+  explicit CFuzzedMaster(FuzzedDataProvider& data_I) : mReplies(data_I, false) {}
   bool Open() override {
     mIsOpen = true;
     return true;
   }
   void Close() override { mIsOpen = false; }
 
-  bool WriteMaster(std::vector<uint8_t>& report_IO) override {
-    Count();
-    return mData.remaining_bytes() > 0 && mData.ConsumeBool();
-  }
   // A silent master answers no more: every loop over it must end.
-  bool ReadMaster(std::vector<uint8_t>& report_IO) override {
-    Count();
-    if (mData.remaining_bytes() == 0 || !mData.ConsumeBool()) return false;
-    const std::vector<uint8_t> reply = mData.ConsumeBytes<uint8_t>(report_IO.size());
-    std::copy(reply.begin(), reply.end(), report_IO.begin());
-    return true;
-  }
+  bool WriteMaster(std::vector<uint8_t>&) override { return mReplies.Write(); }
+  bool ReadMaster(std::vector<uint8_t>& report_IO) override { return mReplies.Read(report_IO); }
 
  private:
-  void Count() {
-    if (++mReports > kReportBudget) std::abort();  // a loop that never ends
-  }
-  // Every retry of every command of a 1024-block loader stays far below.
-  static constexpr uint64_t kReportBudget = 50'000'000;
-  FuzzedDataProvider& mData;
-  uint64_t mReports = 0;
+  CFuzzedReplies mReplies;
 };
 
 }  // namespace

@@ -1,0 +1,43 @@
+#pragma once
+// A device whose every answer comes from the fuzzer, shared by the targets
+// that put a procedure in front of one. Whether a report goes through and
+// what a reply holds are input; a silent device (input used up) accepts
+// writes as `silentAccepts_I` says and gives no replies it has not been
+// given. A loop that never ends aborts after far more reports than every
+// retry of every command of a 1024-block loader.
+#include <fuzzer/FuzzedDataProvider.h>
+
+#include <algorithm>
+#include <cstdint>
+#include <cstdlib>
+#include <vector>
+
+class CFuzzedReplies {
+ public:
+  CFuzzedReplies(FuzzedDataProvider& data_I, bool silentAccepts_I)
+      : mData(data_I), mSilentAccepts(silentAccepts_I) {}
+
+  bool Write() {
+    Count();
+    return mData.remaining_bytes() == 0 ? mSilentAccepts : mData.ConsumeBool();
+  }
+  // Fills as much of the report as input remains for; the rest keeps what
+  // the caller put there.
+  bool Read(std::vector<uint8_t>& report_IO) {
+    Count();
+    if (mData.remaining_bytes() == 0) return mSilentAccepts;
+    if (!mData.ConsumeBool()) return false;
+    const std::vector<uint8_t> reply = mData.ConsumeBytes<uint8_t>(report_IO.size());
+    std::copy(reply.begin(), reply.end(), report_IO.begin());
+    return true;
+  }
+
+ private:
+  void Count() {
+    if (++mReports > kReportBudget) std::abort();
+  }
+  static constexpr uint64_t kReportBudget = 50'000'000;
+  FuzzedDataProvider& mData;
+  bool mSilentAccepts;
+  uint64_t mReports = 0;
+};
