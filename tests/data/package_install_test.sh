@@ -14,7 +14,7 @@ for tool in cpack debootstrap chroot; do
 done
 
 work=$(mktemp -d)
-trap 'rm -rf "$work"' EXIT
+trap 'umount "$work/root/proc" 2> /dev/null || true; rm -rf --one-file-system "$work"' EXIT
 (cd "$build" && cpack --config CPackConfig.cmake -G DEB -B "$work/cpack" > /dev/null)
 deb=$(ls "$work"/cpack/tavik-fwupdater_*.deb)
 
@@ -24,6 +24,8 @@ debootstrap --variant=minbase bookworm "$root" > "$work/debootstrap.log" 2>&1 ||
   { tail -20 "$work/debootstrap.log"; exit 1; }
 echo "debootstrap: $((SECONDS - start)) s"
 cp "$deb" "$root/tmp/"
+# The program finds its data through /proc/self/exe, as on a running system.
+mount -t proc proc "$root/proc"
 start=$SECONDS
 chroot "$root" env DEBIAN_FRONTEND=noninteractive \
   apt-get install -y --no-install-recommends "/tmp/$(basename "$deb")" > "$work/apt.log" 2>&1 ||
