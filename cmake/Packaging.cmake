@@ -34,9 +34,10 @@ set(CPACK_DEBIAN_PACKAGE_CONTROL_STRICT_PERMISSION ON)
 
 # Debian wants the changelog of a native package compressed, reproducibly.
 find_program(GZIP gzip REQUIRED)
+configure_file(${CMAKE_CURRENT_LIST_DIR}/debian/changelog.in ${tav_debian}/changelog @ONLY)
 add_custom_command(OUTPUT ${tav_debian}/changelog.gz
-  COMMAND ${GZIP} -9nc ${CMAKE_CURRENT_LIST_DIR}/debian/changelog > ${tav_debian}/changelog.gz
-  DEPENDS ${CMAKE_CURRENT_LIST_DIR}/debian/changelog
+  COMMAND ${GZIP} -9nc ${tav_debian}/changelog > ${tav_debian}/changelog.gz
+  DEPENDS ${tav_debian}/changelog
   VERBATIM)
 add_custom_target(tav_debian_changelog ALL DEPENDS ${tav_debian}/changelog.gz)
 install(FILES ${tav_debian}/changelog.gz DESTINATION ${CMAKE_INSTALL_DOCDIR})
