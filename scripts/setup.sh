@@ -14,6 +14,7 @@ PACKAGES=(
   srecord binutils python3 dbus-daemon
   openssl
   qemu-system-x86 busybox-static
+  udev lintian desktop-file-utils appstream debootstrap
 )
 
 missing=()

@@ -5,12 +5,17 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <filesystem>
+#include <system_error>
 #include <vector>
 
 #include "common/TavLog.h"
 
 #ifndef TAV_INSTALLED_DATA_FOLDER
 #error "the build defines TAV_INSTALLED_DATA_FOLDER from the install prefix"
+#endif
+#ifndef TAV_DATA_FOLDER_FROM_BINDIR
+#error "the build defines TAV_DATA_FOLDER_FROM_BINDIR from the install layout"
 #endif
 
 namespace LinuxPaths {
@@ -74,7 +79,18 @@ std::string GetUserPreferencesFolderPath() { return GetConfigFolderPath(); }
 
 std::string GetStateFolderPath() { return XDGFolder("XDG_STATE_HOME", ".local/state"); }
 
-std::string GetInstalledDataFolderPath() { return TAV_INSTALLED_DATA_FOLDER; }
+std::string GetInstalledDataFolderPath() {
+  return FindInstalledDataFolder(GetExecutableFolderPath());
+}
+
+std::string FindInstalledDataFolder(const std::string& executableFolder_I) {
+  if (executableFolder_I.empty()) return TAV_INSTALLED_DATA_FOLDER;
+  const std::filesystem::path beside =
+      (std::filesystem::path(executableFolder_I) / TAV_DATA_FOLDER_FROM_BINDIR).lexically_normal();
+  std::error_code error;
+  if (!std::filesystem::is_directory(beside, error)) return TAV_INSTALLED_DATA_FOLDER;
+  return WithoutTrailingSlashes(beside.string());
+}
 
 std::string GetExecutableFolderPath() {
   char target[PATH_MAX];

@@ -20,9 +20,13 @@ std::string GetConfigFolderPath();
 std::string GetUserPreferencesFolderPath();
 // $XDG_STATE_HOME/tavik, default ~/.local/state/tavik. Holds log files.
 std::string GetStateFolderPath();
-// The data folder of the installed program, <prefix>/share/tavik-fwupdater,
-// fixed at build time.
+// The data folder of the installed program: <prefix>/share/tavik-fwupdater
+// reached from the executable's folder (<prefix>/bin) when that folder
+// exists, else the one fixed at build time.
 std::string GetInstalledDataFolderPath();
+// The same search from a given executable folder; an empty one gives the
+// folder fixed at build time.
+std::string FindInstalledDataFolder(const std::string& executableFolder_I);
 // The folder of the running executable, from /proc/self/exe.
 std::string GetExecutableFolderPath();
 

@@ -4,6 +4,7 @@
 
 #include <array>
 #include <cstdlib>
+#include <filesystem>
 #include <map>
 #include <optional>
 
@@ -64,6 +65,22 @@ TEST(LinuxPaths, ProgramFolders) {
   EXPECT_EQ(executableFolder.front(), '/');
   EXPECT_EQ(access(AppendPathComponent(executableFolder, "tests_common").c_str(), X_OK), 0)
       << executableFolder;
+}
+
+// An installed tree unpacked under another root finds its own data; a
+// program with no data folder beside it falls back to the fixed one.
+TEST(LinuxPaths, InstalledDataFolderFollowsTheExecutable) {
+  namespace fs = std::filesystem;
+  const fs::path root = fs::path(testing::TempDir()) / ("tav-prefix-" + std::to_string(getpid()));
+  fs::create_directories(root / "usr/bin");
+  const std::string fixed = FindInstalledDataFolder("");
+  EXPECT_EQ(FindInstalledDataFolder((root / "usr/bin").string()), fixed);
+  fs::create_directories(root / "usr/share/tavik-fwupdater");
+  EXPECT_EQ(FindInstalledDataFolder((root / "usr/bin").string()),
+            (root / "usr/share/tavik-fwupdater").string());
+  EXPECT_EQ(FindInstalledDataFolder((root / "usr/bin/").string()),
+            (root / "usr/share/tavik-fwupdater").string());
+  fs::remove_all(root);
 }
 
 TEST(LinuxPaths, ComponentAndExtensionOperations) {
