@@ -4,7 +4,7 @@
 // is reached, its version and the firmware file the configuration names
 // for it. Nothing is sent to a device.
 //
-// Exit status: 0 with at least one product, 2 with none, 1 for a wrong
+// Exit status: 0 with at least one product, 2 with none, 64 for a wrong
 // lab product name.
 
 #include <cstdint>
