@@ -73,7 +73,8 @@ std::optional<uint16_t> ReleaseIn(const CSRec& source_I) {
 std::optional<std::string> CAllBoards::FileRelease(const std::string& path_I,
                                                    EINTERFACE_TYPE interface_I) {
   CSRec source;
-  if (FirmwareFileCheck::KeepsReaderAway(path_I, interface_I) || !source.Load(path_I, interface_I)) {
+  if (FirmwareFileCheck::KeepsReaderAway(path_I, interface_I) ||
+      !source.Load(path_I, interface_I)) {
     return std::nullopt;
   }
   const std::optional<uint16_t> release = ReleaseIn(source);

@@ -166,7 +166,8 @@ bool CCommandLine::Take(const std::string& name_I, const std::string& value_I, b
     mLabFast = true;
   } else if (name_I == "--lab-fault") {
     std::string error;
-    if (!CLabOptions().AddFault(value_I, error)) return Fail("--lab-fault " + value_I + ": " + error);
+    if (!CLabOptions().AddFault(value_I, error))
+      return Fail("--lab-fault " + value_I + ": " + error);
     mLabFaults.push_back(value_I);
   } else if (name_I == "--lab-state") {
     if (value_I.empty()) return Fail("--lab-state needs a folder");
@@ -204,10 +205,10 @@ bool CCommandLine::CheckCombinations() {
   }
   if (mList && !mInspectFile.empty()) return Fail("--list and --inspect do not go together");
   if ((mList || !mInspectFile.empty()) && (HasBoardOption() || mAll)) {
-    return Fail(
-        "-p, -t, -b, -s and --all update boards; they do not go with --list or --inspect");
+    return Fail("-p, -t, -b, -s and --all update boards; they do not go with --list or --inspect");
   }
-  if (mAll && HasBoardOption()) return Fail("--all updates every board; give it without -p, -t, -b or -s");
+  if (mAll && HasBoardOption())
+    return Fail("--all updates every board; give it without -p, -t, -b or -s");
   return true;
 }
 

@@ -179,9 +179,9 @@ int CUpdateCommand::Run() {
   options.window = window;
   if (reportOut != nullptr) {
     options.runEnded = [reportOut, &report](int status_I, const std::string& lastLine_I) {
-      std::fputs(report.ToJson(OFLUpdater::updater()->boardResults().Get(), status_I, lastLine_I)
-                     .c_str(),
-                 reportOut);
+      std::fputs(
+          report.ToJson(OFLUpdater::updater()->boardResults().Get(), status_I, lastLine_I).c_str(),
+          reportOut);
       std::fflush(reportOut);
     };
   }
@@ -223,6 +223,7 @@ int CUpdateCommand::PlanAll(const std::string& labStateFolder_I, CUpdateReport& 
                                  ? "Result: every board is already at its firmware file's version."
                                  : "Result: no supported tablet is connected.";
   std::printf("%s\n", result.c_str());
-  if (reportOut_I != nullptr) std::fputs(report_IO.ToJson({}, outcome, result).c_str(), reportOut_I);
+  if (reportOut_I != nullptr)
+    std::fputs(report_IO.ToJson({}, outcome, result).c_str(), reportOut_I);
   return outcome;
 }

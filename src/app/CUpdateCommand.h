@@ -27,8 +27,8 @@ class CUpdateCommand {
   // --all: adds the board options of every board to update to
   // `arguments_IO` and returns -1, or, when none is left, says so, reports
   // and returns the status to end with.
-  int PlanAll(const std::string& labStateFolder_I, CUpdateReport& report_IO,
-              std::FILE* reportOut_I, std::vector<std::string>& arguments_IO) const;
+  int PlanAll(const std::string& labStateFolder_I, CUpdateReport& report_IO, std::FILE* reportOut_I,
+              std::vector<std::string>& arguments_IO) const;
 
   const CCommandLine& mCommandLine;
   std::string mProgramPath;

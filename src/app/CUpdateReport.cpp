@@ -73,11 +73,11 @@ std::string CUpdateReport::BoardJson(const SBoardResult& board_I, bool skipped_I
   const auto checksum = [&](uint32_t sum_I) {
     return board_I.checksumsKnown ? std::to_string(sum_I) : std::string("null");
   };
-  const std::string error =
-      board_I.errorCode == EERROR_NONE
-          ? "null"
-          : "{\"code\":" + std::to_string(board_I.errorCode) + ",\"name\":\"" +
-                ErrorName(board_I.errorCode) + "\",\"text\":" + JsonString(board_I.errorText) + "}";
+  const std::string error = board_I.errorCode == EERROR_NONE
+                                ? "null"
+                                : "{\"code\":" + std::to_string(board_I.errorCode) +
+                                      ",\"name\":\"" + ErrorName(board_I.errorCode) +
+                                      "\",\"text\":" + JsonString(board_I.errorText) + "}";
   return "{\"kind\":" + JsonString(board_I.kind) + ",\"product\":" + TextOrNull(board_I.product) +
          ",\"path\":" + TextOrNull(board_I.path) + ",\"file\":" + TextOrNull(board_I.file) +
          ",\"versionBefore\":" + TextOrNull(board_I.versionBefore) +
@@ -107,8 +107,10 @@ std::string CUpdateReport::ToJson(const std::vector<SBoardResult>& boards_I, int
     }
   }
   std::string boards;
-  for (const SBoardResult& board : boards_I) boards += (boards.empty() ? "" : ",") + BoardJson(board, false);
-  for (const SBoardResult& board : mSkipped) boards += (boards.empty() ? "" : ",") + BoardJson(board, true);
+  for (const SBoardResult& board : boards_I)
+    boards += (boards.empty() ? "" : ",") + BoardJson(board, false);
+  for (const SBoardResult& board : mSkipped)
+    boards += (boards.empty() ? "" : ",") + BoardJson(board, true);
 
   const double seconds =
       std::chrono::duration<double>(std::chrono::steady_clock::now() - mStart).count();
@@ -118,8 +120,8 @@ std::string CUpdateReport::ToJson(const std::vector<SBoardResult>& boards_I, int
          TAV_PROGRAM_VERSION + "\",\"started\":\"" + Utc(mStartTime) +
          "\",\"durationSeconds\":" + duration + ",\"product\":" + product + ",\"boards\":[" +
          boards + "],\"outcome\":{\"status\":" + std::to_string(status_I) +
-         ",\"text\":" + JsonString(text_I) + ",\"errorCode\":" +
-         (firstError ? std::to_string(firstError->errorCode) : "null") +
+         ",\"text\":" + JsonString(text_I) +
+         ",\"errorCode\":" + (firstError ? std::to_string(firstError->errorCode) : "null") +
          ",\"errorText\":" + (firstError ? JsonString(firstError->errorText) : "null") +
          "},\"exitStatus\":" + std::to_string(status_I) + "}\n";
 }

@@ -32,7 +32,7 @@ struct SBoardResult {
   std::string versionBefore;  // as the user reads it; empty when unknown
   std::string versionAfter;
   EBoardOutcome outcome = EBOARD_NOT_REACHED;
-  std::string reason;  // why it was not updated
+  std::string reason;     // why it was not updated
   uint32_t vendorId = 0;  // the selected product's pen identity
   uint32_t productId = 0;
   // Every state the controller passed through during this entry, in order.
