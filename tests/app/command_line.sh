@@ -35,6 +35,7 @@ refused 64 "not a display" -s "x:y"
 refused 64 "--headless takes no value" --headless=yes
 refused 64 "there is no lab product called nothing" --lab=nothing -p ""
 refused 64 "--lab list names" --lab list -p ""
+refused 64 "--lab list names" --lab list --all
 refused 64 "do not go with --list" --list -p ""
 refused 64 "do not go with --list" --list --all
 refused 64 "--all updates every board" --all -p ""
