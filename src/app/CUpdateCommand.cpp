@@ -106,6 +106,12 @@ int CUpdateCommand::Run() {
     dup2(STDERR_FILENO, STDOUT_FILENO);
   }
   CUpdateReport report;
+  // A run that cannot start still owes a script its report.
+  const auto endBeforeRun = [&report, reportOut](int status_I, const std::string& text_I) {
+    std::fprintf(stderr, "%s: %s\n", TAV_PROGRAM_NAME, text_I.c_str());
+    if (reportOut != nullptr) std::fputs(report.ToJson({}, status_I, text_I).c_str(), reportOut);
+    return status_I;
+  };
   CLabOptions labOptions;
   for (const std::string& fault : mCommandLine.GetLabFaults()) {
     if (!labOptions.AddFault(fault, error)) {
@@ -118,9 +124,7 @@ int CUpdateCommand::Run() {
   labOptions.SetFast(mCommandLine.GetLabFast());
   // Found out now, not after an update whose result could not be kept.
   if (mCommandLine.GetLab() && !LabStateFolderWritable(labOptions.GetStateFolder(), error)) {
-    std::fprintf(stderr, "%s: --lab-state %s: %s\n", TAV_PROGRAM_NAME,
-                 labOptions.GetStateFolder().c_str(), error.c_str());
-    return ERUN_FAILED;
+    return endBeforeRun(ERUN_FAILED, "--lab-state " + labOptions.GetStateFolder() + ": " + error);
   }
 
   std::vector<std::string> boardArguments = mCommandLine.GetUpdaterArguments();
@@ -133,10 +137,7 @@ int CUpdateCommand::Run() {
       mCommandLine.GetLab()
           ? CRunSeams::MakeLab(mCommandLine.GetLabName(), labOptions.GetStateFolder(), error)
           : CRunSeams::MakeLinux();
-  if (!seams) {
-    std::fprintf(stderr, "%s: %s\n", TAV_PROGRAM_NAME, error.c_str());
-    return ERUN_USAGE;
-  }
+  if (!seams) return endBeforeRun(ERUN_USAGE, error);
 
   seams->ShareScalarSeams();
 

@@ -50,6 +50,9 @@ report 3 r "r['boards'][0]['outcome'] == 'file-refused' and r['boards'][0]['file
   "firmware file refused" --lab -p "" -f "$STATE/bad/fw_loader.ini"
 report 2 n "r['boards'] == [] and r['product'] is None" \
   "no supported tablet is connected" --lab --all -f "$STATE/none/fw_loader.ini"
+touch "$STATE/file"
+report 1 file/lab "r['boards'] == [] and r['outcome']['text'].startswith('--lab-state')" \
+  "--lab-state $STATE/file/lab" --lab -p ""
 # The scalar behind a display's bridge is reached through --all as through -s.
 report 0 f "[b['kind'] for b in r['boards'] if b['outcome'] == 'updated'] == ['pen', 'scalar']" \
   "display scalar of Lab Pen Display FTDI" --lab display-ftdi --all
