@@ -1,6 +1,8 @@
 #include "app/CAllBoards.h"
 
+#include <algorithm>
 #include <cstdio>
+#include <cstdlib>
 
 #include "common/LinuxPaths.h"
 #include "firmware/CBinaryAiroFlash.h"
@@ -68,7 +70,25 @@ std::optional<uint16_t> ReleaseIn(const CSRec& source_I) {
   return found;
 }
 
+// A scalar behind a bridge tells its version in three parts ("1.10.0"),
+// a USB board in two ("1.10"): trailing zero parts say nothing.
+std::vector<unsigned long> VersionParts(const std::string& text_I) {
+  std::vector<unsigned long> parts;
+  size_t start = 0;
+  while (start <= text_I.size()) {
+    const size_t dot = std::min(text_I.find('.', start), text_I.size());
+    parts.push_back(std::strtoul(text_I.substr(start, dot - start).c_str(), nullptr, 10));
+    start = dot + 1;
+  }
+  while (!parts.empty() && parts.back() == 0) parts.pop_back();
+  return parts;
+}
+
 }  // namespace
+
+bool CAllBoards::SameVersion(const std::string& a_I, const std::string& b_I) {
+  return !a_I.empty() && !b_I.empty() && VersionParts(a_I) == VersionParts(b_I);
+}
 
 std::optional<std::string> CAllBoards::FileRelease(const std::string& path_I,
                                                    EINTERFACE_TYPE interface_I) {
@@ -96,7 +116,7 @@ CAllBoards::SPlan CAllBoards::Plan(const std::vector<CListCommand::SProductLine>
       if (board.firmware.empty() || board.path.empty()) continue;
       const std::string file = LinuxPaths::AppendPathComponent(folder, board.firmware);
       const std::optional<std::string> release = FileRelease(file, LoadTypeOf(board));
-      if (release && !board.version.empty() && *release == board.version) {
+      if (release && SameVersion(*release, board.version)) {
         SBoardResult skipped;
         skipped.kind = board.board;
         skipped.value = board.path;

@@ -28,4 +28,6 @@ class CAllBoards {
   // nothing for a file that names none or does not load.
   static std::optional<std::string> FileRelease(const std::string& path_I,
                                                 EINTERFACE_TYPE interface_I);
+  // Two version texts name the same version; an empty one matches none.
+  static bool SameVersion(const std::string& a_I, const std::string& b_I);
 };

@@ -56,6 +56,8 @@ report 1 file/lab "r['boards'] == [] and r['outcome']['text'].startswith('--lab-
 # The scalar behind a display's bridge is reached through --all as through -s.
 report 0 f "[b['kind'] for b in r['boards'] if b['outcome'] == 'updated'] == ['pen', 'scalar']" \
   "display scalar of Lab Pen Display FTDI" --lab display-ftdi --all
+report 0 f "[b['kind'] for b in r['boards'] if b['skipped']] == ['pen', 'scalar']" \
+  "every board is already at its firmware file's version" --lab display-ftdi --all
 
 runs=$((runs + 1))
 if ! "$PROGRAM" --list --lab display-hid --lab-state "$STATE/l" --json | "$VALIDATE" "$SCHEMA" listReport; then
