@@ -2,9 +2,12 @@
 
 #include <cctype>
 
+#include "app/CFirmwareReportCommand.h"
 #include "app/TavVersion.h"
 #include "common/StringUtilities.h"
 #include "host/CLanguageManager.h"
+#include "lab/CLabOptions.h"
+#include "lab/CLabProducts.h"
 
 namespace {
 
@@ -28,6 +31,7 @@ constexpr SOptionRule kOptions[] = {
     {"--output-binary", EValue::eRequired},
     {"--json", EValue::eNone},
     {"--list", EValue::eNone},
+    {"--all", EValue::eNone},
     {"--headless", EValue::eNone},
     {"--yes", EValue::eNone},
     {"--lab-fast", EValue::eNone},
@@ -141,6 +145,10 @@ bool CCommandLine::Take(const std::string& name_I, const std::string& value_I, b
   } else if (name_I == "--inspect") {
     mInspectFile = value_I;
   } else if (name_I == "--interface") {
+    EINTERFACE_TYPE type;
+    if (!CFirmwareReportCommand::ParseInterface(value_I, type)) {
+      return Fail("unknown interface " + value_I + ": use hid, bulk, i2c or ftdi");
+    }
     mInspectInterface = value_I;
   } else if (name_I == "--output-binary") {
     mInspectOutputBinary = value_I;
@@ -148,6 +156,8 @@ bool CCommandLine::Take(const std::string& name_I, const std::string& value_I, b
     mInspectJson = true;
   } else if (name_I == "--list") {
     mList = true;
+  } else if (name_I == "--all") {
+    mAll = true;
   } else if (name_I == "--headless") {
     mHeadless = true;
   } else if (name_I == "--yes") {
@@ -155,6 +165,9 @@ bool CCommandLine::Take(const std::string& name_I, const std::string& value_I, b
   } else if (name_I == "--lab-fast") {
     mLabFast = true;
   } else if (name_I == "--lab-fault") {
+    std::string error;
+    if (!CLabOptions().AddFault(value_I, error))
+      return Fail("--lab-fault " + value_I + ": " + error);
     mLabFaults.push_back(value_I);
   } else if (name_I == "--lab-state") {
     if (value_I.empty()) return Fail("--lab-state needs a folder");
@@ -162,6 +175,9 @@ bool CCommandLine::Take(const std::string& name_I, const std::string& value_I, b
   } else if (name_I == "--lab") {
     mLab = true;
     if (given_I) mLabName = value_I;
+    if (given_I && value_I != "list" && !CLabProducts::IsKnown(value_I)) {
+      return Fail("there is no lab product called " + value_I + "; --lab list names them");
+    }
   } else {
     // -p, -t, -b, -s and -f go to the updater as they came.
     if (IsBoardOption(name_I) && !IsBoardValue(name_I, value_I)) {
@@ -181,16 +197,18 @@ bool CCommandLine::CheckCombinations() {
   if (mInspectFile.empty() && (!mInspectInterface.empty() || !mInspectOutputBinary.empty())) {
     return Fail("--interface and --output-binary go with --inspect");
   }
-  if (mInspectJson && mInspectFile.empty() && !mList) {
-    return Fail("--json goes with --inspect or --list");
+  if (mInspectJson && mInspectFile.empty() && !mList && !HasBoardOption() && !mAll) {
+    return Fail("--json goes with --inspect, --list, --all or a board option");
   }
   if (!mLab && (mLabFast || !mLabFaults.empty() || !mLabState.empty())) {
     return Fail("--lab-fault, --lab-state and --lab-fast go with --lab");
   }
   if (mList && !mInspectFile.empty()) return Fail("--list and --inspect do not go together");
-  if ((mList || !mInspectFile.empty()) && HasBoardOption()) {
-    return Fail("-p, -t, -b and -s update a board; they do not go with --list or --inspect");
+  if ((mList || !mInspectFile.empty()) && (HasBoardOption() || mAll)) {
+    return Fail("-p, -t, -b, -s and --all update boards; they do not go with --list or --inspect");
   }
+  if (mAll && HasBoardOption())
+    return Fail("--all updates every board; give it without -p, -t, -b or -s");
   return true;
 }
 
@@ -206,6 +224,7 @@ bool CCommandLine::GetLabListRequested() const { return mLab && mLabName == "lis
 std::string CCommandLine::HelpText() {
   return StringUtilities::Format(
       T("Usage: %s [options] [-p PATH] [-t PATH] [-b PATH] [-s DISPLAY] [-f CONFIG]\n"
+        "       %s [options] --all\n"
         "\n"
         "Updates the firmware of a pen tablet or pen display.\n"
         "\n"
@@ -216,6 +235,9 @@ std::string CCommandLine::HelpText() {
         "  -s DISPLAY    the display scalar\n"
         "                PATH is an interface path as --list shows it, or \"\" for the\n"
         "                board found; DISPLAY is VENDOR:PRODUCT:SERIAL:INDEX, or \"\"\n"
+        "      --all     every board of every product found for which the configuration\n"
+        "                names a firmware file: pen, touch, Bluetooth, then scalar;\n"
+        "                a board already at the file's version is skipped\n"
         "  -f CONFIG     path of the device configuration (fw_loader.ini)\n"
         "\n"
         "Options:\n"
@@ -225,6 +247,8 @@ std::string CCommandLine::HelpText() {
         "      --log FILE        append log lines to FILE\n"
         "      --headless        no window\n"
         "      --yes             answer the confirmation with yes\n"
+        "      --json            with an update, end with a JSON report on standard\n"
+        "                        output; the terminal text goes to standard error\n"
         "\n"
         "Looking at a firmware file, without touching a device:\n"
         "      --inspect FILE        load FILE as an update would and show its content\n"
@@ -251,5 +275,5 @@ std::string CCommandLine::HelpText() {
         "1 an update failed, 2 no device or board found, 3 firmware file refused,\n"
         "4 not confirmed, 64 wrong usage.\n")
           .c_str(),
-      TAV_PROGRAM_NAME);
+      TAV_PROGRAM_NAME, TAV_PROGRAM_NAME);
 }

@@ -23,6 +23,8 @@ class CCommandLine {
   const std::string& GetInspectOutputBinary() const { return mInspectOutputBinary; }
   // --list [--lab [NAME]] [--json] [-f CONFIG]
   bool GetList() const { return mList; }
+  // --all: every board the configuration names a file for, found by discovery.
+  bool GetAll() const { return mAll; }
   // --lab runs on the lab's emulated products instead of the hardware.
   bool GetLab() const { return mLab; }
   // No window; a run ends with a status that tells its outcome.
@@ -58,6 +60,7 @@ class CCommandLine {
   bool mInspectJson = false;
   std::string mInspectOutputBinary;
   bool mList = false;
+  bool mAll = false;
   bool mLab = false;
   bool mHeadless = false;
   bool mYes = false;

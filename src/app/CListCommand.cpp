@@ -74,8 +74,8 @@ int CListCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
   std::unique_ptr<CRunSeams> seams =
       mLab ? CRunSeams::MakeLab(mLabName, mLabState, error) : CRunSeams::MakeLinux();
   if (!seams) {
-    std::fprintf(err_IO, "%s\n", error.c_str());
-    return 1;
+    std::fprintf(err_IO, "%s: %s\n", TAV_PROGRAM_NAME, error.c_str());
+    return ERUN_USAGE;
   }
   // Faults show what the listing makes of a board that misbehaves.
   CLabOptions faults;
@@ -113,8 +113,17 @@ int CListCommand::Run(const CRunSeams& seams_I, const std::string& configPath_I,
   return products.empty() ? 2 : 0;
 }
 
+std::vector<CListCommand::SProductLine> CListCommand::Find(const CRunSeams& seams_I,
+                                                           const std::string& configPath_I) {
+  seams_I.ShareScalarSeams();
+  std::unique_ptr<CLinuxDiscovery> discovery = seams_I.MakeDiscovery();
+  discovery->SetConfig(configPath_I);
+  discovery->GenerateDeviceList();
+  return Describe(discovery->GetDeviceList(), *seams_I.GetRegistry());
+}
+
 std::vector<CListCommand::SProductLine> CListCommand::Describe(const CDeviceList& list_I,
-                                                               CDeviceRegistry& registry_I) const {
+                                                               CDeviceRegistry& registry_I) {
   const auto boardLine = [&](const char* board_I, const CDevice::InterfacePtr& interface_I,
                              EINTERFACE_TYPE configured_I, const std::string& firmware_I) {
     SBoardLine line;
@@ -155,6 +164,8 @@ std::vector<CListCommand::SProductLine> CListCommand::Describe(const CDeviceList
     if (pen) pensListed.push_back(pen);
     SProductLine product;
     product.name = device->GetDeviceName();
+    product.vendorId = device->GetPenVendorId();
+    product.productId = device->GetPenProductId();
     product.loaderMode = device->GetIsFlashLoader();
     product.boards.push_back(boardLine("pen", device->GetPenInterface(),
                                        device->GetPenInterfaceType(), device->GetPenUpdate()));

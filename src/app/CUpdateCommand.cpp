@@ -8,7 +8,10 @@
 #include <cstring>
 #include <filesystem>
 
+#include "app/CAllBoards.h"
+#include "app/CListCommand.h"
 #include "app/CRunSeams.h"
+#include "app/CUpdateReport.h"
 #include "app/CUpdaterRun.h"
 #include "app/TavVersion.h"
 #include "common/LinuxPaths.h"
@@ -22,6 +25,7 @@
 #include "platform/linux/CLinuxPowerInhibitor.h"
 #include "platform/linux/CLinuxServiceDirectory.h"
 #include "update/CApplicationDelegate.h"
+#include "update/OFLUpdater.h"
 
 namespace {
 
@@ -62,6 +66,23 @@ bool DisplayReachable() {
   return std::filesystem::exists("/tmp/.X11-unix/X" + number, error);
 }
 
+// A terminal run reads its boards from the command line, or, when another
+// program of the family started it, from the arguments file it left.
+bool NamesNoBoard(const CCommandLine& commandLine_I) {
+  if (commandLine_I.HasBoardOption() || commandLine_I.GetAll()) return false;
+  std::error_code error;
+  return !std::filesystem::exists(
+      LinuxPaths::AppendPathComponent(LinuxPaths::GetUserPreferencesFolderPath(), "fwupdater.parm"),
+      error);
+}
+
+void SayWhatToType() {
+  std::fprintf(stderr,
+               "%s: nothing to update: give -p, -t, -b or -s with an interface path from --list "
+               "(or \"\" for the board found), or --all for every board (see --help)\n",
+               TAV_PROGRAM_NAME);
+}
+
 }  // namespace
 
 bool CUpdateCommand::UsesWindow(bool headless_I) {
@@ -71,6 +92,26 @@ bool CUpdateCommand::UsesWindow(bool headless_I) {
 
 int CUpdateCommand::Run() {
   std::string error;
+  // A report for scripts needs no window, and owns standard output: what
+  // the terminal shows goes to standard error instead.
+  const bool window = !mCommandLine.GetInspectJson() && UsesWindow(mCommandLine.GetHeadless());
+  if (!window && NamesNoBoard(mCommandLine)) {
+    SayWhatToType();
+    return ERUN_USAGE;
+  }
+  std::FILE* reportOut = nullptr;
+  if (mCommandLine.GetInspectJson()) {
+    std::fflush(stdout);
+    reportOut = fdopen(dup(STDOUT_FILENO), "w");
+    dup2(STDERR_FILENO, STDOUT_FILENO);
+  }
+  CUpdateReport report;
+  // A run that cannot start still owes a script its report.
+  const auto endBeforeRun = [&report, reportOut](int status_I, const std::string& text_I) {
+    std::fprintf(stderr, "%s: %s\n", TAV_PROGRAM_NAME, text_I.c_str());
+    if (reportOut != nullptr) std::fputs(report.ToJson({}, status_I, text_I).c_str(), reportOut);
+    return status_I;
+  };
   CLabOptions labOptions;
   for (const std::string& fault : mCommandLine.GetLabFaults()) {
     if (!labOptions.AddFault(fault, error)) {
@@ -83,19 +124,20 @@ int CUpdateCommand::Run() {
   labOptions.SetFast(mCommandLine.GetLabFast());
   // Found out now, not after an update whose result could not be kept.
   if (mCommandLine.GetLab() && !LabStateFolderWritable(labOptions.GetStateFolder(), error)) {
-    std::fprintf(stderr, "%s: --lab-state %s: %s\n", TAV_PROGRAM_NAME,
-                 labOptions.GetStateFolder().c_str(), error.c_str());
-    return ERUN_FAILED;
+    return endBeforeRun(ERUN_FAILED, "--lab-state " + labOptions.GetStateFolder() + ": " + error);
+  }
+
+  std::vector<std::string> boardArguments = mCommandLine.GetUpdaterArguments();
+  if (mCommandLine.GetAll()) {
+    const int status = PlanAll(labOptions.GetStateFolder(), report, reportOut, boardArguments);
+    if (status >= 0) return status;
   }
 
   std::unique_ptr<CRunSeams> seams =
       mCommandLine.GetLab()
           ? CRunSeams::MakeLab(mCommandLine.GetLabName(), labOptions.GetStateFolder(), error)
           : CRunSeams::MakeLinux();
-  if (!seams) {
-    std::fprintf(stderr, "%s: %s\n", TAV_PROGRAM_NAME, error.c_str());
-    return ERUN_USAGE;
-  }
+  if (!seams) return endBeforeRun(ERUN_USAGE, error);
 
   seams->ShareScalarSeams();
 
@@ -131,14 +173,58 @@ int CUpdateCommand::Run() {
   SRunOptions options;
   // The updater sees the board options alone, as the program was given them.
   options.processArguments.push_back(mProgramPath);
-  for (const std::string& argument : mCommandLine.GetUpdaterArguments()) {
+  for (const std::string& argument : boardArguments) {
     options.processArguments.push_back(argument);
   }
   options.assumeYes = mCommandLine.GetYes();
-  options.window = UsesWindow(mCommandLine.GetHeadless());
+  options.window = window;
+  if (reportOut != nullptr) {
+    options.runEnded = [reportOut, &report](int status_I, const std::string& lastLine_I) {
+      std::fputs(
+          report.ToJson(OFLUpdater::updater()->boardResults().Get(), status_I, lastLine_I).c_str(),
+          reportOut);
+      std::fflush(reportOut);
+    };
+  }
   CLabSession* sessionToFinish = session.get();
   options.beforeExit = [sessionToFinish] {
     if (sessionToFinish != nullptr) sessionToFinish->Finish();
   };
   return CUpdaterRun::Run(std::move(runSeams), std::move(options));
+}
+
+int CUpdateCommand::PlanAll(const std::string& labStateFolder_I, CUpdateReport& report_IO,
+                            std::FILE* reportOut_I, std::vector<std::string>& arguments_IO) const {
+  // Found on seams of its own, so that the run's lab faults count only the
+  // run's own traffic.
+  std::string error;
+  const std::unique_ptr<CRunSeams> seams =
+      mCommandLine.GetLab() ? CRunSeams::MakeLab(mCommandLine.GetLabName(), labStateFolder_I, error)
+                            : CRunSeams::MakeLinux();
+  if (!seams) {
+    std::fprintf(stderr, "%s: %s\n", TAV_PROGRAM_NAME, error.c_str());
+    return ERUN_USAGE;
+  }
+  const std::string configPath = CListCommand::ConfigPath(arguments_IO);
+  const CAllBoards::SPlan plan =
+      CAllBoards::Plan(CListCommand::Find(*seams, configPath), configPath);
+  for (const SBoardResult& board : plan.skipped) {
+    std::printf("Skipping the %s of %s (%s): already at version %s.\n",
+                CBoardResults::BoardName(board.kind), board.product.c_str(), board.path.c_str(),
+                board.versionBefore.c_str());
+    report_IO.AddSkipped(board);
+  }
+  if (!plan.arguments.empty()) {
+    arguments_IO.insert(arguments_IO.end(), plan.arguments.begin(), plan.arguments.end());
+    return -1;
+  }
+  // Nothing left to run the updater for.
+  const ERunOutcome outcome = plan.productCount == 0 ? ERUN_NO_DEVICE : ERUN_SUCCESS;
+  const std::string result = outcome == ERUN_SUCCESS
+                                 ? "Result: every board is already at its firmware file's version."
+                                 : "Result: no supported tablet is connected.";
+  std::printf("%s\n", result.c_str());
+  if (reportOut_I != nullptr)
+    std::fputs(report_IO.ToJson({}, outcome, result).c_str(), reportOut_I);
+  return outcome;
 }

@@ -2,10 +2,13 @@
 // The program's main job: an update run with the board arguments, on the
 // hardware or, with --lab, on an emulated product.
 
+#include <cstdio>
 #include <string>
 #include <vector>
 
 #include "app/CCommandLine.h"
+
+class CUpdateReport;
 
 class CUpdateCommand {
  public:
@@ -21,6 +24,12 @@ class CUpdateCommand {
   static bool UsesWindow(bool headless_I);
 
  private:
+  // --all: adds the board options of every board to update to
+  // `arguments_IO` and returns -1, or, when none is left, says so, reports
+  // and returns the status to end with.
+  int PlanAll(const std::string& labStateFolder_I, CUpdateReport& report_IO, std::FILE* reportOut_I,
+              std::vector<std::string>& arguments_IO) const;
+
   const CCommandLine& mCommandLine;
   std::string mProgramPath;
 };

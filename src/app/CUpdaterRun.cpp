@@ -35,6 +35,7 @@ class CRun {
     app.terminal = !mOptions.window;
     app.printResult = std::move(printResult_I);
     app.printError = std::move(printError_I);
+    app.runEnded = mOptions.runEnded;
     app.exitProcess = [this](int status_I) {
       mStatus = status_I;
       if (mOptions.beforeExit) mOptions.beforeExit();

@@ -31,6 +31,8 @@ struct SRunOptions {
   bool assumeYes = false;
   // Runs just before the process ends (a lab run saves its boards here).
   std::function<void()> beforeExit;
+  // A terminal run is over: its status and the last line it showed.
+  std::function<void(int status_I, const std::string& lastLine_I)> runEnded;
 };
 
 class CUpdaterRun {

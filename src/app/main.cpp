@@ -30,7 +30,7 @@ int main(int argc, char** argv) {
     return 0;
   }
   if (commandLine.GetLabListRequested() && !commandLine.GetList()) {
-    if (commandLine.HasBoardOption()) {
+    if (commandLine.HasBoardOption() || commandLine.GetAll()) {
       std::fprintf(stderr,
                    "%s: --lab list names the lab's products; give a product name to update\n",
                    TAV_PROGRAM_NAME);

@@ -52,9 +52,36 @@ void CBoardResults::Finish(EBoardOutcome outcome_I, const std::string& reason_I)
   result.reason = reason_I.empty() && outcome_I != EBOARD_UPDATED ? mFirstError : reason_I;
 }
 
-void CBoardResults::NoteError(const std::string& text_I) {
+void CBoardResults::SetIdentity(uint32_t vendorId_I, uint32_t productId_I) {
+  std::lock_guard<std::mutex> guard(mLock);
+  if (mCurrent >= mResults.size()) return;
+  mResults[mCurrent].vendorId = vendorId_I;
+  mResults[mCurrent].productId = productId_I;
+}
+
+void CBoardResults::NoteState(ECONTROLLER_STATE state_I) {
+  std::lock_guard<std::mutex> guard(mLock);
+  if (mCurrent < mResults.size()) mResults[mCurrent].states.push_back(state_I);
+}
+
+void CBoardResults::SetChecksums(uint32_t before_I, uint32_t after_I, uint32_t file_I) {
+  std::lock_guard<std::mutex> guard(mLock);
+  if (mCurrent >= mResults.size()) return;
+  SBoardResult& result = mResults[mCurrent];
+  result.checksumsKnown = true;
+  result.checksumBefore = before_I;
+  result.checksumAfter = after_I;
+  result.checksumFile = file_I;
+}
+
+void CBoardResults::NoteError(ECONTROLLER_ERROR code_I, const std::string& text_I) {
   std::lock_guard<std::mutex> guard(mLock);
   if (mFirstError.empty()) mFirstError = text_I;
+  // Some errors come without a text; the code alone still tells the kind.
+  if (mCurrent < mResults.size() && mResults[mCurrent].errorCode == EERROR_NONE) {
+    mResults[mCurrent].errorCode = code_I;
+    mResults[mCurrent].errorText = text_I;
+  }
 }
 
 void CBoardResults::SetVersionAfter(size_t index_I, const std::string& version_I) {

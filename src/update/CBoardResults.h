@@ -32,7 +32,20 @@ struct SBoardResult {
   std::string versionBefore;  // as the user reads it; empty when unknown
   std::string versionAfter;
   EBoardOutcome outcome = EBOARD_NOT_REACHED;
-  std::string reason;  // why it was not updated
+  std::string reason;     // why it was not updated
+  uint32_t vendorId = 0;  // the selected product's pen identity
+  uint32_t productId = 0;
+  // Every state the controller passed through during this entry, in order.
+  std::vector<ECONTROLLER_STATE> states;
+  // The first error the controller raised during this entry, with its text.
+  ECONTROLLER_ERROR errorCode = EERROR_NONE;
+  std::string errorText;
+  // The device's sum of block checksums before and after programming, and
+  // the image's, where the board keeps checksums.
+  bool checksumsKnown = false;
+  uint32_t checksumBefore = 0;
+  uint32_t checksumAfter = 0;
+  uint32_t checksumFile = 0;
 };
 
 class CBoardResults {
@@ -48,10 +61,13 @@ class CBoardResults {
   void SetBoard(const std::string& product_I, const std::string& path_I,
                 const std::string& version_I);
   void SetFile(const std::string& file_I);
+  void SetIdentity(uint32_t vendorId_I, uint32_t productId_I);
+  void NoteState(ECONTROLLER_STATE state_I);
+  void SetChecksums(uint32_t before_I, uint32_t after_I, uint32_t file_I);
   // Ends the current entry; a later end of the same entry does not change it.
   void Finish(EBoardOutcome outcome_I, const std::string& reason_I = std::string());
   // The first error reported during the current entry, kept as its reason.
-  void NoteError(const std::string& text_I);
+  void NoteError(ECONTROLLER_ERROR code_I, const std::string& text_I);
   void SetVersionAfter(size_t index_I, const std::string& version_I);
 
   std::vector<SBoardResult> Get() const;

@@ -15,7 +15,7 @@ void CLinuxUpdateNotifier::UpdateLog(const std::string& text_I) {
 void CLinuxUpdateNotifier::UpdateError(ECONTROLLER_ERROR error_I, const std::string& text_I) {
   syslog(LOG_ERR, "ERROR: %s (%d)", text_I.c_str(), static_cast<int>(error_I));
   TavLog::Error("ERROR: %s (%d)\n", text_I.c_str(), static_cast<int>(error_I));
-  if (!text_I.empty()) mUpdater.noteError(text_I);
+  mUpdater.noteError(error_I, text_I);
 }
 
 void CLinuxUpdateNotifier::UpdateStatus(ECONTROLLER_STATE state_I) {

@@ -173,6 +173,7 @@ bool FLAppDelegate::CheckTerminalArguments() {
 void FLAppDelegate::ExitBeforeStart(const std::string& error_I, int status_I) {
   mTerminated = true;
   if (mSetup.printError) mSetup.printError(error_I);
+  if (mSetup.runEnded) mSetup.runEnded(status_I, error_I);
   if (mSetup.exitProcess) mSetup.exitProcess(status_I);
 }
 
@@ -457,5 +458,6 @@ void FLAppDelegate::terminate(ERunOutcome outcome_I) {
     if (mSetup.printResult) mSetup.printResult(ResultLine(outcome));
   }
   const int status = mSetup.terminal ? static_cast<int>(outcome) : 0;
+  if (mSetup.terminal && mSetup.runEnded) mSetup.runEnded(status, ResultLine(outcome));
   if (mSetup.exitProcess) mSetup.exitProcess(status);
 }

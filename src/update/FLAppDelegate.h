@@ -29,6 +29,9 @@ struct SApplicationSetup {
   // Where a terminal run's report lines go, and its remarks and errors.
   std::function<void(const std::string& line_I)> printResult;
   std::function<void(const std::string& line_I)> printError;
+  // A terminal run is over, just before the process ends: its status and
+  // the last line the user was shown (the result, or why it did not start).
+  std::function<void(int status_I, const std::string& lastLine_I)> runEnded;
 };
 
 class FLAppDelegate : public CApplicationDelegate {

@@ -451,6 +451,7 @@ bool OFLUpdater::prepareEntry(const std::string& kind_I, const std::string& valu
   const std::shared_ptr<CDevice> device = mUpdater->GetSelectedDevice();
   const std::string product = device ? device->GetDeviceName() : std::string();
   const CDevice::InterfacePtr board = mUpdater->GetActiveInterface();
+  if (device) mResults.SetIdentity(device->GetPenVendorId(), device->GetPenProductId());
   if (device && mUpdater->GetUpdateType() == EUPDATE_SCALAR_FTDI) {
     // A scalar behind its bridge has the display's description for a path.
     mResults.SetBoard(
@@ -586,6 +587,16 @@ void OFLUpdater::runUpdateStep(const std::string& value_I) {
 void OFLUpdater::callBackStatus(ECONTROLLER_STATE state_I) {
   // Recorded before the state machine sees it: a last success or a failure
   // ends the process from there.
+  mResults.NoteState(state_I);
+  // Programming is over and the loader still holds the sums it worked out;
+  // the last board's own record of them comes too late for the report.
+  if (state_I == ESTATE_WAIT_DEVICE) {
+    const CDevice::InterfacePtr board = mUpdater->GetActiveInterface();
+    if (board && board->GetChecksumsSupported()) {
+      mResults.SetChecksums(board->GetOldChecksum(), board->GetNewChecksum(),
+                            board->GetFWChecksum());
+    }
+  }
   if (state_I == ESTATE_SUCCESS) mResults.Finish(EBOARD_UPDATED);
   if (state_I == ESTATE_FAILURE) mResults.Finish(EBOARD_FAILED);
   if (state_I == ESTATE_SUCCESS && mUpdateIndex < static_cast<int>(mDeviceUpdates.size())) {

@@ -96,7 +96,9 @@ class OFLUpdater : public CRegistryWatcher {
   // run. Call once the run is over.
   void refreshVersionsAfter();
   // An error the controller reported, kept as the reason of the current board.
-  void noteError(const std::string& text_I) { mResults.NoteError(text_I); }
+  void noteError(ECONTROLLER_ERROR code_I, const std::string& text_I) {
+    mResults.NoteError(code_I, text_I);
+  }
   // The device watch could not be set up.
   bool watchFailed() const { return mWatchFailed; }
   // True once the update thread has gone through its list.

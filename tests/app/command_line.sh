@@ -35,7 +35,17 @@ refused 64 "not a display" -s "x:y"
 refused 64 "--headless takes no value" --headless=yes
 refused 64 "there is no lab product called nothing" --lab=nothing -p ""
 refused 64 "--lab list names" --lab list -p ""
+refused 64 "--lab list names" --lab list --all
 refused 64 "do not go with --list" --list -p ""
+refused 64 "do not go with --list" --list --all
+refused 64 "--all updates every board" --all -p ""
+refused 64 "--all takes no value" --all=yes
+refused 64 "needs a count" --lab --lab-fault fail-write --all
+refused 64 "unknown fault kind \"bogus\"" --lab --lab-fault bogus@3 --list
+refused 64 "unknown interface foo" --inspect "$STATE/none.pen" --interface foo
+refused 64 "there is no lab product called nothing" --lab nothing --list
+refused 64 "--json goes with" --json
+refused 64 "or --all for every board" --lab --headless --yes
 mkdir -p "$STATE/locked" && chmod a-w "$STATE/locked"
 if [ "$(id -u)" -ne 0 ]; then
   refused 1 "--lab-state $STATE/locked/lab" --lab --lab-state "$STATE/locked/lab" --yes -p ""
@@ -60,6 +70,8 @@ check() {  # check DESCRIPTION COMMAND...: the command must succeed
 }
 check "--lab list names the products" \
   bash -c '"$0" --lab list | grep -q "^classic-tablet "' "$PROGRAM"
+check "--lab list after --list names the products" \
+  bash -c '"$0" --list --lab list | grep -q "^display-ftdi "' "$PROGRAM"
 check "--lab=NAME takes the name" \
   bash -c '"$0" --list --lab=display-hid --lab-state "$1/l" | grep -q "Lab Pen Display HID"' \
   "$PROGRAM" "$STATE"

@@ -90,7 +90,7 @@ echo "[]" >"$STATE/empty.ini"
 if "$PROGRAM" --list --lab --lab-state "$STATE/e" -f "$STATE/empty.ini" 2>&1 | grep -q "could not be read"; then
   echo "FAIL: [] is a valid, empty configuration"; failures=$((failures + 1))
 fi
-SAYS="No board to update" \
+SAYS="nothing to update: give -p, -t, -b or -s" \
 expect 64 "a terminal run without a board" --lab --headless --lab-state "$STATE/e" --yes
 # Each "GetDevice" comparison belongs in the log, not on the screen.
 if "$PROGRAM" --lab --lab-fast --lab-state "$STATE/p" --yes -p "1:2:3:4:5" </dev/null 2>&1 | grep -q GetDevice; then

@@ -124,8 +124,4 @@ TEST(InspectCommand, RefusesAFileThatDoesNotLoadInTheReadersWords) {
   run = Inspect({"--inspect", folder.Write("x.hex", HexRecord(0, 0x9000, {1}) + "\r\n")});
   EXPECT_EQ(run.err, "tavik-fwupdater: " + folder.Path("x.hex") +
                          ": CIntelHex::Load: ERROR - start_address exceeds 32768\n");
-
-  run = Inspect({"--inspect", folder.Path("x.hex"), "--interface", "usb"});
-  EXPECT_EQ(run.status, 64);
-  EXPECT_EQ(run.err, "tavik-fwupdater: unknown interface usb: use hid, bulk, i2c or ftdi\n");
 }

@@ -130,7 +130,8 @@ class Application : public UpdateFixture {
               if (mLoop) mLoop->Quit();
             },
         .printResult = [this](const std::string& line_I) { mReport.push_back(line_I); },
-        .printError = [this](const std::string& line_I) { mErrors.push_back(line_I); }});
+        .printError = [this](const std::string& line_I) { mErrors.push_back(line_I); },
+        .runEnded = nullptr});
     return *mApp;
   }
 

@@ -98,7 +98,8 @@ TEST_F(QtMainLoop, AnEndDuringTheSetUpRunsTheTerminateHandlerWithoutHanging) {
                                             window.QuitMainLoop();
                                           },
                                       .printResult = nullptr,
-                                      .printError = nullptr});
+                                      .printError = nullptr,
+                                      .runEnded = nullptr});
   window.PostToMainLoop([&app] { app.applicationDidFinishLaunching(); });
   ASSERT_TRUE(RunForAtMostTenSeconds(window)) << "the run hung";
   EXPECT_TRUE(app.HasTerminated());

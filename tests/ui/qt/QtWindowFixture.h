@@ -83,7 +83,8 @@ class QtWindowFixture : public UpdateFixture {
                           .terminal = false,
                           .exitProcess = [this](int status_I) { mExitStatus = status_I; },
                           .printResult = nullptr,
-                          .printError = nullptr});
+                          .printError = nullptr,
+                          .runEnded = nullptr});
     mWindow->SetApplication(mApp.get());
     SUpdaterSetup setup = Setup(arguments_I);
     setup.delegate = mApp.get();
