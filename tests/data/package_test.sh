@@ -62,15 +62,12 @@ for path in \
   usr/share/polkit-1/actions/com.tavik.update-helper.policy \
   etc/tavik/update-helper.conf.example \
   usr/share/doc/tavik-fwupdater/copyright \
-  usr/share/doc/tavik-fwupdater/changelog.gz; do
+  usr/share/doc/tavik-fwupdater/changelog.gz \
+  usr/share/tavik-fwupdater/update-report.schema.json \
+  usr/share/man/man1/tavik-fwupdater.1.gz \
+  usr/share/bash-completion/completions/tavik-fwupdater; do
   [ -e "$root/$path" ] || fail "missing /$path"
 done
-# Written by the command-line work; installed whenever the tree has them.
-src=$(sed -n 's/^CMAKE_HOME_DIRECTORY:INTERNAL=//p' "$build/CMakeCache.txt")
-[ ! -e "$src/data/tavik-fwupdater.1" ] || [ -e "$root/usr/share/man/man1/tavik-fwupdater.1" ] ||
-  [ -e "$root/usr/share/man/man1/tavik-fwupdater.1.gz" ] || fail "missing the man page"
-[ ! -e "$src/data/bash-completion/tavik-fwupdater" ] ||
-  [ -e "$root/usr/share/bash-completion/completions/tavik-fwupdater" ] || fail "missing the completion"
 # The bus and systemd start the helper where the package puts it.
 grep -q '^Exec=/usr/libexec/tavik-update-helper$' \
   "$root/usr/share/dbus-1/system-services/com.tavik.UpdateHelper.service" ||
