@@ -183,7 +183,11 @@ bool RTDISP::WriteBlock(int8_t block_I) {
     SerialFlashWriteCode(block);
     const uint32_t size = static_cast<uint32_t>(data.size());
     if (CalcByteCRC(data.data(), data.size()) == ReadCRC(block * FLASH_UINT_SIZE, size)) {
-      return true;
+      if (!mWriteTransferFailed) return true;
+      // A lost byte shifts the rest of the block; the CRC cannot be trusted
+      // to see that, so the block is written again.
+      Error("Block " + std::to_string(block_I) + " lost bytes on the bus while being written");
+      continue;
     }
     Error("Crc Check Fail");
   }
@@ -349,19 +353,20 @@ bool RTDISP::BlockErase(unsigned int block_I) {
 
 bool RTDISP::SerialFlashWriteCode(unsigned int block_I) {
   Log("SerialFlashWriteCode()", false);
-  WriteMCURegs({{kProgramOpcode, kPageProgramOpcode},
-                {kProgramControl, 0xFF},
-                {kFlashAddressHigh, static_cast<uint8_t>(block_I & 0xFF)},
-                {kFlashAddressMiddle, 0},
-                {kFlashAddressLow, 0}});
+  // Only writes count: a busy MCU may refuse a poll, never data it took.
+  mWriteTransferFailed = WriteMCURegs({{kProgramOpcode, kPageProgramOpcode},
+                                       {kProgramControl, 0xFF},
+                                       {kFlashAddressHigh, static_cast<uint8_t>(block_I & 0xFF)},
+                                       {kFlashAddressMiddle, 0},
+                                       {kFlashAddressLow, 0}}) != FT_OK;
   const std::vector<uint8_t>& data = mBlocks[block_I];
   // The MCU moves the flash address on by itself after every page.
   for (size_t page = 0; page < data.size(); page += kPageSize) {
     if (!WaitBitChange(kISPControl, kBufferReady, kBufferReady, kBufferWaitReads)) return false;
     const auto begin = data.begin() + static_cast<long>(page);
     const auto end = data.begin() + static_cast<long>(std::min(page + kPageSize, data.size()));
-    WriteFlashData(std::vector<uint8_t>(begin, end));
-    WriteMCUReg(kISPControl, kStartPageProgram);
+    if (WriteFlashData(std::vector<uint8_t>(begin, end)) != FT_OK) mWriteTransferFailed = true;
+    if (WriteMCUReg(kISPControl, kStartPageProgram) != FT_OK) mWriteTransferFailed = true;
     if (!WaitBitChange(kISPControl, kPageProgram, 0, kFlashWaitReads)) return false;
   }
   return true;
@@ -385,22 +390,29 @@ uint8_t RTDISP::ReadCRC(unsigned int address_I, unsigned int length_I) {
 
 FT_STATUS RTDISP::WriteFlashData(const std::vector<uint8_t>& bytes_I) {
   Log("WriteFlashData()", false);
-  mConnector->Start();
-  mConnector->SendByte(kMCUWrite, false);
-  mConnector->SendByte(kProgramData, false);
-  for (uint8_t byte : bytes_I) mConnector->SendByte(byte, false);
-  return mConnector->Stop();
+  FT_STATUS first = mConnector->Start();
+  const auto keep = [&first](FT_STATUS status_I) {
+    if (first == FT_OK) first = status_I;
+  };
+  keep(mConnector->SendByte(kMCUWrite, false));
+  keep(mConnector->SendByte(kProgramData, false));
+  for (uint8_t byte : bytes_I) keep(mConnector->SendByte(byte, false));
+  keep(mConnector->Stop());
+  return first;
 }
 
 FT_STATUS RTDISP::WriteMCUReg(uint8_t reg_I, uint8_t value_I) {
   Log("WriteMCUReg()", false);
-  // Acknowledges are not looked at: a dead bus shows as a wait that times
-  // out or a CRC that does not match.
-  mConnector->Start();
-  mConnector->SendByte(kMCUWrite, false);
-  mConnector->SendByte(reg_I, false);
-  mConnector->SendByte(value_I, false);
-  return mConnector->Stop();
+  // The first failure or missing acknowledge is given back; only the
+  // block writer looks at it; elsewhere a dead bus shows as a wait that
+  // times out or a CRC that does not match.
+  FT_STATUS first = mConnector->Start();
+  for (uint8_t byte : {kMCUWrite, reg_I, value_I}) {
+    const FT_STATUS status = mConnector->SendByte(byte, false);
+    if (first == FT_OK) first = status;
+  }
+  const FT_STATUS stop = mConnector->Stop();
+  return first != FT_OK ? first : stop;
 }
 
 FT_STATUS RTDISP::WriteMCURegBit(uint8_t reg_I, uint8_t andMask_I, uint8_t orMask_I) {
@@ -421,8 +433,13 @@ uint8_t RTDISP::ReadMCUReg(uint8_t reg_I) {
   return value;
 }
 
-void RTDISP::WriteMCURegs(std::initializer_list<std::pair<uint8_t, uint8_t>> writes_I) {
-  for (const auto& [reg, value] : writes_I) WriteMCUReg(reg, value);
+FT_STATUS RTDISP::WriteMCURegs(std::initializer_list<std::pair<uint8_t, uint8_t>> writes_I) {
+  FT_STATUS first = FT_OK;
+  for (const auto& [reg, value] : writes_I) {
+    const FT_STATUS status = WriteMCUReg(reg, value);
+    if (first == FT_OK) first = status;
+  }
+  return first;
 }
 
 bool RTDISP::WaitFlashIdle() {

@@ -70,7 +70,8 @@ class RTDISP {
   void Error(const std::string& text_I);
   void Progress(unsigned int percent_I);
   // Writes each register in turn; the sequences of the board variants.
-  void WriteMCURegs(std::initializer_list<std::pair<uint8_t, uint8_t>> writes_I);
+  // Gives the first failed status, or FT_OK.
+  FT_STATUS WriteMCURegs(std::initializer_list<std::pair<uint8_t, uint8_t>> writes_I);
   bool WaitFlashIdle();
   bool WriteBlock(int8_t block_I);
   unsigned int BlockProgress(int8_t block_I) const;
@@ -80,6 +81,10 @@ class RTDISP {
   std::vector<std::vector<uint8_t>> mBlocks;
   uint32_t mBlockCount = 0;
   bool mDataLoaded = false;
+  // Set when a byte of the last block's writing went unacknowledged or its
+  // transfer failed: the eight-bit CRC alone lets such a block pass one
+  // time in 256.
+  bool mWriteTransferFailed = false;
   CInterfaceNotifier* mNotifier;
   bool mQuantaFirmware;
   bool mQisdaVenusScalarBoard;
