@@ -22,6 +22,7 @@ int CLabSession::Start() {
   }
   mStarted = true;
   mStartTime = CClock::Get()->Now();
+  mStartWaited = CClock::Get()->GetTimeWaited();
   return loaded;
 }
 
@@ -33,6 +34,7 @@ bool CLabSession::Finish() {
                  static_cast<unsigned long long>(board->Faults().GetReportCount()));
   }
   TavLog::Info("Lab clock: %.3f s\n", CClock::Get()->Now() - mStartTime);
+  TavLog::Info("Lab waits: %.3f s\n", CClock::Get()->GetTimeWaited() - mStartWaited);
   const bool saved = mBus->SaveState(mOptions.GetStateFolder());
   if (!saved) TavLog::Error("Lab state not saved to %s\n", mOptions.GetStateFolder().c_str());
   return saved;

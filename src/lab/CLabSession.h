@@ -8,8 +8,9 @@
 //
 // At its end the run logs what it cost the boards: "Lab board NAME: N
 // reports" for each (every transfer that reached the board, failed or not),
-// and "Lab clock: S s", the time the run took on the lab's clock (on the
-// virtual clock, the waits alone).
+// "Lab clock: S s", the time the run took on the lab's clock, and "Lab
+// waits: S s", the part of it in which the program was asleep (on the
+// virtual clock, where only sleeps move time, the two agree).
 
 #include <memory>
 
@@ -34,4 +35,5 @@ class CLabSession {
   CLabOptions mOptions;
   bool mStarted = false;
   double mStartTime = 0.0;
+  double mStartWaited = 0.0;
 };

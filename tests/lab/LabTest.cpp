@@ -332,6 +332,7 @@ TEST_F(LabBus, ASessionEndsWithWhatItCostTheBoards) {
   }
   EXPECT_TRUE(log.LogContains("Lab board counted: 3 reports\n"));
   EXPECT_TRUE(log.LogContains("Lab clock: 2.500 s\n"));
+  EXPECT_TRUE(log.LogContains("Lab waits: 2.500 s\n"));
   std::filesystem::remove_all(folder);
 }
 
