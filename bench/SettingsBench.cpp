@@ -1,7 +1,14 @@
 // Reading and writing a configuration-sized settings tree in every form,
 // and reading a JSON device configuration of 1 MiB, the form every update
 // starts with.
+//
+//   tav_bench_settings --write-documents DIR   writes the documents read
+//     here (tree.xml, tree.plist, tree.json, mebibyte.json) to DIR, so that
+//     bench/report can give other parsers the same text, and exits.
 #include <benchmark/benchmark.h>
+
+#include <cstring>
+#include <fstream>
 
 #include "settings/CSettingsMap.h"
 #include "settings/SettingsTestTrees.h"
@@ -97,3 +104,33 @@ BENCHMARK(BM_WriteASN1)->Unit(benchmark::kMillisecond);
 BENCHMARK(BM_ReadASN1)->Unit(benchmark::kMillisecond);
 BENCHMARK(BM_WriteCompressed)->Unit(benchmark::kMillisecond);
 BENCHMARK(BM_ReadCompressed)->Unit(benchmark::kMillisecond);
+
+namespace {
+
+bool WriteDocuments(const std::string& folder_I) {
+  const std::pair<const char*, std::string> documents[] = {
+      {"tree.xml", Tree()->GetXMLString("")},
+      {"tree.plist", Tree()->GetPListString(true)},
+      {"tree.json", Tree()->GetJSONString()},
+      {"mebibyte.json", MebibyteJSON()},
+  };
+  for (const auto& [name, text] : documents) {
+    std::ofstream out(folder_I + "/" + name, std::ios::binary);
+    out << text;
+    if (!out.flush()) return false;
+  }
+  return true;
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+  if (argc == 3 && std::strcmp(argv[1], "--write-documents") == 0) {
+    return WriteDocuments(argv[2]) ? 0 : 1;
+  }
+  benchmark::Initialize(&argc, argv);
+  if (benchmark::ReportUnrecognizedArguments(argc, argv)) return 1;
+  benchmark::RunSpecifiedBenchmarks();
+  benchmark::Shutdown();
+  return 0;
+}

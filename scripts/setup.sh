@@ -11,7 +11,7 @@ PACKAGES=(
   libudev-dev libusb-1.0-0-dev libftdi1-dev libsystemd-dev
   qt6-base-dev qt6-svg-dev gettext
   umockdev libumockdev-dev libglib2.0-dev edid-decode
-  srecord binutils python3 python3-jsonschema dbus-daemon groff man-db
+  srecord binutils python3 python3-jsonschema dbus-daemon groff man-db time
   openssl
   qemu-system-x86 busybox-static
   udev lintian desktop-file-utils appstream debootstrap

@@ -15,6 +15,9 @@
 //   lets such work finish before it moves time on, for a short real while
 //   at most, so that a wait of 90 passes cannot run out before an event
 //   that is already on its way. The real clock ignores them.
+// - GetTimeWaited() is the clock time during which at least one thread was
+//   asleep, each sleep counted for the time it asked: waits that overlap
+//   count once. On a virtual clock time moves only by sleeps, so it is Now().
 
 #include <functional>
 #include <memory>
@@ -27,6 +30,7 @@ class CClock {
   virtual void Schedule(double delay_I, std::function<void()> task_I) = 0;
   virtual void BeginWork() {}
   virtual void EndWork() {}
+  virtual double GetTimeWaited() const { return Now(); }
 
   // The process-wide clock. Install one before threads start.
   static std::shared_ptr<CClock> Get();

@@ -1,5 +1,6 @@
 #include "common/CSteadyClock.h"
 
+#include <algorithm>
 #include <chrono>
 
 namespace {
@@ -17,7 +18,25 @@ CSteadyClock::~CSteadyClock() {
 }
 
 void CSteadyClock::Sleep(double seconds_I) {
-  if (seconds_I > 0) std::this_thread::sleep_for(Seconds(seconds_I));
+  if (seconds_I <= 0) return;
+  {
+    // Sleeps start in time order under the lock, so the covered time is a
+    // running union: only what reaches past the last end is new.
+    std::lock_guard<std::mutex> guard(mWaitLock);
+    const double start = Now();
+    const double end = start + seconds_I;
+    if (end > mCoveredUntil) {
+      mWaited += end - std::max(start, mCoveredUntil);
+      mCoveredUntil = end;
+    }
+  }
+  std::this_thread::sleep_for(Seconds(seconds_I));
+}
+
+double CSteadyClock::GetTimeWaited() const {
+  std::lock_guard<std::mutex> guard(mWaitLock);
+  // A sleep under way counts only as far as it has come.
+  return mWaited - std::max(0.0, mCoveredUntil - Now());
 }
 
 double CSteadyClock::Now() const {

@@ -19,9 +19,14 @@ class CSteadyClock : public CClock {
   void Sleep(double seconds_I) override;
   double Now() const override;
   void Schedule(double delay_I, std::function<void()> task_I) override;
+  double GetTimeWaited() const override;
 
  private:
   void RunTimer();
+
+  mutable std::mutex mWaitLock;
+  double mWaited = 0.0;
+  double mCoveredUntil = 0.0;  // where the sleeps asked for so far end
 
   std::mutex mLock;
   std::condition_variable mWake;

@@ -21,12 +21,20 @@ int CLabSession::Start() {
     TavLog::Info("Lab fault: %s\n", LabFaultText(fault).c_str());
   }
   mStarted = true;
+  mStartTime = CClock::Get()->Now();
+  mStartWaited = CClock::Get()->GetTimeWaited();
   return loaded;
 }
 
 bool CLabSession::Finish() {
   if (!mStarted) return true;
   mStarted = false;
+  for (const auto& board : mBus->GetBoards()) {
+    TavLog::Info("Lab board %s: %llu reports\n", board->GetName().c_str(),
+                 static_cast<unsigned long long>(board->Faults().GetReportCount()));
+  }
+  TavLog::Info("Lab clock: %.3f s\n", CClock::Get()->Now() - mStartTime);
+  TavLog::Info("Lab waits: %.3f s\n", CClock::Get()->GetTimeWaited() - mStartWaited);
   const bool saved = mBus->SaveState(mOptions.GetStateFolder());
   if (!saved) TavLog::Error("Lab state not saved to %s\n", mOptions.GetStateFolder().c_str());
   return saved;

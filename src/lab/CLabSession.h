@@ -5,6 +5,12 @@
 // changes, as a chip keeps what was programmed into it, so that a second
 // run finds the boards as this one left them, even when this one was
 // killed (an unplugged board as after a power cycle).
+//
+// At its end the run logs what it cost the boards: "Lab board NAME: N
+// reports" for each (every transfer that reached the board, failed or not),
+// "Lab clock: S s", the time the run took on the lab's clock, and "Lab
+// waits: S s", the part of it in which the program was asleep (on the
+// virtual clock, where only sleeps move time, the two agree).
 
 #include <memory>
 
@@ -28,4 +34,6 @@ class CLabSession {
   std::shared_ptr<CLabBus> mBus;
   CLabOptions mOptions;
   bool mStarted = false;
+  double mStartTime = 0.0;
+  double mStartWaited = 0.0;
 };

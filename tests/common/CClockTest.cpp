@@ -50,3 +50,20 @@ TEST(SteadyClock, ScheduleRunsAfterRealDelayAndPendingTasksDieWithTheClock) {
   }
   EXPECT_FALSE(dropped);
 }
+
+// The benchmarks compare a run's wall time with the time it spent waiting:
+// sleeps on two threads at once count once, sleeps one after the other add
+// up, and what a sleep took beyond what it asked is not waiting.
+TEST(SteadyClock, TimeWaitedCountsOverlappingSleepsOnce) {
+  CSteadyClock clock;
+  EXPECT_EQ(clock.GetTimeWaited(), 0.0);
+  std::thread other([&] { clock.Sleep(0.2); });
+  clock.Sleep(0.2);
+  other.join();
+  const double together = clock.GetTimeWaited();
+  EXPECT_GE(together, 0.2);
+  EXPECT_LT(together, 0.3) << "the two sleeps overlapped";
+  clock.Sleep(0.05);
+  clock.Sleep(0.05);
+  EXPECT_NEAR(clock.GetTimeWaited() - together, 0.1, 1e-6);
+}

@@ -17,6 +17,7 @@
 #include "lab/CLabStateFile.h"
 #include "lab/LabCrc.h"
 #include "support/LabFixture.h"
+#include "support/LogCapture.h"
 
 namespace {
 
@@ -305,6 +306,33 @@ TEST_F(LabBus, TheStateFolderCarriesBoardsIntoTheNextRun) {
   EXPECT_TRUE(waitingAgain->GetLoader().IsImageValid());
   ASSERT_EQ(bus->ListInterfaces().size(), 1u);
   EXPECT_EQ(bus->ListInterfaces()[0].info.productId, 0x0302u);
+  std::filesystem::remove_all(folder);
+}
+
+// The summary the benchmarks read: every report that reached a board
+// and the time the run took on the lab's clock.
+TEST_F(LabBus, ASessionEndsWithWhatItCostTheBoards) {
+  const std::filesystem::path folder =
+      std::filesystem::temp_directory_path() / ("tavik-lab-cost-" + std::to_string(::getpid()));
+  auto pen = std::make_shared<CLabPenController>(SLabPenDescription{.name = "counted"});
+  mBus->Plug(pen);
+  CLabOptions options;
+  options.SetStateFolder(folder.string());
+  LogCapture log;
+  {
+    CLabSession session(mBus, options);
+    session.Start();
+    CLabHidNode node(mBus);
+    ASSERT_EQ(node.Open(Listed(*pen)), EHidStatus::eSuccess);
+    Bytes status{0x14, 0, 0, 0, 0};
+    node.GetFeatureReport(status);
+    node.GetFeatureReport(status);
+    node.SetFeatureReport({0xEE});
+    TavSleep(2.5);
+  }
+  EXPECT_TRUE(log.LogContains("Lab board counted: 3 reports\n"));
+  EXPECT_TRUE(log.LogContains("Lab clock: 2.500 s\n"));
+  EXPECT_TRUE(log.LogContains("Lab waits: 2.500 s\n"));
   std::filesystem::remove_all(folder);
 }
 

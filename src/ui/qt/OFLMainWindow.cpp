@@ -4,6 +4,8 @@
 #include <QCloseEvent>
 #include <QMenuBar>
 #include <QMessageBox>
+#include <cstdio>
+#include <cstdlib>
 
 #include "common/OSUtils.h"
 #include "host/CLanguageManager.h"
@@ -25,6 +27,12 @@ OFLMainWindow::OFLMainWindow(QWidget* parent_I) : QMainWindow(parent_I) {
   QAction* about = help->addAction(T("&About"));
   connect(about, &QAction::triggered, this, &OFLMainWindow::ShowAbout);
   mMenus = {file, help};
+  if (std::getenv("TAVIK_REPORT_FIRST_FRAME") != nullptr) {
+    connect(this, &OFLMainWindow::firstFrame, this, [] {
+      std::fputs("first frame\n", stderr);
+      std::fflush(stderr);
+    });
+  }
 }
 
 void OFLMainWindow::SetCloseEnabled(bool enable_I) {
@@ -40,6 +48,16 @@ void OFLMainWindow::SetCloseEnabled(bool enable_I) {
 void OFLMainWindow::closeEvent(QCloseEvent* event_I) {
   event_I->ignore();
   if (mCloseRequest) mCloseRequest();
+}
+
+bool OFLMainWindow::event(QEvent* event_I) {
+  // An update request is where the backing store paints and flushes.
+  const bool handled = QMainWindow::event(event_I);
+  if (event_I->type() == QEvent::UpdateRequest && !mFramed && isVisible()) {
+    mFramed = true;
+    emit firstFrame();
+  }
+  return handled;
 }
 
 void OFLMainWindow::ShowAbout() {

@@ -5,6 +5,7 @@
 #include <QMenu>
 #include <QProgressBar>
 #include <QPushButton>
+#include <QSignalSpy>
 #include <QTest>
 #include <optional>
 
@@ -135,6 +136,21 @@ TEST_F(QtStateTable, FullDialogShowsTheTabletAndHandsTheBoardNameBackUntranslate
   EXPECT_EQ(controller.GetUpdateType(), EUPDATE_TOUCH);
   QTest::keyClick(&boards, Qt::Key_Up);
   EXPECT_EQ(controller.GetUpdateType(), EUPDATE_PEN);
+}
+
+// The start-up benchmark times a run to this signal.
+TEST(QtMainWindow, TellsItsFirstFrameOnceItIsShown) {
+  QtApp();
+  OFLMainWindow window;
+  QSignalSpy frames(&window, &OFLMainWindow::firstFrame);
+  QTest::qWait(20);
+  EXPECT_EQ(frames.count(), 0) << "not shown yet";
+  window.show();
+  EXPECT_TRUE(frames.wait(5000));
+  window.resize(window.width() + 10, window.height());
+  window.update();
+  QTest::qWait(50);
+  EXPECT_EQ(frames.count(), 1);
 }
 
 }  // namespace
