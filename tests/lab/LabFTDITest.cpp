@@ -2,13 +2,12 @@
 // byte strings, for what the link never sends: commands the engine does not
 // know, malformed bus sequences and the violations they leave, the reset
 // and a request with a wrong sum, each board variant's write-protect
-// sequence, pages and CRCs by hand, the state folder, the nak fault, and
-// the lab displays. The link's own traffic over the lab is checked in the
-// scalar tests.
+// sequence by hand, the nak fault, and the lab displays. The link's own
+// traffic over the lab, page programming and the state folder are checked
+// in the scalar tests.
 
 #include <gtest/gtest.h>
 
-#include <filesystem>
 #include <numeric>
 
 #include "lab/CLabDisplays.h"
@@ -143,20 +142,6 @@ class LabFTDI : public LabFixture {
     EXPECT_TRUE(WaitBit(0x6F, 0x04, 0x00));
     return ReadReg(0x75);
   }
-  void ProgramPage(uint32_t address_I, const Bytes& page_I) {
-    WriteReg(0x6D, 0x02);
-    for (uint8_t r : {0x64, 0x65, 0x66})
-      WriteReg(r, static_cast<uint8_t>(address_I >> (8 * (0x66 - r))));
-    ASSERT_TRUE(WaitBit(0x6F, 0x10, 0x10));
-    Start();
-    SendByte(0x94);
-    SendByte(0x70);
-    for (uint8_t byte : page_I) SendByte(byte);
-    Stop();
-    WriteReg(0x6F, 0xA0);
-    ASSERT_TRUE(WaitBit(0x6F, 0x20, 0x00));
-  }
-
   std::shared_ptr<CLabFTDIBridge> mBridge;
   std::unique_ptr<CLabFTDIExAPI32> mApi;
   FT_HANDLE mHandle = nullptr;
@@ -373,61 +358,9 @@ TEST_F(LabFTDIVariant, OnlyEachBoardsOwnSequenceOpensItsFlash) {
   }
 }
 
-TEST_F(LabFTDIVariant, PagesProgramAndTheNewReleaseRunsFromFlashAcrossRuns) {
-  Plug("display-ftdi");
-  Open();
-  EnterIsp();
-  Run(kPlainSequence);
-  WriteStatus(0x00);
-  EraseBlock(0);
-  Bytes page(256);
-  for (size_t i = 0; i < page.size(); ++i) page[i] = static_cast<uint8_t>(i * 7 + 1);
-  const Bytes release{'T', 'A', 'V', 'R', 'E', 'L', 0x10, 0x01};
-  std::copy(release.begin(), release.end(), page.begin() + 16);
-  ProgramPage(0, page);
-  EXPECT_EQ(Crc(0, 256), LabCrc::ScalarBlock(page.data(), 256));
-  ProgramPage(0, page);
-  EXPECT_EQ(mBridge->GetViolations(), std::vector<std::string>{})
-      << "programming the same bits again clears nothing";
-  WriteStatus(0xFF);
-  EXPECT_EQ(mBridge->GetFlash().GetStatus(), 0xFC);
-  EraseBlock(0);
-  EXPECT_EQ(
-      mBridge->GetViolations(),
-      std::vector<std::string>{
-          "display-ftdi-scalar: erase of block at 0x000000 while the flash is write-protected"});
-
-  // Ending ISP mode restarts the scalar from its flash, quiet while it boots.
-  WriteReg(0xEE, 2);
-  EXPECT_FALSE(mBridge->GetMcu().IsInIsp());
-  mClock->Advance(CLabDdcScalar::kBootSeconds);
-  const Bytes version = Exchange({0x6E, 0x51, 0x82, 0x01, 0xC9, 0x75});
-  EXPECT_EQ(Bytes(version.begin() + 7, version.begin() + 9), (Bytes{0x01, 10})) << "release 1.10";
-
-  const std::string folder = testing::TempDir() + "lab-ftdi-state";
-  std::filesystem::remove_all(folder);
-  ASSERT_TRUE(mBus->SaveState(folder));
-  const Bytes flash = mBridge->GetFlash().GetData();
-  mApi.reset();
-  mBus = CLabBus::Create();
-  Plug("display-ftdi");
-  EXPECT_EQ(mBus->LoadState(folder), 2);
-  EXPECT_EQ(mBridge->GetFlash().GetData(), flash);
-  EXPECT_EQ(mBridge->GetFlash().GetStatus(), 0xFC);
-  EXPECT_EQ(mBridge->GetScalar().GetRelease(), 0x0110);
-  std::filesystem::remove_all(folder);
-}
-
 // The other scalar faults are met through the link, in UpdateScalar's
 // tests; a nak fault the link only ever meets as a retry.
 TEST_F(LabFTDI, ANakRefusesOneByteAndTheRestOfItsTransaction) {
-  SLabFault fault;
-  std::string error;
-  for (const char* text : {"nak@2", "stuck-busy", "crc-mismatch@2", "refuse-open"}) {
-    ASSERT_TRUE(ParseLabFault(text, fault, error)) << error;
-    EXPECT_EQ(LabFaultText(fault), text);
-  }
-  EXPECT_FALSE(ParseLabFault("stuck-busy@2", fault, error));
   Plug("display-ftdi");
   Open();
   mBus->AddFaults({SLabFault{ELabFaultKind::eNak, 2, ""}}, 1);

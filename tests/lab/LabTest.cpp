@@ -32,13 +32,14 @@ TEST(LabFaults, ParsingTheCommandLineForm) {
   EXPECT_EQ(fault, (SLabFault{ELabFaultKind::eBadCrc, 3, "bluetooth"}));
   ASSERT_TRUE(ParseLabFault("refuse-switch", fault, error));
   EXPECT_EQ(fault.kind, ELabFaultKind::eRefuseSwitch);
-  for (const char* text : {"fail-read@1", "fail-write@2", "stall@3", "busy@4", "flaky@5",
-                           "refuse-switch:pen", "no-reply@6"}) {
+  for (const char* text :
+       {"fail-read@1", "fail-write@2", "stall@3", "busy@4", "flaky@5", "refuse-switch:pen",
+        "no-reply@6", "nak@2", "stuck-busy", "crc-mismatch@2", "refuse-open"}) {
     ASSERT_TRUE(ParseLabFault(text, fault, error)) << text;
     EXPECT_EQ(LabFaultText(fault), text);
   }
   for (const char* text : {"melt@3", "vanish", "vanish@", "vanish@0", "vanish@x1", "stall@-2",
-                           "refuse-switch@2", "busy@3:", "vanish@99999999999"}) {
+                           "refuse-switch@2", "busy@3:", "vanish@99999999999", "stuck-busy@2"}) {
     error.clear();
     EXPECT_FALSE(ParseLabFault(text, fault, error)) << text;
     EXPECT_FALSE(error.empty()) << text;

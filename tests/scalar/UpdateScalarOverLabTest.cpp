@@ -47,10 +47,13 @@ class CRecorder : public CUpdateNotifier {
   std::mutex mLock;
 };
 
-// Three blocks, each its own pattern, none blank.
+// Three blocks, each its own pattern, none blank; the firmware names
+// release 2.23.
 std::vector<uint8_t> Image() {
   std::vector<uint8_t> image(kBlocks * kBlock);
   for (size_t i = 0; i < image.size(); ++i) image[i] = static_cast<uint8_t>(i * 13 + i / kBlock);
+  const uint8_t release[] = {'T', 'A', 'V', 'R', 'E', 'L', 0x23, 0x02};
+  std::copy(std::begin(release), std::end(release), image.begin() + 16);
   return image;
 }
 
@@ -143,6 +146,7 @@ TEST_F(UpdateScalarOverLab, EachVariantEndsWithTheImageInFlashBlockForBlock) {
     // runs once ISP mode is left.
     EXPECT_EQ(mRecorder.progress, (std::vector<unsigned int>{0, 50, 100, 100}));
     EXPECT_FALSE(bridges[0]->GetMcu().IsInIsp());
+    EXPECT_EQ(bridges[0]->GetScalar().GetRelease(), 0x0223);
     ExpectFlashHoldsImage(*bridges[0]);
     EXPECT_EQ(bridges[0]->GetViolations(), Strings{});
   }
@@ -245,6 +249,7 @@ TEST_F(UpdateScalarOverLab, AnUpdateCutOffMidBlockIsCompletedByTheNextRun) {
   EXPECT_NE(block2(cut), block2(image));
   EXPECT_NE(block2(cut), block2(factory));
   EXPECT_NE(block2(cut), std::vector<uint8_t>(kBlock, 0xFF)) << "cut before any page";
+  const uint8_t status = bridges[0]->GetFlash().GetStatus();
   ASSERT_TRUE(mBus->SaveState(folder));
 
   // The next run: the bus from the state folder, a controller of its own.
@@ -252,6 +257,7 @@ TEST_F(UpdateScalarOverLab, AnUpdateCutOffMidBlockIsCompletedByTheNextRun) {
   bridges = Plug({"display-ftdi"});
   EXPECT_GE(mBus->LoadState(folder), 1);
   EXPECT_EQ(bridges[0]->GetFlash().GetData(), cut);
+  EXPECT_EQ(bridges[0]->GetFlash().GetStatus(), status);
   EXPECT_TRUE(Update(0x0701, "LABFT0701"));
   EXPECT_EQ(mController->GetState(), ESTATE_SUCCESS);
   ExpectFlashHoldsImage(*bridges[0]);
