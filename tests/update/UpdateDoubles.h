@@ -158,10 +158,11 @@ class CFakeRegistry : public CDeviceRegistry {
     if (mWatchReady.valid()) mWatchReady.wait();
     return mCanWatch;
   }
-  void RunWatch(CRegistryWatcher&) override {}
+  void RunWatch(CRegistryWatcher&) override { mWatchRunning = true; }
   void StopWatching() override {}
   std::atomic<bool> mCanWatch{true};     // read by a device thread that may still run
   std::shared_future<void> mWatchReady;  // when set, the watch stands only once it is ready
+  std::atomic<bool> mWatchRunning{false};  // the updater took the watch as standing
   std::vector<SHidEntry> mEntries;
 };
 
