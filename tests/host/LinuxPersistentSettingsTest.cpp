@@ -14,6 +14,7 @@
 #include "platform/linux/CLinuxServiceDirectory.h"
 #include "platform/linux/FakeDataStore.h"
 #include "platform/linux/PrivateBus.h"
+#include "settings/CSettingsMap.h"
 #include "support/LogCapture.h"
 
 namespace fs = std::filesystem;
@@ -78,7 +79,17 @@ TEST_F(LinuxPersistentSettings, ValuesTravelToTheStoreAsTextsUnderKeysWithoutBla
 
   EXPECT_TRUE(settings.SetKeyAndString("Last Path", "/media/fw", "Update History"));
   EXPECT_EQ(settings.GetStringForKey("LastPath", "UpdateHistory"), "/media/fw");
-  EXPECT_EQ(settings.CountKeys("Update History"), 1u);
+  settings.SetKeyAndBool("Silent", true, "Update History");
+  EXPECT_EQ(settings.CountKeys("Update History"), 2u);
+  // A category is one object under its own key; deleting within it answers
+  // whether the key was there and writes nothing back.
+  const auto stored = CSettingsMap::CastToMap(
+      CSettingsObject::ReadFromJSONBuffer(store.Stored("UpdateHistory")), false);
+  ASSERT_NE(stored, nullptr);
+  EXPECT_EQ(stored->StringForKeyWithDefault("LastPath", ""), "/media/fw");
+  EXPECT_TRUE(settings.DeleteKey("Silent", "Update History"));
+  EXPECT_FALSE(settings.DeleteKey("Missing", "Update History"));
+  EXPECT_TRUE(settings.IsKeyPresent("Silent", "Update History"));
   EXPECT_TRUE(settings.DeleteCategory("Update History"));
   EXPECT_FALSE(store.Holds("UpdateHistory"));
 

@@ -7,7 +7,6 @@
 #include "common/CClock.h"
 #include "common/CTavException.h"
 #include "common/CVirtualClock.h"
-#include "host/Category.h"
 #include "host/OPersistentDataStoreClient.h"
 #include "host/OUpdaterClient.h"
 #include "platform/linux/BusDictionary.h"
@@ -15,7 +14,6 @@
 #include "platform/linux/FakeBusService.h"
 #include "platform/linux/FakeDataStore.h"
 #include "platform/linux/PrivateBus.h"
-#include "settings/CSettingsMap.h"
 #include "update/FLAppDelegate.h"
 
 namespace {
@@ -173,29 +171,6 @@ TEST_F(ServiceClients, DataStoreTakesRepliesAndErrorsUserInfoAndThrowsWhenNothin
     EXPECT_EQ(exception.GetMessage(), "silent");
     EXPECT_EQ(exception.GetStatus(), OXPCClient::kObjectNotAvailableStatus);
   }
-}
-
-TEST_F(ServiceClients, CategoryKeepsItsKeysInOneObjectAndDeleteKeyWritesNothingBack) {
-  CFakeDataStore store;
-  ASSERT_TRUE(store.IsReady());
-  const std::shared_ptr<OPersistentDataStoreClient> client = OPersistentDataStoreClient::client();
-  ASSERT_NE(client, nullptr);
-  client->connectToService();
-  const std::unique_ptr<Category> category = client->newCategory("Prefs");
-  EXPECT_EQ(category->count(), 0u);
-
-  category->setData("on", "Logging");
-  category->setData("5", "Level");
-  EXPECT_EQ(category->count(), 2u);
-  EXPECT_EQ(category->copyDataForKey("Level"), std::optional<std::string>("5"));
-  const auto stored =
-      CSettingsMap::CastToMap(CSettingsObject::ReadFromJSONBuffer(store.Stored("Prefs")), false);
-  ASSERT_NE(stored, nullptr);
-  EXPECT_EQ(stored->StringForKeyWithDefault("Logging", ""), "on");
-
-  EXPECT_TRUE(category->deleteKey("Logging"));
-  EXPECT_TRUE(category->hasKey("Logging"));
-  EXPECT_FALSE(category->deleteKey("Missing"));
 }
 
 }  // namespace
