@@ -80,8 +80,9 @@ class CEmulatedUsbBus {
                                             const std::vector<uint8_t>& endpoints_I = {}) {
     std::vector<uint8_t> bytes{0x09, 0x02};
     Le16(bytes, static_cast<uint16_t>(18 + 7 * endpoints_I.size()));
-    bytes.insert(bytes.end(), {0x01, 0x01, 0x00, 0x80, 0x32, 0x09, 0x04, 0x00, 0x00,
-                               static_cast<uint8_t>(endpoints_I.size()), class_I, 0x00, 0x00, 0x00});
+    bytes.insert(bytes.end(),
+                 {0x01, 0x01, 0x00, 0x80, 0x32, 0x09, 0x04, 0x00, 0x00,
+                  static_cast<uint8_t>(endpoints_I.size()), class_I, 0x00, 0x00, 0x00});
     for (uint8_t endpoint : endpoints_I) {
       bytes.insert(bytes.end(), {0x07, 0x05, endpoint, 0x02});
       Le16(bytes, 512);
