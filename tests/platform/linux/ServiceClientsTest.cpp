@@ -9,6 +9,7 @@
 #include "common/CVirtualClock.h"
 #include "host/OPersistentDataStoreClient.h"
 #include "host/OUpdaterClient.h"
+#include "lab/CLabDesktop.h"
 #include "platform/linux/BusDictionary.h"
 #include "platform/linux/CLinuxServiceDirectory.h"
 #include "platform/linux/FakeBusService.h"
@@ -52,29 +53,6 @@ class CFakeHelper {
       SD_BUS_VTABLE_END};
 
   CFakeBusService mService;
-};
-
-// Sees which applications the driver stop goes on to.
-class CRecordingDesktop : public CDesktop {
- public:
-  int GetLaunchSenderPid() override { return 0; }
-  int GetOwnPid() override { return 1; }
-  std::string GetApplicationIdOfProcess(int) override { return {}; }
-  std::string GetExecutableOfProcess(int) override { return {}; }
-  bool IsApplicationProcess(int) override { return false; }
-  int GetProcessArgumentCount() override { return 1; }
-  std::string GetApplicationPath(const std::string&) override { return {}; }
-  std::vector<int> RunningApplications(const std::string& id_I) override {
-    asked.push_back(id_I);
-    return {};
-  }
-  bool TerminateApplication(int) override { return false; }
-  bool IsTerminated(int) override { return true; }
-  int LaunchApplication(const SLaunchRequest&) override { return 0; }
-  void PostNotification(const SNotification&) override {}
-  bool ObserveNotifications(std::function<void(const SNotification&)>) override { return true; }
-  bool RequestHidAccess() override { return true; }
-  Strings asked;
 };
 
 class ServiceClients : public ::testing::Test {
@@ -131,14 +109,15 @@ TEST_F(ServiceClients, AHelperThatNeverAnswersCostsHalfASecondACallAndTheDriverS
   EXPECT_LT(waited, 1.5);
 
   // Two calls of half a second, the six seconds the services get to stop,
-  // then the applications.
+  // then each of the three applications quit, with two seconds to go.
   auto clock = std::make_shared<CVirtualClock>();
   CClock::Set(clock);
-  CRecordingDesktop desktop;
+  CLabDesktop desktop;
   FLAppDelegate::stopDriver(desktop);
-  EXPECT_NEAR(clock->GetTotalSlept(), 7.0, 0.01);
-  EXPECT_EQ(desktop.asked, (Strings{"com.tavik.taviktablet", "com.tavik.TabletDriver",
-                                    "com.tavik.TavikTouchDriver"}));
+  EXPECT_NEAR(clock->GetTotalSlept(), 13.0, 0.01);
+  for (const char* application : CLabDesktop::kApplications) {
+    EXPECT_TRUE(desktop.RunningApplications(application).empty()) << application;
+  }
 }
 
 TEST_F(ServiceClients, DataStoreTakesRepliesAndErrorsUserInfoAndThrowsWhenNothingComes) {
