@@ -304,8 +304,11 @@ TEST_F(Umockdev, HidrawNodesAreFoundLockedAndSpokenToThroughIoctls) {
   EXPECT_EQ(read, (Bytes{0x14, 1, 2, 3, 4}));
   EXPECT_EQ(ioctls.seen, (std::vector<Bytes>{{0x02, 0x00}, {0x14, 0, 0, 0, 0}}));
 
-  const std::pair<int, EHidStatus> errors[] = {
-      {EPIPE, EHidStatus::eStall}, {EBUSY, EHidStatus::eBusy}, {ENODEV, EHidStatus::eGone}};
+  // Any other error, such as the EIO a uhid device gives, is no stall.
+  const std::pair<int, EHidStatus> errors[] = {{EPIPE, EHidStatus::eStall},
+                                               {EBUSY, EHidStatus::eBusy},
+                                               {ENODEV, EHidStatus::eGone},
+                                               {EIO, EHidStatus::eOther}};
   for (const auto& [error, status] : errors) {
     ioctls.answer = [error](Bytes&) { return error; };
     EXPECT_EQ(hid.SetFeatureReport({0x55, 1}), status) << error;

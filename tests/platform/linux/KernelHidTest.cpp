@@ -97,26 +97,6 @@ TEST_F(KernelHid, RegistryListsAUsblessHidDeviceAndWatchesItComeAndGo) {
   EXPECT_NE(again.locationId, entry.info.locationId) << "a new HID device, a new place";
 }
 
-TEST_F(KernelHid, FeatureReportsCrossTheHidCoreAndErrorsComeBackAsTheKernelGivesThem) {
-  SHidEntry entry;
-  ASSERT_TRUE(WaitForEntry(kNormal, entry));
-  CLinuxHidNode node(mRegistry);
-  ASSERT_EQ(node.Open(entry.info), EHidStatus::eSuccess);
-  EXPECT_EQ(node.SetFeatureReport({0x02, 0x00}), EHidStatus::eSuccess);
-  ASSERT_FALSE(mPen->GetTrace().empty());
-  EXPECT_EQ(mPen->GetTrace().back().bytes, (Bytes{0x02, 0x00})) << "the id travels in byte 0";
-
-  // The normal firmware stalls a loader report; through uhid that is EIO,
-  // not the stall a USB device gives.
-  Bytes status{0x14, 0, 0, 0, 0};
-  EXPECT_EQ(node.GetFeatureReport(status), EHidStatus::eOther);
-
-  // Unplugged under an open node: ENODEV, gone.
-  mDevice.reset();
-  EXPECT_EQ(node.GetFeatureReport(status), EHidStatus::eGone);
-  EXPECT_EQ(node.SetFeatureReport({0x02, 0x00}), EHidStatus::eGone);
-}
-
 TEST_F(KernelHid, PenUpdateThroughTheLoaderAndBack) {
   SHidEntry normal;
   ASSERT_TRUE(WaitForEntry(kNormal, normal));
