@@ -198,7 +198,7 @@ class UpdateHelper : public ::testing::Test {
   pid_t mHelper = -1;
 };
 
-TEST_F(UpdateHelper, AnAuthorisedCallerStopsAndStartsTheConfiguredUnitsAndProcesses) {
+TEST_F(UpdateHelper, AnAuthorisedCallerStopsAndStartsTheConfiguredUnitsAndProcessesAndFindsUsers) {
   const pid_t driver = StartProcess(mFolder / "tavik-test-driver");
   const pid_t stranger = StartProcess("/bin/sleep");
   const CXPCDictionary agents{{"LaunchAgents", Strings{kAgent}}, {"User", Strings{"1000"}}};
@@ -227,6 +227,23 @@ TEST_F(UpdateHelper, AnAuthorisedCallerStopsAndStartsTheConfiguredUnitsAndProces
   kill(stranger, SIGKILL);
   waitpid(stranger, nullptr, 0);
   EXPECT_NE(Log().find("update-helper.conf:6: not understood"), std::string::npos);
+
+  // The users logind knows.
+  Strings expected;
+  std::error_code code;
+  for (const auto& entry : fs::directory_iterator("/run/systemd/users", code)) {
+    const std::string name = entry.path().filename().string();
+    if (name.find_first_not_of("0123456789") == std::string::npos) expected.push_back(name);
+  }
+  const SAnswer answer = Ask("findLoggedInUsersWithReply:", nullptr);
+  EXPECT_FALSE(answer.error);
+  EXPECT_EQ(answer.Code(), 0);
+  ASSERT_NE(answer.body, nullptr);
+  ASSERT_NE(answer.body->Get<Strings>("Users"), nullptr);
+  Strings users = *answer.body->Get<Strings>("Users");
+  std::sort(users.begin(), users.end());
+  std::sort(expected.begin(), expected.end());
+  EXPECT_EQ(users, expected);
 }
 
 TEST_F(UpdateHelper, ACallerPolkitRefusesGetsAnErrorAndNothingStops) {
@@ -324,24 +341,6 @@ TEST_F(UpdateHelper, StartProcessStartsOnlyAConfiguredExecutableAndAsTheCaller) 
   ASSERT_EQ(startAsNobody(kDriver), 0) << Log();
   EXPECT_TRUE(TavPollUntil(5.0, 0.01, [&] { return !ReadFile(started).empty(); }));
   EXPECT_EQ(ReadFile(started), "65534\n");
-}
-
-TEST_F(UpdateHelper, FindLoggedInUsersAnswersTheUsersLogindKnows) {
-  Strings expected;
-  std::error_code code;
-  for (const auto& entry : fs::directory_iterator("/run/systemd/users", code)) {
-    const std::string name = entry.path().filename().string();
-    if (name.find_first_not_of("0123456789") == std::string::npos) expected.push_back(name);
-  }
-  const SAnswer answer = Ask("findLoggedInUsersWithReply:", nullptr);
-  EXPECT_FALSE(answer.error);
-  EXPECT_EQ(answer.Code(), 0);
-  ASSERT_NE(answer.body, nullptr);
-  ASSERT_NE(answer.body->Get<Strings>("Users"), nullptr);
-  Strings users = *answer.body->Get<Strings>("Users");
-  std::sort(users.begin(), users.end());
-  std::sort(expected.begin(), expected.end());
-  EXPECT_EQ(users, expected);
 }
 
 // The installed helper, started by the bus on the updater's first call.

@@ -53,26 +53,42 @@ class CEmulatedUsbBus {
     return path;
   }
 
-  // A device libusb can open, with its node, device number and one
-  // interface of `interfaceClass_I`. Returns the node.
+  // A device libusb can open: its usbfs node /dev/bus/usb/001/<devnum_I>,
+  // its device descriptor and `config_I`, one configuration as
+  // Configuration makes it. Returns the node.
   std::string AddUsbfsDevice(const std::string& parentPath_I, const std::string& devpath_I,
-                             uint32_t productId_I, unsigned devnum_I, uint8_t interfaceClass_I) {
+                             unsigned devnum_I, uint16_t vendorId_I, uint16_t productId_I,
+                             uint16_t release_I, const std::vector<uint8_t>& config_I) {
     char node[32];
     std::snprintf(node, sizeof(node), "/dev/bus/usb/001/%03u", devnum_I);
-    // Device descriptor, then one configuration with one interface.
-    std::vector<uint8_t> descriptors{0x12, 0x01, 0x00, 0x02, 0x00, 0x00, 0x00, 0x40, 0x71,
-                                     0x7A, 0x00, 0x00, 0x10, 0x02, 0x01, 0x02, 0x00, 0x01,
-                                     0x09, 0x02, 0x12, 0x00, 0x01, 0x01, 0x00, 0x80, 0x32,
-                                     0x09, 0x04, 0x00, 0x00, 0x00, 0x00, 0x00, 0x00, 0x00};
-    descriptors[10] = static_cast<uint8_t>(productId_I);
-    descriptors[11] = static_cast<uint8_t>(productId_I >> 8);
-    descriptors[32] = interfaceClass_I;
+    std::vector<uint8_t> descriptors{0x12, 0x01, 0x00, 0x02, 0x00, 0x00, 0x00, 0x40};
+    for (uint16_t word : {vendorId_I, productId_I, release_I}) Le16(descriptors, word);
+    descriptors.insert(descriptors.end(), {0x00, 0x00, 0x00, 0x01});
+    descriptors.insert(descriptors.end(), config_I.begin(), config_I.end());
+    const std::string number = std::to_string(devnum_I);
     Add("P: " + parentPath_I + "/1-" + devpath_I + "\nN: " + std::string(node + 5) +
         "=00\nE: SUBSYSTEM=usb\nE: DEVTYPE=usb_device\nE: DRIVER=usb\nE: BUSNUM=001\nE: DEVNAME=" +
-        node + "\n" + UsbAttributes(0x7A71, productId_I, 0x0210, 1, devpath_I) +
-        "A: devnum=" + std::to_string(devnum_I) + "\nA: speed=480\nA: bConfigurationValue=1\n" +
-        "A: dev=189:" + std::to_string(devnum_I) + "\nH: descriptors=" + Hex(descriptors) + "\n");
+        node + "\n" + UsbAttributes(vendorId_I, productId_I, release_I, 1, devpath_I) +
+        "A: devnum=" + number + "\nA: speed=480\nA: bConfigurationValue=1\nA: dev=189:" + number +
+        "\nH: descriptors=" + Hex(descriptors) + "\n");
     return node;
+  }
+
+  // One configuration with one interface of `class_I` and bulk endpoints
+  // of 512-byte packets at the addresses `endpoints_I`.
+  static std::vector<uint8_t> Configuration(uint8_t class_I,
+                                            const std::vector<uint8_t>& endpoints_I = {}) {
+    std::vector<uint8_t> bytes{0x09, 0x02};
+    Le16(bytes, static_cast<uint16_t>(18 + 7 * endpoints_I.size()));
+    bytes.insert(bytes.end(),
+                 {0x01, 0x01, 0x00, 0x80, 0x32, 0x09, 0x04, 0x00, 0x00,
+                  static_cast<uint8_t>(endpoints_I.size()), class_I, 0x00, 0x00, 0x00});
+    for (uint8_t endpoint : endpoints_I) {
+      bytes.insert(bytes.end(), {0x07, 0x05, endpoint, 0x02});
+      Le16(bytes, 512);
+      bytes.push_back(0x00);
+    }
+    return bytes;
   }
 
   SHidNode AddHidInterface(const std::string& usbPath_I, unsigned interface_I,
@@ -138,6 +154,11 @@ class CEmulatedUsbBus {
   }
 
  private:
+  static void Le16(std::vector<uint8_t>& bytes_IO, uint16_t value_I) {
+    bytes_IO.push_back(static_cast<uint8_t>(value_I));
+    bytes_IO.push_back(static_cast<uint8_t>(value_I >> 8));
+  }
+
   // An empty descriptor leaves the attribute out, as if it could not be read.
   void AddHidAndNode(const SHidNode& node_I, unsigned hidrawIndex_I,
                      const std::vector<uint8_t>& descriptor_I, const std::string& more_I = "") {

@@ -14,6 +14,7 @@
 #include "host/ProcessUtils.h"
 #include "platform/linux/CDesktopEntries.h"
 #include "platform/linux/CLinuxDesktop.h"
+#include "platform/linux/CListedRegistry.h"
 
 namespace {
 
@@ -199,26 +200,13 @@ TEST_F(LinuxDesktop, LaunchCountsOnceTheApplicationShowsWithinAboutASecond) {
   OProcessUtils::SetDesktop(nullptr);
 }
 
-class CListRegistry : public CDeviceRegistry {
- public:
-  std::vector<std::string> nodes;
-  std::vector<SHidEntry> ListHidInterfaces(uint32_t) override {
-    std::vector<SHidEntry> entries;
-    for (const std::string& node : nodes) entries.push_back({{0x7A5D, 1, 1, 1, 0xFF00}, node});
-    return entries;
-  }
-  std::vector<SUsbEntry> ListUsbDevices(uint32_t) override { return {}; }
-  bool OpenWatch() override { return false; }
-  void RunWatch(CRegistryWatcher&) override {}
-  void StopWatching() override {}
-};
-
 TEST_F(LinuxDesktop, AccessIsRefusedOnlyForNodesThisUserMayNotOpen) {
-  auto registry = std::make_shared<CListRegistry>();
+  auto registry = std::make_shared<CListedRegistry>();
   CLinuxDesktop desktop(registry);
   EXPECT_TRUE(desktop.RequestHidAccess());  // no tablet: nothing refused
   std::ofstream(mFolder / "hidraw0") << "";
-  registry->nodes = {(mFolder / "hidraw0").string(), (mFolder / "gone").string()};
+  const DeviceInfo tablet{0x7A5D, 1, 1, 1, 0xFF00};
+  registry->hid = {{tablet, (mFolder / "hidraw0").string()}, {tablet, (mFolder / "gone").string()}};
   EXPECT_TRUE(desktop.RequestHidAccess());
 
   // A node this user may not open. Root may open anything, so as root the
@@ -226,7 +214,7 @@ TEST_F(LinuxDesktop, AccessIsRefusedOnlyForNodesThisUserMayNotOpen) {
   const fs::path locked = fs::path("/tmp") / ("tavik-hid-" + std::to_string(getpid()));
   std::ofstream(locked) << "";
   chmod(locked.c_str(), 0);
-  registry->nodes = {locked.string()};
+  registry->hid = {{tablet, locked.string()}};
   const pid_t child = fork();
   ASSERT_GE(child, 0);
   if (child == 0) {

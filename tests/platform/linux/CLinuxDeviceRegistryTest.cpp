@@ -6,13 +6,10 @@
 #include <linux/ioctl.h>
 #include <linux/usbdevice_fs.h>
 
-#include <chrono>
-#include <condition_variable>
 #include <cstddef>
 #include <cstdio>
 #include <functional>
 #include <memory>
-#include <mutex>
 #include <thread>
 #include <tuple>
 #include <vector>
@@ -21,6 +18,7 @@
 #include "platform/linux/CLinuxDeviceRegistry.h"
 #include "platform/linux/CLinuxHidNode.h"
 #include "platform/linux/CLinuxUsbControl.h"
+#include "platform/linux/CRecordingWatcher.h"
 
 namespace {
 
@@ -63,36 +61,6 @@ class CLinuxDeviceRegistryTest : public ::testing::Test {
 
   std::unique_ptr<CEmulatedUsbBus> mBus;
   std::string mRootHub;
-};
-
-// Records watch events and lets the test wait for them.
-class CRecordingWatcher : public CRegistryWatcher {
- public:
-  struct SEvent {
-    bool added;
-    DeviceInfo info;
-    bool operator==(const SEvent&) const = default;
-  };
-
-  void DeviceAdded(const DeviceInfo& info_I) override { Record({true, info_I}); }
-  void DeviceRemoved(const DeviceInfo& info_I) override { Record({false, info_I}); }
-
-  std::vector<SEvent> WaitFor(size_t count_I) {
-    std::unique_lock<std::mutex> lock(mLock);
-    mChanged.wait_for(lock, std::chrono::seconds(5), [&] { return mEvents.size() >= count_I; });
-    return mEvents;
-  }
-
- private:
-  void Record(const SEvent& event_I) {
-    std::lock_guard<std::mutex> lock(mLock);
-    mEvents.push_back(event_I);
-    mChanged.notify_all();
-  }
-
-  std::mutex mLock;
-  std::condition_variable mChanged;
-  std::vector<SEvent> mEvents;
 };
 
 using Bytes = std::vector<uint8_t>;
@@ -336,8 +304,11 @@ TEST_F(Umockdev, HidrawNodesAreFoundLockedAndSpokenToThroughIoctls) {
   EXPECT_EQ(read, (Bytes{0x14, 1, 2, 3, 4}));
   EXPECT_EQ(ioctls.seen, (std::vector<Bytes>{{0x02, 0x00}, {0x14, 0, 0, 0, 0}}));
 
-  const std::pair<int, EHidStatus> errors[] = {
-      {EPIPE, EHidStatus::eStall}, {EBUSY, EHidStatus::eBusy}, {ENODEV, EHidStatus::eGone}};
+  // Any other error, such as the EIO a uhid device gives, is no stall.
+  const std::pair<int, EHidStatus> errors[] = {{EPIPE, EHidStatus::eStall},
+                                               {EBUSY, EHidStatus::eBusy},
+                                               {ENODEV, EHidStatus::eGone},
+                                               {EIO, EHidStatus::eOther}};
   for (const auto& [error, status] : errors) {
     ioctls.answer = [error](Bytes&) { return error; };
     EXPECT_EQ(hid.SetFeatureReport({0x55, 1}), status) << error;
@@ -348,9 +319,13 @@ TEST_F(Umockdev, HidrawNodesAreFoundLockedAndSpokenToThroughIoctls) {
 }
 
 TEST_F(Umockdev, ControlTransfersGoThroughLibusbToTheVendorInterface) {
-  const std::string node = mBus->AddUsbfsDevice(mRootHub, "3", 0x0311, 2, 0xFF);
-  CIoctlNode ioctls(*mBus, node, true);
-  CIoctlNode hidOnlyIoctls(*mBus, mBus->AddUsbfsDevice(mRootHub, "4", 0x0312, 3, 0x03), true);
+  const auto addDevice = [&](const char* devpath_I, unsigned devnum_I, uint16_t product_I,
+                             uint8_t class_I) {
+    return mBus->AddUsbfsDevice(mRootHub, devpath_I, devnum_I, 0x7A71, product_I, 0x0210,
+                                CEmulatedUsbBus::Configuration(class_I));
+  };
+  CIoctlNode ioctls(*mBus, addDevice("3", 2, 0x0311, 0xFF), true);
+  CIoctlNode hidOnlyIoctls(*mBus, addDevice("4", 3, 0x0312, 0x03), true);
   ioctls.answer = [](Bytes& request_IO) {
     if (request_IO[1] == 0x77) return EPIPE;
     if (request_IO[0] & 0x80) {

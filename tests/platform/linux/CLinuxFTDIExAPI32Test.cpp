@@ -98,18 +98,6 @@ class LinuxFTDI : public LabFixture {
   FT_HANDLE mHandle = nullptr;
 };
 
-TEST_F(LinuxFTDI, TheBridgeIsListedByItsLocation) {
-  uint32_t count = 0;
-  ASSERT_EQ(mApi->FT_ListDevices(&count, nullptr, FT_LIST_NUMBER_ONLY), FT_OK);
-  EXPECT_EQ(count, 1u);
-  uint32_t location = 0;
-  ASSERT_EQ(mApi->FT_ListDevices(ByValue(0), &location, FT_LIST_BY_INDEX | FT_OPEN_BY_LOCATION),
-            FT_OK);
-  EXPECT_EQ(location, kLocation) << "the registry's rule for bus 1, ports 1.5";
-  EXPECT_EQ(mApi->FT_ListDevices(ByValue(1), &location, FT_LIST_BY_INDEX | FT_OPEN_BY_LOCATION),
-            FT_DEVICE_NOT_FOUND);
-}
-
 TEST_F(LinuxFTDI, ReadsTimeOutShortAndTheBridgeServesOneHandle) {
   Open();
   ASSERT_EQ(mApi->FT_SetTimeouts(mHandle, 50, 50), FT_OK);
@@ -137,7 +125,17 @@ TEST_F(LinuxFTDI, ReadsTimeOutShortAndTheBridgeServesOneHandle) {
   EXPECT_EQ(mApi->FT_SetUSBParameters(mHandle, 65536, 100), FT_INVALID_PARAMETER);
 }
 
-TEST_F(LinuxFTDI, FailedTransfersGiveIOErrorsAndAnUnpluggedBridgeIsNoLongerFound) {
+TEST_F(LinuxFTDI, ListedByLocationFailedTransfersGiveIOErrorsAndUnpluggedItIsNoLongerFound) {
+  uint32_t count = 0;
+  ASSERT_EQ(mApi->FT_ListDevices(&count, nullptr, FT_LIST_NUMBER_ONLY), FT_OK);
+  EXPECT_EQ(count, 1u);
+  uint32_t location = 0;
+  ASSERT_EQ(mApi->FT_ListDevices(ByValue(0), &location, FT_LIST_BY_INDEX | FT_OPEN_BY_LOCATION),
+            FT_OK);
+  EXPECT_EQ(location, kLocation) << "the registry's rule for bus 1, ports 1.5";
+  EXPECT_EQ(mApi->FT_ListDevices(ByValue(1), &location, FT_LIST_BY_INDEX | FT_OPEN_BY_LOCATION),
+            FT_DEVICE_NOT_FOUND);
+
   Open();
   // A transfer the bridge fails is an I/O error; the handle goes on.
   mBus->AddFaults({SLabFault{ELabFaultKind::eFailWrite, 1, ""}}, 1);
@@ -154,7 +152,6 @@ TEST_F(LinuxFTDI, FailedTransfersGiveIOErrorsAndAnUnpluggedBridgeIsNoLongerFound
   EXPECT_EQ(mApi->FT_GetQueueStatus(mHandle, &waiting), FT_IO_ERROR);
 
   mUsb->Unplug();
-  uint32_t count = 1;
   ASSERT_EQ(mApi->FT_ListDevices(&count, nullptr, FT_LIST_NUMBER_ONLY), FT_OK);
   EXPECT_EQ(count, 0u);
   FT_HANDLE again = nullptr;

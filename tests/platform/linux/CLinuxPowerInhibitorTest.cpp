@@ -3,11 +3,10 @@
 #include <poll.h>
 #include <systemd/sd-bus.h>
 
-#include <atomic>
-#include <thread>
 #include <vector>
 
 #include "platform/linux/CLinuxPowerInhibitor.h"
+#include "platform/linux/FakeBusService.h"
 #include "platform/linux/PrivateBus.h"
 
 namespace {
@@ -18,31 +17,17 @@ class CFakeLogind {
  public:
   enum class EMode { kGrant, kRefuse, kRefuseShutdown };
 
-  explicit CFakeLogind(EMode mode_I) : mMode(mode_I) {
-    if (sd_bus_open_system(&mBus) < 0) return;
-    static const sd_bus_vtable kVtable[] = {
-        SD_BUS_VTABLE_START(0),
-        SD_BUS_METHOD("Inhibit", "ssss", "h", &CFakeLogind::OnInhibit, SD_BUS_VTABLE_UNPRIVILEGED),
-        SD_BUS_VTABLE_END};
-    sd_bus_add_object_vtable(mBus, nullptr, "/org/freedesktop/login1",
-                             "org.freedesktop.login1.Manager", kVtable, this);
-    mReady = sd_bus_request_name(mBus, "org.freedesktop.login1", 0) >= 0;
-    mThread = std::thread([this] {
-      while (!mStop) {
-        if (sd_bus_process(mBus, nullptr) > 0) continue;
-        sd_bus_wait(mBus, 50 * 1000);
-      }
-    });
-  }
+  explicit CFakeLogind(EMode mode_I)
+      : mMode(mode_I),
+        mService("org.freedesktop.login1", "/org/freedesktop/login1",
+                 "org.freedesktop.login1.Manager", kVtable, this) {}
   ~CFakeLogind() {
-    mStop = true;
-    if (mThread.joinable()) mThread.join();
     for (int fd : mReadEnds) close(fd);
-    sd_bus_flush_close_unref(mBus);
   }
 
-  bool IsReady() const { return mReady; }
-  std::vector<std::vector<std::string>> Calls() const { return mCalls; }
+  bool IsReady() const { return mService.IsReady(); }
+  // Each call as "<what> <who> <why> <mode>".
+  std::vector<std::string> Calls() { return mService.Records(); }
   std::vector<int> ReadEnds() const { return mReadEnds; }
 
  private:
@@ -50,7 +35,7 @@ class CFakeLogind {
     auto* self = static_cast<CFakeLogind*>(self_I);
     const char *what = nullptr, *who = nullptr, *why = nullptr, *mode = nullptr;
     sd_bus_message_read(message_I, "ssss", &what, &who, &why, &mode);
-    self->mCalls.push_back({what, who, why, mode});
+    self->mService.Record(std::string(what) + " " + who + " " + why + " " + mode);
     if (self->mMode == EMode::kRefuse ||
         (self->mMode == EMode::kRefuseShutdown && std::string(what) == "shutdown")) {
       return sd_bus_error_set(error_O, SD_BUS_ERROR_ACCESS_DENIED, "not for you");
@@ -63,13 +48,14 @@ class CFakeLogind {
     return status;
   }
 
+  static constexpr sd_bus_vtable kVtable[] = {
+      SD_BUS_VTABLE_START(0),
+      SD_BUS_METHOD("Inhibit", "ssss", "h", &CFakeLogind::OnInhibit, SD_BUS_VTABLE_UNPRIVILEGED),
+      SD_BUS_VTABLE_END};
+
   EMode mMode;
-  sd_bus* mBus = nullptr;
-  bool mReady = false;
-  std::atomic<bool> mStop{false};
-  std::thread mThread;
-  std::vector<std::vector<std::string>> mCalls;
   std::vector<int> mReadEnds;
+  CFakeBusService mService;
 };
 
 TEST(LinuxPowerInhibitor, HoldsIdleAndShutdownLocksUntilTheAssertionGoesAndIsRefusedOnlyByLogind) {
@@ -83,9 +69,9 @@ TEST(LinuxPowerInhibitor, HoldsIdleAndShutdownLocksUntilTheAssertionGoesAndIsRef
     ASSERT_NE(assertion, nullptr);
     // Idle sleep blocked, and a shutdown delayed until the update lets go.
     EXPECT_EQ(logind.Calls(),
-              (std::vector<std::vector<std::string>>{
-                  {"idle:sleep", "tavik-fwupdater", "Updating Tavik tablet firmware", "block"},
-                  {"shutdown", "tavik-fwupdater", "Updating Tavik tablet firmware", "delay"}}));
+              (std::vector<std::string>{
+                  "idle:sleep tavik-fwupdater Updating Tavik tablet firmware block",
+                  "shutdown tavik-fwupdater Updating Tavik tablet firmware delay"}));
     ASSERT_EQ(logind.ReadEnds().size(), 2u);
     for (int readEnd : logind.ReadEnds()) {
       pollfd entry{readEnd, POLLIN, 0};

@@ -51,8 +51,6 @@ class CUhidLabDevice {
   CUhidLabDevice& operator=(const CUhidLabDevice&) = delete;
 
   bool IsOpen() const { return mFd >= 0; }
-  // How many uhid devices this object has created so far.
-  int GetCreatedCount() const { return mCreated; }
 
   // The report descriptor of `interfaces_I`: per usage pair one application
   // collection holding one 8-bit feature field.
@@ -132,7 +130,6 @@ class CUhidLabDevice {
     }
     mInterfaces = now;
     mShowing = true;
-    ++mCreated;
   }
 
   void Destroy() {
@@ -185,5 +182,4 @@ class CUhidLabDevice {
   bool mShowing = false;
   std::vector<SLabInterface> mInterfaces;
   CLabBus::SBinding mBinding;
-  std::atomic<int> mCreated{0};
 };

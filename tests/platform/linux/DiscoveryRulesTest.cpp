@@ -7,38 +7,11 @@
 #include "firmware/FirmwareFiles.h"
 #include "platform/linux/CLinuxDiscovery.h"
 #include "platform/linux/CLinuxHIDFLDeviceInterface.h"
+#include "platform/linux/CListedRegistry.h"
 
 namespace {
 
 using DevicePtr = std::shared_ptr<CDevice>;
-
-class CListedRegistry : public CDeviceRegistry {
- public:
-  std::vector<SHidEntry> ListHidInterfaces(uint32_t vendorId_I) override {
-    std::vector<SHidEntry> entries;
-    for (const SHidEntry& entry : hid) {
-      if (vendorId_I == 0 || entry.info.vendorId == vendorId_I) entries.push_back(entry);
-    }
-    return entries;
-  }
-  std::vector<SUsbEntry> ListUsbDevices(uint32_t vendorId_I) override {
-    std::vector<SUsbEntry> entries;
-    for (const SUsbEntry& entry : usb) {
-      if (vendorId_I == 0 || entry.vendorId == vendorId_I) entries.push_back(entry);
-    }
-    return entries;
-  }
-  bool OpenWatch() override { return false; }
-  void RunWatch(CRegistryWatcher&) override {}
-  void StopWatching() override {}
-
-  void AddHid(const DeviceInfo& info_I, uint32_t parentVendor_I = 0, uint32_t parentProduct_I = 0) {
-    hid.push_back(SHidEntry{info_I, "node", 0, parentVendor_I, parentProduct_I});
-  }
-
-  std::vector<SHidEntry> hid;
-  std::vector<SUsbEntry> usb;
-};
 
 // Bus 1, hub on root port 1, board on hub port `port_I`.
 uint32_t BehindHub(unsigned port_I) { return 0x01100000u | (port_I << 16); }

@@ -7,15 +7,14 @@
 #include "common/CClock.h"
 #include "common/CTavException.h"
 #include "common/CVirtualClock.h"
-#include "host/Category.h"
 #include "host/OPersistentDataStoreClient.h"
 #include "host/OUpdaterClient.h"
+#include "lab/CLabDesktop.h"
 #include "platform/linux/BusDictionary.h"
 #include "platform/linux/CLinuxServiceDirectory.h"
 #include "platform/linux/FakeBusService.h"
 #include "platform/linux/FakeDataStore.h"
 #include "platform/linux/PrivateBus.h"
-#include "settings/CSettingsMap.h"
 #include "update/FLAppDelegate.h"
 
 namespace {
@@ -54,29 +53,6 @@ class CFakeHelper {
       SD_BUS_VTABLE_END};
 
   CFakeBusService mService;
-};
-
-// Sees which applications the driver stop goes on to.
-class CRecordingDesktop : public CDesktop {
- public:
-  int GetLaunchSenderPid() override { return 0; }
-  int GetOwnPid() override { return 1; }
-  std::string GetApplicationIdOfProcess(int) override { return {}; }
-  std::string GetExecutableOfProcess(int) override { return {}; }
-  bool IsApplicationProcess(int) override { return false; }
-  int GetProcessArgumentCount() override { return 1; }
-  std::string GetApplicationPath(const std::string&) override { return {}; }
-  std::vector<int> RunningApplications(const std::string& id_I) override {
-    asked.push_back(id_I);
-    return {};
-  }
-  bool TerminateApplication(int) override { return false; }
-  bool IsTerminated(int) override { return true; }
-  int LaunchApplication(const SLaunchRequest&) override { return 0; }
-  void PostNotification(const SNotification&) override {}
-  bool ObserveNotifications(std::function<void(const SNotification&)>) override { return true; }
-  bool RequestHidAccess() override { return true; }
-  Strings asked;
 };
 
 class ServiceClients : public ::testing::Test {
@@ -133,14 +109,15 @@ TEST_F(ServiceClients, AHelperThatNeverAnswersCostsHalfASecondACallAndTheDriverS
   EXPECT_LT(waited, 1.5);
 
   // Two calls of half a second, the six seconds the services get to stop,
-  // then the applications.
+  // then each of the three applications quit, with two seconds to go.
   auto clock = std::make_shared<CVirtualClock>();
   CClock::Set(clock);
-  CRecordingDesktop desktop;
+  CLabDesktop desktop;
   FLAppDelegate::stopDriver(desktop);
-  EXPECT_NEAR(clock->GetTotalSlept(), 7.0, 0.01);
-  EXPECT_EQ(desktop.asked, (Strings{"com.tavik.taviktablet", "com.tavik.TabletDriver",
-                                    "com.tavik.TavikTouchDriver"}));
+  EXPECT_NEAR(clock->GetTotalSlept(), 13.0, 0.01);
+  for (const char* application : CLabDesktop::kApplications) {
+    EXPECT_TRUE(desktop.RunningApplications(application).empty()) << application;
+  }
 }
 
 TEST_F(ServiceClients, DataStoreTakesRepliesAndErrorsUserInfoAndThrowsWhenNothingComes) {
@@ -173,29 +150,6 @@ TEST_F(ServiceClients, DataStoreTakesRepliesAndErrorsUserInfoAndThrowsWhenNothin
     EXPECT_EQ(exception.GetMessage(), "silent");
     EXPECT_EQ(exception.GetStatus(), OXPCClient::kObjectNotAvailableStatus);
   }
-}
-
-TEST_F(ServiceClients, CategoryKeepsItsKeysInOneObjectAndDeleteKeyWritesNothingBack) {
-  CFakeDataStore store;
-  ASSERT_TRUE(store.IsReady());
-  const std::shared_ptr<OPersistentDataStoreClient> client = OPersistentDataStoreClient::client();
-  ASSERT_NE(client, nullptr);
-  client->connectToService();
-  const std::unique_ptr<Category> category = client->newCategory("Prefs");
-  EXPECT_EQ(category->count(), 0u);
-
-  category->setData("on", "Logging");
-  category->setData("5", "Level");
-  EXPECT_EQ(category->count(), 2u);
-  EXPECT_EQ(category->copyDataForKey("Level"), std::optional<std::string>("5"));
-  const auto stored =
-      CSettingsMap::CastToMap(CSettingsObject::ReadFromJSONBuffer(store.Stored("Prefs")), false);
-  ASSERT_NE(stored, nullptr);
-  EXPECT_EQ(stored->StringForKeyWithDefault("Logging", ""), "on");
-
-  EXPECT_TRUE(category->deleteKey("Logging"));
-  EXPECT_TRUE(category->hasKey("Logging"));
-  EXPECT_FALSE(category->deleteKey("Missing"));
 }
 
 }  // namespace

@@ -143,11 +143,14 @@ TEST_F(I2CTransport, TunnelReadCopiesWhatWasAskedFor) {
 }
 
 TEST_F(I2CTransport, BusyIsWaitedOutWithoutLimitAndAStallIsAFailure) {
+  // A minute of busy answers at one poll each 20 ms, far past any retry
+  // count, then the echo.
+  constexpr int kBusyPolls = 3000;
   Bytes command{0x12, 1, 0, 0, 0};
-  for (int i = 0; i < 250; ++i) mReplies.push_back(WriteStatus(0xF1, 0));
+  mReplies.assign(kBusyPolls, WriteStatus(0xF1, 0));
   mReplies.push_back(WriteStatus(0xF2, 0x12));
   EXPECT_TRUE(mInterface->Write(command));
-  EXPECT_NEAR(mClock->GetTotalSlept(), 0.02 * 251, 1e-9);
+  EXPECT_NEAR(mClock->GetTotalSlept(), 0.02 * (kBusyPolls + 1), 1e-6);
 
   mNode->onSet = [](const Bytes&) { return EHidStatus::eStall; };
   EXPECT_FALSE(mInterface->Write(command));

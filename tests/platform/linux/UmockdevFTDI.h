@@ -17,7 +17,6 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstddef>
-#include <cstdio>
 #include <deque>
 #include <functional>
 #include <memory>
@@ -41,14 +40,14 @@ class UmockdevFTDI : public CEmulatedUsbBus {
     const std::string hubPort = std::to_string((location >> 20) & 0xF);
     const std::string port = hubPort + "." + std::to_string((location >> 16) & 0xF);
     const std::string root = AddRootHub(1);
-    const std::string hubPath = root + "/1-" + hubPort;
-    AddUsbNode(hubPath, hubPort, 2, 0x7A5D, 0x00F0, 0x0100, Descriptors(0x09, {}));
+    AddUsbfsDevice(root, hubPort, 2, 0x7A5D, 0x00F0, 0x0100, Configuration(0x09));
+    const std::string hub = root + "/1-" + hubPort;
     mHandler = umockdev_ioctl_base_new();
     g_signal_connect(mHandler, "handle-ioctl", G_CALLBACK(&UmockdevFTDI::HandleIoctl), this);
     umockdev_testbed_attach_ioctl(GetTestbed(), "/dev/bus/usb/001/003", mHandler, nullptr);
-    mPath = hubPath + "/1-" + port;
-    AddUsbNode(mPath, port, 3, CLabFTDIBridge::kVendorId, CLabFTDIBridge::kProductId,
-               CLabFTDIBridge::kBridgeRelease, Descriptors(0xFF, {0x81, 0x02}));
+    mPath = hub + "/1-" + port;
+    AddUsbfsDevice(hub, port, 3, CLabFTDIBridge::kVendorId, CLabFTDIBridge::kProductId,
+                   CLabFTDIBridge::kBridgeRelease, Configuration(0xFF, {0x81, 0x02}));
   }
   ~UmockdevFTDI() {
     Unplug();
@@ -68,46 +67,6 @@ class UmockdevFTDI : public CEmulatedUsbBus {
   }
 
  private:
-  static void Le16(std::vector<uint8_t>& bytes_IO, uint16_t value_I) {
-    bytes_IO.push_back(static_cast<uint8_t>(value_I));
-    bytes_IO.push_back(static_cast<uint8_t>(value_I >> 8));
-  }
-
-  // One configuration with one interface of `class_I` and bulk endpoints.
-  static std::vector<uint8_t> Descriptors(uint8_t class_I,
-                                          const std::vector<uint8_t>& endpoints_I) {
-    std::vector<uint8_t> bytes{0x09, 0x02};
-    Le16(bytes, static_cast<uint16_t>(18 + 7 * endpoints_I.size()));
-    bytes.insert(bytes.end(),
-                 {0x01, 0x01, 0x00, 0x80, 0x32, 0x09, 0x04, 0x00, 0x00,
-                  static_cast<uint8_t>(endpoints_I.size()), class_I, class_I, class_I, 0x00});
-    for (uint8_t endpoint : endpoints_I) {
-      bytes.insert(bytes.end(), {0x07, 0x05, endpoint, 0x02});
-      Le16(bytes, kPacketSize);
-      bytes.push_back(0x00);
-    }
-    return bytes;
-  }
-
-  void AddUsbNode(const std::string& path_I, const std::string& devpath_I, unsigned devnum_I,
-                  uint16_t vendor_I, uint16_t product_I, uint16_t release_I,
-                  const std::vector<uint8_t>& config_I) {
-    std::vector<uint8_t> descriptors{0x12, 0x01, 0x00, 0x02, 0x00, 0x00, 0x00, 0x40};
-    for (uint16_t word : {vendor_I, product_I, release_I}) Le16(descriptors, word);
-    descriptors.insert(descriptors.end(), {0x00, 0x00, 0x00, 0x01});
-    descriptors.insert(descriptors.end(), config_I.begin(), config_I.end());
-    char text[640];
-    std::snprintf(text, sizeof(text),
-                  "P: %s\nN: bus/usb/001/%03u=00\nE: SUBSYSTEM=usb\nE: DEVTYPE=usb_device\n"
-                  "E: DRIVER=usb\nE: BUSNUM=001\nE: DEVNUM=%03u\nE: DEVNAME=/dev/bus/usb/001/%03u\n"
-                  "A: idVendor=%04x\\n\nA: idProduct=%04x\\n\nA: bcdDevice=%04x\\n\n"
-                  "A: busnum=1\\n\nA: devnum=%u\\n\nA: devpath=%s\\n\nA: speed=480\\n\n"
-                  "A: bConfigurationValue=1\\n\nA: dev=189:%u\nH: descriptors=",
-                  path_I.c_str(), devnum_I, devnum_I, devnum_I, vendor_I, product_I, release_I,
-                  devnum_I, devpath_I.c_str(), devnum_I);
-    Add(std::string(text) + Hex(descriptors) + "\n");
-  }
-
   // Runs `work_I` on the claimed bridge; false once it is gone.
   bool OnBridge(const std::function<void(CLabFTDIBridge&)>& work_I) {
     CLabBus::SBinding binding;
