@@ -34,16 +34,21 @@ function(tav_library name)
   tav_target_options(${name})
 endfunction()
 
-# tav_test_suite(NAME SOURCES... [DEPS ...] [SET VAR=VALUE]): one GoogleTest
-# executable, registered with CTest test by test. SET gives the tests one
+# tav_test_suite(NAME SOURCES... [DEPS ...] [SET VAR=VALUE] [LAUNCHER SCRIPT]):
+# one GoogleTest executable, registered with CTest test by test, run through
+# SCRIPT when one is given. SET gives the tests one
 # more environment variable (CMake 3.25's test discovery splits a property
 # holding a list, so each property carries one entry).
 function(tav_test_suite name)
-  cmake_parse_arguments(ARG "" "SET" "SOURCES;DEPS" ${ARGN})
+  cmake_parse_arguments(ARG "" "SET;LAUNCHER" "SOURCES;DEPS" ${ARGN})
   add_executable(${name} ${ARG_SOURCES})
   target_include_directories(${name} PRIVATE ${PROJECT_SOURCE_DIR}/src ${PROJECT_SOURCE_DIR}/tests)
   target_link_libraries(${name} PRIVATE ${ARG_DEPS} GTest::gmock GTest::gtest GTest::gmock_main Threads::Threads)
   tav_target_options(${name})
+  if(ARG_LAUNCHER)
+    # Test discovery runs the tests through the emulator property.
+    set_target_properties(${name} PROPERTIES CROSSCOMPILING_EMULATOR ${ARG_LAUNCHER})
+  endif()
   # Sanitized builds run several times slower.
   set(timeout 120)
   if(TAV_SANITIZE)
