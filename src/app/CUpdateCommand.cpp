@@ -11,6 +11,8 @@
 #include "app/CAllBoards.h"
 #include "app/CListCommand.h"
 #include "app/CRunSeams.h"
+#include "common/StringUtilities.h"
+#include "host/CLanguageManager.h"
 #include "app/CUpdateReport.h"
 #include "app/CUpdaterRun.h"
 #include "app/TavVersion.h"
@@ -209,9 +211,12 @@ int CUpdateCommand::PlanAll(const std::string& labStateFolder_I, CUpdateReport& 
   const CAllBoards::SPlan plan =
       CAllBoards::Plan(CListCommand::Find(*seams, configPath), configPath);
   for (const SBoardResult& board : plan.skipped) {
-    std::printf("Skipping the %s of %s (%s): already at version %s.\n",
-                CBoardResults::BoardName(board.kind), board.product.c_str(), board.path.c_str(),
-                board.versionBefore.c_str());
+    std::printf("%s\n", StringUtilities::Format(
+                             TTCLocalizedNSString("Skipping the %s of %s (%s): already at version %s.")
+                                 .c_str(),
+                             TTCLocalizedNSString(CBoardResults::BoardName(board.kind)).c_str(),
+                             board.product.c_str(), board.path.c_str(), board.versionBefore.c_str())
+                             .c_str());
     report_IO.AddSkipped(board);
   }
   if (!plan.arguments.empty()) {
@@ -220,9 +225,9 @@ int CUpdateCommand::PlanAll(const std::string& labStateFolder_I, CUpdateReport& 
   }
   // Nothing left to run the updater for.
   const ERunOutcome outcome = plan.productCount == 0 ? ERUN_NO_DEVICE : ERUN_SUCCESS;
-  const std::string result = outcome == ERUN_SUCCESS
-                                 ? "Result: every board is already at its firmware file's version."
-                                 : "Result: no supported tablet is connected.";
+  const std::string result = TTCLocalizedNSString(
+      outcome == ERUN_SUCCESS ? "Result: every board is already at its firmware file's version."
+                              : "Result: no supported tablet is connected.");
   std::printf("%s\n", result.c_str());
   if (reportOut_I != nullptr)
     std::fputs(report_IO.ToJson({}, outcome, result).c_str(), reportOut_I);
