@@ -38,15 +38,8 @@ class CFuzzedMaster : public CI2CFLDeviceInterface {
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data_I, size_t size_I) {
-  static const bool clockSet = [] {
-    CClock::Set(std::make_shared<CInstantClock>());
-    __DUMP_WRITE_COMMAND__ = false;
-    return true;
-  }();
-  (void)clockSet;
   FuzzedDataProvider data(data_I, size_I);
-  CFLProtocol::GetInstance()->SetProtocolType(data.ConsumeBool() ? EFL_PROTOCOL_NON_BL
-                                                                 : EFL_PROTOCOL_LOADER);
+  FuzzProcedureSetUp(data);
   CFuzzedMaster master(data);
   master.SetDataSourceFormat(static_cast<EDataSourceFormat>(data.ConsumeIntegralInRange(0, 2)));
   std::vector<SContinuousDataBlock> image(1);

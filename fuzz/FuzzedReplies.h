@@ -10,7 +10,13 @@
 #include <algorithm>
 #include <cstdint>
 #include <cstdlib>
+#include <memory>
 #include <vector>
+
+#include "FuzzInstantClock.h"
+#include "common/CClock.h"
+#include "flash/CFLDeviceInterface.h"
+#include "flash/CFLProtocol.h"
 
 class CFuzzedReplies {
  public:
@@ -41,3 +47,16 @@ class CFuzzedReplies {
   bool mSilentAccepts;
   uint64_t mReports = 0;
 };
+
+// Once per process: no waiting and no command dump. Per input: the
+// protocol the loader speaks, the first thing the input decides.
+inline void FuzzProcedureSetUp(FuzzedDataProvider& data_I) {
+  static const bool clockSet = [] {
+    CClock::Set(std::make_shared<CInstantClock>());
+    __DUMP_WRITE_COMMAND__ = false;
+    return true;
+  }();
+  (void)clockSet;
+  CFLProtocol::GetInstance()->SetProtocolType(data_I.ConsumeBool() ? EFL_PROTOCOL_NON_BL
+                                                                   : EFL_PROTOCOL_LOADER);
+}

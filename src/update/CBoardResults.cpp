@@ -31,56 +31,57 @@ void CBoardResults::Begin(size_t index_I) {
 void CBoardResults::SetBoard(const std::string& product_I, const std::string& path_I,
                              const std::string& version_I) {
   std::lock_guard<std::mutex> guard(mLock);
-  if (mCurrent >= mResults.size()) return;
-  SBoardResult& result = mResults[mCurrent];
-  result.product = product_I;
-  result.path = path_I;
-  result.versionBefore = version_I;
+  SBoardResult* result = CurrentLocked();
+  if (result == nullptr) return;
+  result->product = product_I;
+  result->path = path_I;
+  result->versionBefore = version_I;
 }
 
 void CBoardResults::SetFile(const std::string& file_I) {
   std::lock_guard<std::mutex> guard(mLock);
-  if (mCurrent < mResults.size()) mResults[mCurrent].file = file_I;
+  if (SBoardResult* result = CurrentLocked()) result->file = file_I;
 }
 
 void CBoardResults::Finish(EBoardOutcome outcome_I, const std::string& reason_I) {
   std::lock_guard<std::mutex> guard(mLock);
-  if (mCurrent >= mResults.size()) return;
-  SBoardResult& result = mResults[mCurrent];
-  if (result.outcome != EBOARD_UPDATING) return;
-  result.outcome = outcome_I;
-  result.reason = reason_I.empty() && outcome_I != EBOARD_UPDATED ? mFirstError : reason_I;
+  SBoardResult* result = CurrentLocked();
+  if (result == nullptr || result->outcome != EBOARD_UPDATING) return;
+  result->outcome = outcome_I;
+  result->reason = reason_I.empty() && outcome_I != EBOARD_UPDATED ? mFirstError : reason_I;
 }
 
 void CBoardResults::SetIdentity(uint32_t vendorId_I, uint32_t productId_I) {
   std::lock_guard<std::mutex> guard(mLock);
-  if (mCurrent >= mResults.size()) return;
-  mResults[mCurrent].vendorId = vendorId_I;
-  mResults[mCurrent].productId = productId_I;
+  SBoardResult* result = CurrentLocked();
+  if (result == nullptr) return;
+  result->vendorId = vendorId_I;
+  result->productId = productId_I;
 }
 
 void CBoardResults::NoteState(ECONTROLLER_STATE state_I) {
   std::lock_guard<std::mutex> guard(mLock);
-  if (mCurrent < mResults.size()) mResults[mCurrent].states.push_back(state_I);
+  if (SBoardResult* result = CurrentLocked()) result->states.push_back(state_I);
 }
 
 void CBoardResults::SetChecksums(uint32_t before_I, uint32_t after_I, uint32_t file_I) {
   std::lock_guard<std::mutex> guard(mLock);
-  if (mCurrent >= mResults.size()) return;
-  SBoardResult& result = mResults[mCurrent];
-  result.checksumsKnown = true;
-  result.checksumBefore = before_I;
-  result.checksumAfter = after_I;
-  result.checksumFile = file_I;
+  SBoardResult* result = CurrentLocked();
+  if (result == nullptr) return;
+  result->checksumsKnown = true;
+  result->checksumBefore = before_I;
+  result->checksumAfter = after_I;
+  result->checksumFile = file_I;
 }
 
 void CBoardResults::NoteError(ECONTROLLER_ERROR code_I, const std::string& text_I) {
   std::lock_guard<std::mutex> guard(mLock);
   if (mFirstError.empty()) mFirstError = text_I;
   // Some errors come without a text; the code alone still tells the kind.
-  if (mCurrent < mResults.size() && mResults[mCurrent].errorCode == EERROR_NONE) {
-    mResults[mCurrent].errorCode = code_I;
-    mResults[mCurrent].errorText = text_I;
+  SBoardResult* result = CurrentLocked();
+  if (result != nullptr && result->errorCode == EERROR_NONE) {
+    result->errorCode = code_I;
+    result->errorText = text_I;
   }
 }
 

@@ -77,6 +77,9 @@ class CBoardResults {
   ERunOutcome Outcome(ERunOutcome ending_I) const;
 
  private:
+  // The board being updated, or null between boards; under mLock.
+  SBoardResult* CurrentLocked() { return mCurrent < mResults.size() ? &mResults[mCurrent] : nullptr; }
+
   mutable std::mutex mLock;
   std::vector<SBoardResult> mResults;
   size_t mCurrent = SIZE_MAX;
