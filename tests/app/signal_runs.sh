@@ -40,7 +40,10 @@ for signal in TERM HUP; do
     fail "SIG$signal: not deferred"
   grep -q "pen controller of Lab Classic Tablet: updated from version" "$WORK/out" ||
     fail "SIG$signal: the pen's update was not completed"
-  grep -q "touch controller of Lab Classic Tablet: not updated: the run ended before it" "$WORK/out" ||
+  # Whether the touch board was looked up before the end was taken varies;
+  # the line then names its product or not, and it never reaches its loader.
+  grep -Eq "touch controller( of Lab Classic Tablet)?: not updated: the run ended before it" \
+    "$WORK/out" ||
     fail "SIG$signal: the run went on to the next board"
   grep -q "Result: the run was ended after 1 of 2 boards were updated." "$WORK/out" ||
     fail "SIG$signal: the result line does not say the pen was updated"
