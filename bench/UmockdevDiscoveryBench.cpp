@@ -46,7 +46,7 @@ class CBareMonitor {
     // The group the registry's watch takes, so that both hear one sender.
     mMonitor = udev_monitor_new_from_netlink(
         mUdev, access("/run/udev/control", F_OK) == 0 ? "udev" : "kernel");
-    if (mMonitor == nullptr ||
+    if (mWake < 0 || mMonitor == nullptr ||
         udev_monitor_filter_add_match_subsystem_devtype(mMonitor, "hidraw", nullptr) < 0 ||
         udev_monitor_enable_receiving(mMonitor) < 0) {
       return;
@@ -54,12 +54,14 @@ class CBareMonitor {
     mThread = std::thread([this] { Run(); });
   }
   ~CBareMonitor() {
-    const uint64_t one = 1;
-    if (write(mWake, &one, sizeof(one)) < 0) std::abort();
-    if (mThread.joinable()) mThread.join();
+    if (mThread.joinable()) {
+      const uint64_t one = 1;
+      [[maybe_unused]] const ssize_t written = write(mWake, &one, sizeof(one));
+      mThread.join();
+    }
     if (mMonitor != nullptr) udev_monitor_unref(mMonitor);
     udev_unref(mUdev);
-    close(mWake);
+    if (mWake >= 0) close(mWake);
   }
   bool IsOpen() const { return mThread.joinable(); }
 
