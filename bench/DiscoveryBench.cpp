@@ -7,12 +7,12 @@
 
 #include <benchmark/benchmark.h>
 
-#include <algorithm>
 #include <chrono>
 #include <condition_variable>
 #include <mutex>
 #include <thread>
 
+#include "CAttachWatcher.h"
 #include "lab/CLabDeviceRegistry.h"
 #include "lab/CLabHidNode.h"
 #include "lab/CLabPenController.h"
@@ -21,45 +21,6 @@
 #include "update/CLinuxUpdateController.h"
 
 namespace {
-
-using Clock = std::chrono::steady_clock;
-
-double Median(std::vector<double> values_I) {
-  std::sort(values_I.begin(), values_I.end());
-  return values_I.empty() ? 0.0 : values_I[values_I.size() / 2];
-}
-
-double Microseconds(Clock::time_point from_I, Clock::time_point to_I) {
-  return std::chrono::duration<double, std::micro>(to_I - from_I).count();
-}
-
-// The device thread: every interface added goes to DeviceAttach, and the
-// moment it returns is handed to the waiting benchmark.
-class CAttachWatcher : public CRegistryWatcher {
- public:
-  explicit CAttachWatcher(CUpdateController& controller_I) : mController(controller_I) {}
-  void DeviceAdded(const DeviceInfo& info_I) override {
-    mController.DeviceAttach(CFLDeviceInterface::PathFromInfo(info_I));
-    std::lock_guard<std::mutex> guard(mLock);
-    if (!mAttached) mAttachedAt = Clock::now();
-    mAttached = true;
-    mWake.notify_all();
-  }
-  void DeviceRemoved(const DeviceInfo&) override {}
-  Clock::time_point WaitForAttach() {
-    std::unique_lock<std::mutex> lock(mLock);
-    mWake.wait(lock, [this] { return mAttached; });
-    mAttached = false;
-    return mAttachedAt;
-  }
-
- private:
-  CUpdateController& mController;
-  std::mutex mLock;
-  std::condition_variable mWake;
-  bool mAttached = false;
-  Clock::time_point mAttachedAt;
-};
 
 // One hand-over to a waiting thread and the time it woke.
 Clock::time_point HandOver(Clock::time_point& sent_O) {
@@ -105,7 +66,12 @@ void BM_HotplugToDeviceAttach(benchmark::State& state) {
     auto pen = std::make_shared<CLabPenController>(description);
     const Clock::time_point plugged = Clock::now();
     bus->Plug(pen);
-    attach.push_back(Microseconds(plugged, watcher.WaitForAttach()));
+    Clock::time_point attached;
+    if (!watcher.WaitForAttach(attached)) {
+      state.SkipWithError("no attach");
+      break;
+    }
+    attach.push_back(Microseconds(plugged, attached));
     Clock::time_point sent;
     const Clock::time_point woke = HandOver(sent);
     handOver.push_back(Microseconds(sent, woke));

@@ -11,6 +11,7 @@
 #include <cstdlib>
 #include <fstream>
 #include <sstream>
+#include <vector>
 
 #include "common/CClock.h"
 #include "common/CSteadyClock.h"
@@ -45,7 +46,10 @@ class RealBinary : public ::testing::Test {
 
   // Runs the program on the pen until it ends, keeping the testbed in line
   // with the bus; its status, and its output in `output_O`.
-  int Run(std::string& output_O) {
+  int Run(std::string& output_O,
+          std::vector<const char*> arguments_I = {"--headless", "--yes", "-p", ""}) {
+    arguments_I.insert(arguments_I.begin(), TAV_PROGRAM);
+    arguments_I.push_back(nullptr);
     const std::string log = mFolder + "/output";
     const pid_t child = fork();
     if (child == 0) {
@@ -54,7 +58,7 @@ class RealBinary : public ::testing::Test {
       setenv("XDG_DATA_HOME", (mFolder + "/data").c_str(), 1);
       if (!freopen(log.c_str(), "w", stdout) || !freopen("/dev/null", "r", stdin)) _exit(120);
       dup2(fileno(stdout), fileno(stderr));
-      execl(TAV_PROGRAM, TAV_PROGRAM, "--headless", "--yes", "-p", "", nullptr);
+      execv(TAV_PROGRAM, const_cast<char* const*>(arguments_I.data()));
       _exit(127);
     }
     int status = 0;
@@ -85,6 +89,15 @@ TEST_F(RealBinary, UpdatesThePenThroughItsLoaderAndBack) {
   EXPECT_EQ(mPen->GetMode(), CLabLoaderBoard::EMode::eNormal);
   EXPECT_TRUE(mPen->GetLoader().IsImageValid());
   for (const std::string& violation : mPen->GetViolations()) ADD_FAILURE() << violation;
+}
+
+TEST_F(RealBinary, ListsTheTabletWithThePenItFoundThroughUdev) {
+  std::string output;
+  EXPECT_EQ(Run(output, {"--list"}), 0) << output;
+  EXPECT_NE(output.find("Lab Classic Tablet, in normal mode"), std::string::npos) << output;
+  EXPECT_NE(output.find("pen        HID   31325:769:17891328:1:65280         1.20"),
+            std::string::npos)
+      << output;
 }
 
 TEST_F(RealBinary, APenPulledMidUpdateFailsWithItsMessage) {
