@@ -327,9 +327,12 @@ CUpdateController::InterfacePtr CUpdateController::GetLoaderMode() {
     CallbackLog(std::string("Switching ") + word + " to Loader mode... ");
     ProcessStateChange(ESTATE_WAIT_LOADER);
 
-    // An interface is opened before it is switched: a vendor-class one takes
-    // requests only once its interface is claimed; HID and I2C open anyway.
-    if (!active->Open()) CallbackLog("Could not open the interface before the switch");
+    // A vendor-class interface takes requests only once it is claimed, so it
+    // is opened before its switch. A HID interface's switch opens it itself;
+    // opened here first, it would be sent an alive probe for nothing.
+    if (active->GetInterfaceType() != EHID_INTERFACE && !active->Open()) {
+      CallbackLog("Could not open the interface before the switch");
+    }
     if (!active->SwitchToBLMode()) {
       if (active->GetInterfaceType() == EI2C_INTERFACE) {
         CallbackError(EERROR_PROGRAM, "I2C Device failed to switch to Loader mode");

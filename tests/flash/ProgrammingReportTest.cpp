@@ -174,6 +174,43 @@ TEST_F(ProgrammingReports, AB1555SendsEveryPageInOrder) {
   EXPECT_EQ(mNotifier.errors.back(), "ProgramBoardAiroHaBinary_AB1555: Programming error");
 }
 
+// Start, each piece and end cost a write and one read each; any further
+// read is one the board forced by answering busy. Images of other sizes
+// than the lab's own: a scalar block that ends short, an Intel-hex image
+// that loads padded to 512 bytes.
+TEST_F(ProgrammingReports, EachPieceCostsAWriteAndAReadBeyondBusyAnswers) {
+  const struct {
+    EDataSourceFormat format;
+    size_t size;
+    uint64_t pieces;
+  } cases[] = {{EDS_INTEL_HEX, 1, 4},
+               {EDS_INTEL_HEX, 513, 8},
+               {EDS_SCALAR_BINARY, 1, 1},
+               {EDS_SCALAR_BINARY, 4097, 17}};
+  for (const auto& [format, size, pieces] : cases) {
+    SCOPED_TRACE(std::to_string(format) + ", " + std::to_string(size) + " bytes");
+    mBus = CLabBus::Create();
+    std::shared_ptr<CLabBoard> board;
+    std::unique_ptr<CLinuxHIDFLDeviceInterface> interface;
+    if (format == EDS_INTEL_HEX) {
+      board = std::make_shared<CLabTouchHex>();
+      mBus->Plug(board);
+      interface = Connect(*board, format);
+      interface->SetIntelHexData(IntelHex(Pattern(size, 5)));
+    } else {
+      auto binary = std::make_shared<CScalarBinary>();
+      ASSERT_TRUE(binary->Prepare(Pattern(size, 5)));
+      board = std::make_shared<CLabScalarHid>();
+      mBus->Plug(board);
+      interface = Connect(*board, format);
+      interface->SetScalarBinaryData(binary);
+    }
+    ASSERT_TRUE(interface->ProgramBoard()) << mNotifier.errors.back();
+    EXPECT_GT(board->GetBusyAnswers(), 0u) << "the start erases";
+    EXPECT_EQ(board->Faults().GetReportCount(), 2 * (pieces + 2) + board->GetBusyAnswers());
+  }
+}
+
 TEST_F(ProgrammingReports, EachProcedureRefusesMissingData) {
   auto touch = std::make_shared<CLabTouchHex>();
   mBus->Plug(touch);

@@ -110,6 +110,28 @@ TEST_F(SRecProgramming, NonBLProtocolChecksEachBlockAndRewritesACorruptedOne) {
   EXPECT_EQ(calcs, 5u + 48u) << "one per written block, then one per block at the end";
 }
 
+// Nothing beyond the sequence: a whole block and one that ends in a write
+// block and two words. Loader protocol: the two switch reports; CPU, CPU
+// count, parameters, descriptor and checksums; the checksums again; the
+// magic word, 48 block checksums and the commit; an erase and 16 writes,
+// an erase, a write and two words; 48 calculations, the commit and the
+// checksums; the reset. The non-BL pen switches in place, and checks each
+// block it wrote with a calculation, a read and a set.
+TEST_F(SRecProgramming, AnUpdateSendsOnlyWhatItsSequenceCallsFor) {
+  const std::vector<SContinuousDataBlock> image{Record(0x08001000, 4096 + 256 + 8, 7)};
+  for (const auto& [protocol, reports] :
+       {std::pair{EFL_PROTOCOL_LOADER, 2 + 5 + 1 + 50 + 17 + 4 + 50 + 1},
+        std::pair{EFL_PROTOCOL_NON_BL, 5 + 1 + 50 + (17 + 3) + (4 + 3) + 50 + 1}}) {
+    SCOPED_TRACE(protocol);
+    mBus = CLabBus::Create();
+    SLabPenDescription description;
+    if (protocol == EFL_PROTOCOL_NON_BL) description.protocol = ELabProtocol::eNonBL;
+    Plug(description);
+    Update(image, protocol, EDS_SREC_GENERIC);
+    EXPECT_EQ(mPen->GetReportCount(), static_cast<uint64_t>(reports));
+  }
+}
+
 TEST_F(SRecProgramming, PenFilesSumOnlyTheFirst39Blocks) {
   Plug(SLabPenDescription());
   std::vector<SContinuousDataBlock> image{Record(0x08026000, 3 * 4096, 6)};  // blocks 38-40

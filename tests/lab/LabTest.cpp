@@ -235,6 +235,7 @@ TEST_F(LabBus, AProgrammingBoardRefusesABadPageAndStaysInvalid) {
   EXPECT_EQ(status(), CLabProgrammingBoard::kStatusBusy);
   EXPECT_EQ(status(), CLabProgrammingBoard::kStatusBusy);
   EXPECT_EQ(status(), CLabProgrammingBoard::kStatusReady);
+  EXPECT_EQ(scalar->GetBusyAnswers(), 3u) << "the erase and the two faults";
 
   // Cut off mid-update, the board comes back under its loader identity.
   ASSERT_EQ(node.SetFeatureReport(frame(1)), EHidStatus::eSuccess);
@@ -310,13 +311,16 @@ TEST_F(LabBus, TheStateFolderCarriesBoardsIntoTheNextRun) {
   std::filesystem::remove_all(folder);
 }
 
-// The summary the benchmarks read: every report that reached a board
-// and the time the run took on the lab's clock.
+// The summary the benchmarks read: every report that reached a board, the
+// busy answers of a board that gave any, and the time the run took on the
+// lab's clock.
 TEST_F(LabBus, ASessionEndsWithWhatItCostTheBoards) {
   const std::filesystem::path folder =
       std::filesystem::temp_directory_path() / ("tavik-lab-cost-" + std::to_string(::getpid()));
   auto pen = std::make_shared<CLabPenController>(SLabPenDescription{.name = "counted"});
+  auto scalar = std::make_shared<CLabScalarHid>("polled");
   mBus->Plug(pen);
+  mBus->Plug(scalar);
   CLabOptions options;
   options.SetStateFolder(folder.string());
   LogCapture log;
@@ -329,9 +333,22 @@ TEST_F(LabBus, ASessionEndsWithWhatItCostTheBoards) {
     node.GetFeatureReport(status);
     node.GetFeatureReport(status);
     node.SetFeatureReport({0xEE});
+    // Started, the scalar erases for a while: busy once, then ready.
+    CLabHidNode scalarNode(mBus);
+    ASSERT_EQ(scalarNode.Open(Listed(*scalar)), EHidStatus::eSuccess);
+    Bytes programming(512, 0xFF);
+    programming[0] = 0xE4;
+    programming[1] = 4;
+    programming[2] = 1;
+    scalarNode.SetFeatureReport(programming);
+    scalarNode.GetFeatureReport(programming);
     TavSleep(2.5);
+    scalarNode.GetFeatureReport(programming);
   }
   EXPECT_TRUE(log.LogContains("Lab board counted: 3 reports\n"));
+  EXPECT_FALSE(log.LogContains("Lab board counted: 0 busy answers"));
+  EXPECT_TRUE(log.LogContains("Lab board polled: 3 reports\n"));
+  EXPECT_TRUE(log.LogContains("Lab board polled: 1 busy answers\n"));
   EXPECT_TRUE(log.LogContains("Lab clock: 2.500 s\n"));
   EXPECT_TRUE(log.LogContains("Lab waits: 2.500 s\n"));
   std::filesystem::remove_all(folder);

@@ -153,11 +153,12 @@ TEST_F(Flow, EachPathEndsInItsStatesAndCalls) {
   for (const std::string& call : LeftInPlace("pen", true)) pen.push_back(call);
   // clang-format off
   Run({
-    // Open and switch, open the loader, init, program, leave with save, then
-    // carry the loader's sums to the new normal interface. Each attach comes
-    // on the clock's thread; the update thread takes it at its next poll.
+    // Switch (a HID board opens itself for it), open the loader, init,
+    // program, leave with save, then carry the loader's sums to the new
+    // normal interface. Each attach comes on the clock's thread; the update
+    // thread takes it at its next poll.
     {"re-enumerates into its loader and back", inPlace, {}, 3.0 + 2.0,
-     {"pen.RegisterCallback", "pen.Open", "pen.SwitchToBLMode", "loader.Open",
+     {"pen.RegisterCallback", "pen.SwitchToBLMode", "loader.Open",
       "loader.RegisterCallback", "loader.SetProtocolType(0)", "loader.Init(64 bytes)",
       "loader.ProgramBoard", "loader.RegisterCallback", "loader.SwitchFromBLMode(true)",
       penAgain[0], penAgain[1], penAgain[2], penAgain[3], penAgain[4]},
@@ -198,7 +199,8 @@ TEST_F(Failure, EachFaultEndsInItsStatesErrorsAndCalls) {
   Run({
     // No error callback and no failure state: the state stays where the
     // switch left it.
-    {"a loader that never comes", toLoader, {}, 90.0, {"pen.Open", "pen.SwitchToBLMode"},
+    {"a loader that never comes", toLoader, {}, 90.0,
+     {"pen.RegisterCallback", "pen.SwitchToBLMode"},
      [this] { mPen->mOnSwitchTo = nullptr; }},
     {"a board that never leaves its loader", leaveFails, {swapping}, 3.0 + 90.0,
      {"loader.ProgramBoard", "loader.RegisterCallback", "loader.SwitchFromBLMode(true)"},
