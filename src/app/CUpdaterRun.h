@@ -1,7 +1,8 @@
 #pragma once
 // One update run as the program makes it: the window (Qt's, in the window
-// program only, or the terminal's) on the main thread's loop, the updater driver with the run's seams, and the
-// application object that ends the process through its terminate handler.
+// program only, or the terminal's) on the main thread's loop, the updater
+// driver with the run's seams, and the application object that ends the
+// process through its terminate handler.
 
 #include <functional>
 #include <memory>

@@ -14,8 +14,8 @@ std::string CWindowProgram::GetPath(const std::string& executableFolder_I) {
       LinuxPaths::AppendPathComponent(executableFolder_I, TAV_WINDOW_PROGRAM_NAME);
   std::error_code error;
   if (std::filesystem::exists(beside, error)) return beside;
-  return std::filesystem::path(LinuxPaths::AppendPathComponent(executableFolder_I,
-                                                               TAV_WINDOW_PROGRAM_FROM_BINDIR))
+  return std::filesystem::path(
+             LinuxPaths::AppendPathComponent(executableFolder_I, TAV_WINDOW_PROGRAM_FROM_BINDIR))
       .lexically_normal()
       .string();
 }
@@ -23,7 +23,8 @@ std::string CWindowProgram::GetPath(const std::string& executableFolder_I) {
 std::string CWindowProgram::Exec(const std::string& path_I,
                                  const std::vector<std::string>& arguments_I) {
   std::vector<char*> argv;
-  for (const std::string& argument : arguments_I) argv.push_back(const_cast<char*>(argument.c_str()));
+  for (const std::string& argument : arguments_I)
+    argv.push_back(const_cast<char*>(argument.c_str()));
   argv.push_back(nullptr);
   // Whatever this process buffered must reach its output once, not be lost.
   std::fflush(nullptr);

@@ -91,7 +91,8 @@ std::string FindInstalledDataFolder(const std::string& executableFolder_I) {
     const std::filesystem::path beside =
         (std::filesystem::path(executableFolder_I) / relative).lexically_normal();
     std::error_code error;
-    if (std::filesystem::is_directory(beside, error)) return WithoutTrailingSlashes(beside.string());
+    if (std::filesystem::is_directory(beside, error))
+      return WithoutTrailingSlashes(beside.string());
   }
   return TAV_INSTALLED_DATA_FOLDER;
 }
