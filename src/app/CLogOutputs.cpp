@@ -40,7 +40,7 @@ void CLogOutputs::AttachStandardError() {
 
 bool CLogOutputs::AttachFile(const std::string& path_I) {
   if (mFile != nullptr) return true;
-  mFile = std::fopen(path_I.c_str(), "a");
+  mFile = std::fopen(path_I.c_str(), "ae");
   if (mFile == nullptr) return false;
   FILE* file = mFile;
   // A file is read later, so each line says when it was written. A Debug

@@ -15,8 +15,10 @@
 #include "host/CLanguageManager.h"
 #include "app/CUpdateReport.h"
 #include "app/CUpdaterRun.h"
+#include "app/CWindowProgram.h"
 #include "app/TavVersion.h"
 #include "common/LinuxPaths.h"
+#include "common/TavLog.h"
 #include "host/CLinuxPersistentSettings.h"
 #include "host/OXPCClient.h"
 #include "lab/CLabDesktop.h"
@@ -96,7 +98,19 @@ int CUpdateCommand::Run() {
   std::string error;
   // A report for scripts needs no window, and owns standard output: what
   // the terminal shows goes to standard error instead.
-  const bool window = !mCommandLine.GetInspectJson() && UsesWindow(mCommandLine.GetHeadless());
+  bool window = !mCommandLine.GetInspectJson() && UsesWindow(mCommandLine.GetHeadless());
+  // The window program runs this same command again from its start: so
+  // this is the last point before anything is written, touched or taken
+  // that must happen once.
+  if (window && !CUpdaterRun::HasWindowFrontEnd()) {
+    const std::string path = CWindowProgram::GetPath(LinuxPaths::GetExecutableFolderPath());
+    error = CWindowProgram::Exec(path, mProcessArguments);
+    // A terminal run is always possible.
+    std::fprintf(stderr, "%s: cannot start the window program %s (%s): going on in the terminal\n",
+                 TAV_PROGRAM_NAME, path.c_str(), error.c_str());
+    window = false;
+  }
+  TavLog::Info("%s %s starting\n", TAV_PROGRAM_NAME, TAV_PROGRAM_VERSION);
   if (!window && NamesNoBoard(mCommandLine)) {
     SayWhatToType();
     return ERUN_USAGE;
@@ -174,7 +188,7 @@ int CUpdateCommand::Run() {
 
   SRunOptions options;
   // The updater sees the board options alone, as the program was given them.
-  options.processArguments.push_back(mProgramPath);
+  options.processArguments.push_back(mProcessArguments.front());
   for (const std::string& argument : boardArguments) {
     options.processArguments.push_back(argument);
   }

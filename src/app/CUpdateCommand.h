@@ -12,10 +12,12 @@ class CUpdateReport;
 
 class CUpdateCommand {
  public:
-  CUpdateCommand(const CCommandLine& commandLine_I, std::string programPath_I)
-      : mCommandLine(commandLine_I), mProgramPath(std::move(programPath_I)) {}
+  // `processArguments_I`: the process's argument vector, program name first.
+  CUpdateCommand(const CCommandLine& commandLine_I, std::vector<std::string> processArguments_I)
+      : mCommandLine(commandLine_I), mProcessArguments(std::move(processArguments_I)) {}
   // Ends the process itself once the run is over; returns only on a set-up
-  // error, with the status to exit with.
+  // error, with the status to exit with. A window run in a program without
+  // the window replaces the process with the window program first.
   int Run();
 
   // The window, not the terminal: there is a display to open it on (a
@@ -31,5 +33,5 @@ class CUpdateCommand {
               std::vector<std::string>& arguments_IO) const;
 
   const CCommandLine& mCommandLine;
-  std::string mProgramPath;
+  std::vector<std::string> mProcessArguments;
 };

@@ -1,7 +1,8 @@
 #pragma once
-// One update run as the program makes it: the window (Qt's, or the
-// terminal's) on the main thread's loop, the updater driver with the run's seams, and the
-// application object that ends the process through its terminate handler.
+// One update run as the program makes it: the window (Qt's, in the window
+// program only, or the terminal's) on the main thread's loop, the updater
+// driver with the run's seams, and the application object that ends the
+// process through its terminate handler.
 
 #include <functional>
 #include <memory>
@@ -37,8 +38,15 @@ struct SRunOptions {
 
 class CUpdaterRun {
  public:
+  using TWindowFrontEnd = int (*)(SRunSeams seams_I, SRunOptions options_I);
+
   // Runs until the application object ends the process; does not return
   // in the program. The result is the exit status for a run whose end was
   // not the process's (tests stop the process-ending step).
   static int Run(SRunSeams seams_I, SRunOptions options_I);
+
+  // The window program sets its Qt front-end at start; a program without
+  // one has no window in it and hands a window run to the window program.
+  static void SetWindowFrontEnd(TWindowFrontEnd frontEnd_I);
+  static bool HasWindowFrontEnd();
 };

@@ -85,11 +85,16 @@ std::string GetInstalledDataFolderPath() {
 
 std::string FindInstalledDataFolder(const std::string& executableFolder_I) {
   if (executableFolder_I.empty()) return TAV_INSTALLED_DATA_FOLDER;
-  const std::filesystem::path beside =
-      (std::filesystem::path(executableFolder_I) / TAV_DATA_FOLDER_FROM_BINDIR).lexically_normal();
-  std::error_code error;
-  if (!std::filesystem::is_directory(beside, error)) return TAV_INSTALLED_DATA_FOLDER;
-  return WithoutTrailingSlashes(beside.string());
+  // The program lives in the binaries' folder, the window program in a
+  // folder of its own below the helper programs' folder.
+  for (const char* relative : {TAV_DATA_FOLDER_FROM_BINDIR, TAV_DATA_FOLDER_FROM_WINDOW_PROGRAM}) {
+    const std::filesystem::path beside =
+        (std::filesystem::path(executableFolder_I) / relative).lexically_normal();
+    std::error_code error;
+    if (std::filesystem::is_directory(beside, error))
+      return WithoutTrailingSlashes(beside.string());
+  }
+  return TAV_INSTALLED_DATA_FOLDER;
 }
 
 std::string GetExecutableFolderPath() {

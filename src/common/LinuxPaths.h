@@ -21,8 +21,9 @@ std::string GetUserPreferencesFolderPath();
 // $XDG_STATE_HOME/tavik, default ~/.local/state/tavik. Holds log files.
 std::string GetStateFolderPath();
 // The data folder of the installed program: <prefix>/share/tavik-fwupdater
-// reached from the executable's folder (<prefix>/bin) when that folder
-// exists, else the one fixed at build time.
+// reached from the executable's folder (<prefix>/bin, or the window
+// program's <prefix>/libexec/tavik-fwupdater) when that folder exists, else
+// the one fixed at build time.
 std::string GetInstalledDataFolderPath();
 // The same search from a given executable folder; an empty one gives the
 // folder fixed at build time.

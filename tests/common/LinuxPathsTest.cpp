@@ -80,6 +80,8 @@ TEST(LinuxPaths, InstalledDataFolderFollowsTheExecutable) {
             (root / "usr/share/tavik-fwupdater").string());
   EXPECT_EQ(FindInstalledDataFolder((root / "usr/bin/").string()),
             (root / "usr/share/tavik-fwupdater").string());
+  EXPECT_EQ(FindInstalledDataFolder((root / "usr/libexec/tavik-fwupdater").string()),
+            (root / "usr/share/tavik-fwupdater").string());
   fs::remove_all(root);
 }
 

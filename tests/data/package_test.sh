@@ -46,6 +46,7 @@ root=$work/root
 dpkg-deb -x "$deb" "$root"
 for path in \
   usr/bin/tavik-fwupdater \
+  usr/libexec/tavik-fwupdater/tavik-fwupdater-window \
   usr/libexec/tavik-update-helper \
   usr/share/tavik-fwupdater/fw_loader.ini \
   usr/share/tavik-fwupdater/Firmware/wireless-tablet.pen \
@@ -95,4 +96,13 @@ if ! (cd "$work" && "$program" --lab classic-tablet --lab-fast --headless --yes 
   cat "$work/update.log"; fail "the lab update failed"
 fi
 cat "$work/update.log"
+# A window run hands over to the unpacked window program, which finds the
+# same data from its own folder.
+if ! (cd "$work" && QT_QPA_PLATFORM=offscreen "$program" --lab classic-tablet --lab-fast --yes \
+        -p "" --verbose > "$work/window.log" 2>&1) ||
+   ! grep -qF 'Window: "Programming Successful"' "$work/window.log" ||
+   ! grep -qF "$root/usr/share/tavik-fwupdater/" "$work/window.log"; then
+  grep -E "window program|fw_loader|Window|Error|\[E\]" "$work/window.log" | tail -20
+  fail "the window update failed"
+fi
 exit $failed
