@@ -8,6 +8,7 @@
 #include <iterator>
 #include <set>
 
+#include "lab/CLabSerialFlash.h"
 #include "lab/CLabStateJournal.h"
 
 namespace {
@@ -121,6 +122,39 @@ TEST_F(LabStateJournal, FoldingEmptiesTheLogAndALogLeftOverFromBeforeChangesNoth
   // A kill between the new snapshot and emptying the log.
   WriteFile(CLabStateJournal::LogPath(mPath), log, log.size());
   EXPECT_EQ(LoadFolder(mPath), folded);
+}
+
+// The flash compares only what changed since a file took its last save;
+// a file that missed a save in between is compared whole, so what changed
+// before that save still reaches it.
+TEST(LabSerialFlashSave, EachFileSeesEveryChangeSinceItLastTookTheFlash) {
+  CLabSerialFlash flash(2, false, [](const std::string&) {});
+  const auto program = [&flash](uint32_t address_I, uint8_t value_I) {
+    flash.Execute(0x06, {}, 0, true);
+    flash.Execute(0x01, {0x00}, 0, true);  // protection off
+    flash.Execute(0x06, {}, 0, true);
+    flash.Program(address_I, Bytes(256, value_I));
+  };
+  const auto offsets = [](CLabStateFile& state_I) {
+    std::set<size_t> changed;
+    for (const auto& change : state_I.TakeChanges()) {
+      if (change.key == "flash") changed.insert(change.offset);
+    }
+    return changed;
+  };
+  CLabStateFile journal, other;
+  flash.Save(journal);
+  journal.TakeChanges();
+  program(0x1000, 0x11);
+  flash.Save(other);
+  program(0x9000, 0x22);
+  flash.Save(journal);
+  EXPECT_EQ(offsets(journal), (std::set<size_t>{0x1000, 0x9000}));
+  EXPECT_EQ(journal.Entry("flash"), flash.GetData());
+  program(0xA100, 0x33);
+  flash.Save(journal);
+  EXPECT_EQ(offsets(journal), (std::set<size_t>{0xA000}));
+  EXPECT_EQ(journal.Entry("flash"), flash.GetData());
 }
 
 }  // namespace
