@@ -152,6 +152,8 @@ void CLabBus::DeliverEvents() {
   std::vector<Listener> listeners;
   {
     std::lock_guard<std::recursive_mutex> guard(mLock);
+    // After most reports nothing happened: no copy of the listeners then.
+    if (mPending.empty()) return;
     events.swap(mPending);
     for (const auto& [handle, listener] : mListeners) listeners.push_back(listener);
   }

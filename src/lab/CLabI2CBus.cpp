@@ -1,6 +1,8 @@
 #include "lab/CLabI2CBus.h"
 
 void CLabI2CBus::Drive(EDrive scl_I, EDrive sda_I) {
+  // The bus settles after every change, so the same drive again is no event.
+  if (scl_I == mMasterScl && sda_I == mMasterSda) return;
   const bool sclRises = !mScl && scl_I != EDrive::eLow;
   if (sclRises) {
     mMasterSda = sda_I;

@@ -27,8 +27,7 @@ void CLabStateFile::PutBytes(const std::string& key_I, const std::vector<uint8_t
 }
 
 void CLabStateFile::PutBytes(const std::string& key_I, const std::vector<uint8_t>& bytes_I,
-                             uint64_t revision_I, uint64_t since_I, size_t begin_I,
-                             size_t end_I) {
+                             uint64_t revision_I, uint64_t since_I, size_t begin_I, size_t end_I) {
   auto known = mRevisions.find(key_I);
   auto entry = mEntries.find(key_I);
   const bool tookSince = since_I != 0 && known != mRevisions.end() && known->second == since_I &&
@@ -43,8 +42,7 @@ void CLabStateFile::PutBytes(const std::string& key_I, const std::vector<uint8_t
 }
 
 void CLabStateFile::CopyChanged(const std::string& key_I, std::vector<uint8_t>& entry_IO,
-                                const std::vector<uint8_t>& bytes_I, size_t begin_I,
-                                size_t end_I) {
+                                const std::vector<uint8_t>& bytes_I, size_t begin_I, size_t end_I) {
   // Compared before copied, chunk by chunk: a page programmed changes one.
   for (size_t offset = begin_I / kChunkSize * kChunkSize; offset < end_I; offset += kChunkSize) {
     const size_t length = std::min(kChunkSize, entry_IO.size() - offset);

@@ -32,8 +32,8 @@ class CLabStateFile {
   // bytes in [begin_I, end_I) can have changed: where this file took that
   // revision, only those are compared. A page programmed then costs a page,
   // not the flash.
-  void PutBytes(const std::string& key_I, const std::vector<uint8_t>& bytes_I,
-                uint64_t revision_I, uint64_t since_I, size_t begin_I, size_t end_I);
+  void PutBytes(const std::string& key_I, const std::vector<uint8_t>& bytes_I, uint64_t revision_I,
+                uint64_t since_I, size_t begin_I, size_t end_I);
   // The entry becomes `size_I` bytes long (new bytes zero), with `length_I`
   // bytes of `data_I` at `offset_I`, which must fit.
   void PutRange(const std::string& key_I, size_t size_I, size_t offset_I, const uint8_t* data_I,
