@@ -13,7 +13,8 @@
 
 class CLabStateFile {
  public:
-  static constexpr size_t kChunkSize = 4096;
+  // A flash page: a page programmed is written through as itself.
+  static constexpr size_t kChunkSize = 256;
 
   // A part of an entry that a Put changed; `size` is the entry's size.
   struct SChange {
