@@ -79,9 +79,6 @@ class CLabBoard {
   }
   void SetTraceEnabled(bool enabled_I) { mTraceEnabled = enabled_I; }
   uint64_t GetReportCount() const { return mReportCount; }
-  // Status reads the board answered with "busy": each makes a polling host
-  // read once more, so they are the board's cost, not the host's.
-  uint64_t GetBusyAnswers() const { return mBusyAnswers; }
   // Rules of the protocol or of the flash that the host broke.
   virtual std::vector<std::string> GetViolations() const { return mViolations; }
   void ClearViolations() { mViolations.clear(); }
@@ -127,7 +124,6 @@ class CLabBoard {
   void Reenumerate(std::function<void()> boot_I);
   bool IsReenumerating() const { return mReenumerating; }
   void Violation(const std::string& text_I) { mViolations.push_back(text_I); }
-  void CountBusyAnswer() { ++mBusyAnswers; }
   double Now() const;
   // After each report: a board whose vanish fault is due drops off the bus.
   void AfterReport();
@@ -143,7 +139,6 @@ class CLabBoard {
   std::vector<SLabTraceEntry> mTrace;
   bool mTraceEnabled = true;
   uint64_t mReportCount = 0;
-  uint64_t mBusyAnswers = 0;
   std::vector<std::string> mViolations;
 
   CLabBus* mBus = nullptr;

@@ -152,6 +152,8 @@ void CLabBus::DeliverEvents() {
   std::vector<Listener> listeners;
   {
     std::lock_guard<std::recursive_mutex> guard(mLock);
+    // After most reports nothing happened: no copy of the listeners then.
+    if (mPending.empty()) return;
     events.swap(mPending);
     for (const auto& [handle, listener] : mListeners) listeners.push_back(listener);
   }
@@ -325,11 +327,15 @@ EUsbStatus CLabBus::Control(const SBinding& binding_I, uint8_t requestType_I, ui
 
 bool CLabBus::WithBoard(const SBinding& binding_I, const std::function<void(CLabBoard&)>& work_I) {
   bool held = false;
+  bool pending = false;
   {
     std::lock_guard<std::recursive_mutex> guard(mLock);
     held = Holds(binding_I);
     if (held) work_I(*binding_I.board);
+    // A bridge's transfers come by the hundred thousand and hardly ever
+    // change the bus: then the lock is not taken again to find that out.
+    pending = !mPending.empty();
   }
-  DeliverEvents();
+  if (pending) DeliverEvents();
   return held;
 }

@@ -85,8 +85,15 @@ class CLabFTDIBridge : public CLabBoard {
   LabViolationSink Sink();
   bool TakeTransfer(bool isRead_I);
   void Remember(const uint8_t* data_I, uint32_t size_I) {
-    mRecentWrites.emplace_back(data_I, data_I + size_I);
-    if (mRecentWrites.size() > kRecentWrites) mRecentWrites.pop_front();
+    // The oldest entry's buffer takes the newest transfer: no allocation
+    // per transfer once the window is full.
+    std::vector<uint8_t> entry;
+    if (mRecentWrites.size() == kRecentWrites) {
+      entry = std::move(mRecentWrites.front());
+      mRecentWrites.pop_front();
+    }
+    entry.assign(data_I, data_I + size_I);
+    mRecentWrites.push_back(std::move(entry));
   }
   void Restart();
 

@@ -91,8 +91,8 @@ CLabFTDIExAPI32::SHandle* CLabFTDIExAPI32::Find(FT_HANDLE handle_I) {
   return found == mHandles.end() ? nullptr : found->second.get();
 }
 
-FT_STATUS CLabFTDIExAPI32::OnBridge(FT_HANDLE handle_I,
-                                    const std::function<FT_STATUS(CLabFTDIBridge&)>& work_I) {
+template <typename TWork>
+FT_STATUS CLabFTDIExAPI32::OnBridge(FT_HANDLE handle_I, const TWork& work_I) {
   SHandle* entry = Find(handle_I);
   if (entry == nullptr) return FT_INVALID_HANDLE;
   FT_STATUS status = FT_IO_ERROR;

@@ -61,8 +61,10 @@ class CLabFTDIExAPI32 : public CFTDIExAPI32 {
   // The handle's entry, or null for a handle this object does not hold.
   SHandle* Find(FT_HANDLE handle_I);
   // Runs `work_I` on the handle's bridge: FT_INVALID_HANDLE for an unknown
-  // handle, FT_IO_ERROR for a bridge that is gone.
-  FT_STATUS OnBridge(FT_HANDLE handle_I, const std::function<FT_STATUS(CLabFTDIBridge&)>& work_I);
+  // handle, FT_IO_ERROR for a bridge that is gone. A template: a transfer
+  // is the common case and should not allocate to wrap its work.
+  template <typename TWork>
+  FT_STATUS OnBridge(FT_HANDLE handle_I, const TWork& work_I);
 
   std::shared_ptr<CLabBus> mBus;
   std::mutex mLock;

@@ -98,6 +98,10 @@ class CLabFaults {
   void AddAt(uint64_t reports_I, const SLabFault& fault_I);
   // Reports that have passed the wrapper since it was made.
   uint64_t GetReportCount() const { return mReports; }
+  // Answers in which the board told the host to wait (a busy flag, a
+  // controller still restarting): polls whose length the chip decides.
+  void NoteBusyAnswer() { ++mBusyAnswers; }
+  uint64_t GetBusyAnswers() const { return mBusyAnswers; }
   void Clear();
   void SetSeed(uint64_t seed_I) { mRandom.seed(seed_I); }
   bool Empty() const;
@@ -141,6 +145,7 @@ class CLabFaults {
   std::vector<uint32_t> mStale;     // countdowns, one per stale fault
   uint32_t mNoReplies = 0;
   uint64_t mReports = 0;
+  uint64_t mBusyAnswers = 0;
   std::vector<std::pair<uint64_t, SLabFault>> mPending;  // held back by AddAt
   std::mt19937_64 mRandom{0x7A5Cu};
 };

@@ -1,6 +1,15 @@
 #include "lab/CLabI2CBus.h"
 
 void CLabI2CBus::Drive(EDrive scl_I, EDrive sda_I) {
+  // The bus settles after every change, so the same drive again is no event,
+  // and where one line changes the order of the two does not matter.
+  if (scl_I == mMasterScl && sda_I == mMasterSda) return;
+  if (scl_I == mMasterScl || sda_I == mMasterSda) {
+    mMasterScl = scl_I;
+    mMasterSda = sda_I;
+    Settle();
+    return;
+  }
   const bool sclRises = !mScl && scl_I != EDrive::eLow;
   if (sclRises) {
     mMasterSda = sda_I;

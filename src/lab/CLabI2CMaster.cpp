@@ -108,13 +108,17 @@ bool CLabI2CMaster::OnGetFeature(const DeviceInfo&, std::vector<uint8_t>& report
   std::vector<uint8_t>& r = report_IO;
   if (r[0] == 0xB0 && r.size() == 3) {
     const ESlaveMode mode = CurrentSlaveMode();
-    if (mode == ESlaveMode::eRestarting) return false;
+    if (mode == ESlaveMode::eRestarting) {
+      Faults().NoteBusyAnswer();
+      return false;
+    }
     r[1] = r[2] = mode == ESlaveMode::eLoader ? 0 : 1;
     return true;
   }
   if (r[0] == 0xB2 && r.size() == 6) {
     std::fill(r.begin() + 1, r.end(), 0);
     if (Faults().TakeBusy()) {
+      Faults().NoteBusyAnswer();
       r[1] = kBusy;
       return true;
     }
@@ -126,6 +130,7 @@ bool CLabI2CMaster::OnGetFeature(const DeviceInfo&, std::vector<uint8_t>& report
   if (r[0] == 0xB1 && r.size() == 266) {
     std::fill(r.begin() + 1, r.end(), 0);
     if (Faults().TakeBusy()) {
+      Faults().NoteBusyAnswer();
       r[1] = kBusy;
       return true;
     }

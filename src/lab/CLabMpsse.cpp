@@ -56,19 +56,31 @@ size_t CLabMpsse::Read(uint8_t* data_O, size_t size_I) {
 }
 
 void CLabMpsse::Write(const uint8_t* data_I, size_t size_I) {
-  mIn.insert(mIn.end(), data_I, data_I + size_I);
-  while (!mIn.empty()) {
-    const size_t length = CommandLength();
-    if (length == 0 || mIn.size() < length) return;
-    const std::vector<uint8_t> command(mIn.begin(),
-                                       mIn.begin() + static_cast<std::ptrdiff_t>(length));
-    mIn.erase(mIn.begin(), mIn.begin() + static_cast<std::ptrdiff_t>(length));
-    Run(command);
+  // Whole commands run from the host's buffer as it stands; only a command
+  // split across writes is kept until the rest comes.
+  if (mIn.empty()) {
+    const size_t taken = RunCommands(data_I, size_I);
+    mIn.assign(data_I + taken, data_I + size_I);
+    return;
   }
+  mIn.insert(mIn.end(), data_I, data_I + size_I);
+  const size_t taken = RunCommands(mIn.data(), mIn.size());
+  mIn.erase(mIn.begin(), mIn.begin() + static_cast<std::ptrdiff_t>(taken));
 }
 
-size_t CLabMpsse::CommandLength() const {
-  switch (mIn[0]) {
+size_t CLabMpsse::RunCommands(const uint8_t* data_I, size_t size_I) {
+  size_t taken = 0;
+  while (taken < size_I) {
+    const size_t length = CommandLength(data_I + taken, size_I - taken);
+    if (length == 0 || size_I - taken < length) break;
+    Run(data_I + taken, length);
+    taken += length;
+  }
+  return taken;
+}
+
+size_t CLabMpsse::CommandLength(const uint8_t* command_I, size_t available_I) {
+  switch (command_I[0]) {
     case SET_DATA_BITS_LOW_BYTE:
     case SET_DATA_BITS_HIGH_BYTE:
     case SET_CLK_DIVISOR:
@@ -78,13 +90,13 @@ size_t CLabMpsse::CommandLength() const {
     case MSB_RISING_EDGE_CLOCK_BIT_IN: return 2;
     case MSB_FALLING_EDGE_CLOCK_BIT_OUT: return 3;
     case MSB_FALLING_EDGE_CLOCK_BYTE_OUT:
-      if (mIn.size() < 3) return 0;
-      return 3 + (mIn[1] | (mIn[2] << 8)) + 1u;
+      if (available_I < 3) return 0;
+      return 3 + (command_I[1] | (command_I[2] << 8)) + 1u;
     default: return 1;
   }
 }
 
-void CLabMpsse::Run(const std::vector<uint8_t>& command_I) {
+void CLabMpsse::Run(const uint8_t* command_I, size_t length_I) {
   const uint8_t opcode = command_I[0];
   switch (opcode) {
     case SET_DATA_BITS_LOW_BYTE: SetLow(command_I[1], command_I[2]); break;
@@ -98,7 +110,7 @@ void CLabMpsse::Run(const std::vector<uint8_t>& command_I) {
       break;
     case READ_DATA_BITS_HIGH_BYTE: mOut.push_back(mHighValue); break;
     case MSB_FALLING_EDGE_CLOCK_BYTE_OUT: {
-      const size_t count = command_I.size() - 3;
+      const size_t count = length_I - 3;
       for (size_t i = 0; i < count; ++i) ClockOut(command_I[3 + i], 8);
       break;
     }

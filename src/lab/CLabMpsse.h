@@ -27,7 +27,6 @@
 // the lab keeps no time inside a transfer.
 
 #include <cstdint>
-#include <deque>
 #include <vector>
 
 #include "lab/CLabI2CBus.h"
@@ -52,9 +51,12 @@ class CLabMpsse {
   bool GetDivideBy5() const { return mDivideBy5; }
 
  private:
-  // How many bytes the command at the front needs; 0 while unknown.
-  size_t CommandLength() const;
-  void Run(const std::vector<uint8_t>& command_I);
+  // How many bytes the command at `command_I` needs, of which `available_I`
+  // are there; 0 while unknown.
+  static size_t CommandLength(const uint8_t* command_I, size_t available_I);
+  // Runs the whole commands at the front; returns the bytes they took.
+  size_t RunCommands(const uint8_t* data_I, size_t size_I);
+  void Run(const uint8_t* command_I, size_t length_I);
   void SetLow(uint8_t value_I, uint8_t direction_I);
   void Apply();
   CLabI2CBus::EDrive PinDrive(int bit_I) const;
@@ -63,8 +65,9 @@ class CLabMpsse {
   bool DataIn() const;
 
   CLabI2CBus& mBus;
-  std::deque<uint8_t> mIn;
-  std::deque<uint8_t> mOut;
+  // A command split across writes, waiting for the rest.
+  std::vector<uint8_t> mIn;
+  std::vector<uint8_t> mOut;
   uint8_t mLowValue = 0;
   uint8_t mLowDirection = 0;
   uint8_t mHighValue = 0;

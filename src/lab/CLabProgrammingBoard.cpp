@@ -143,7 +143,7 @@ bool CLabProgrammingBoard::OnGetFeature(const DeviceInfo&, std::vector<uint8_t>&
   report_IO[1] = mDescription.target;
   report_IO[2] = mLastPhase;
   const bool busy = Now() < mBusyUntil || Faults().TakeBusy();
-  if (busy) CountBusyAnswer();
+  if (busy) Faults().NoteBusyAnswer();
   report_IO[3] = busy ? kStatusBusy : mStatus;
   return true;
 }

@@ -211,16 +211,23 @@ uint8_t CLabScalarMcu::ReadRegister(uint8_t register_I) {
     case 0x60: {
       const bool busy = mInstructionBusy > 0;
       if (busy && !mFaults.StuckBusy()) --mInstructionBusy;
+      if (busy) mFaults.NoteBusyAnswer();
       return static_cast<uint8_t>((mRegisters[0x60] & 0xFE) | (busy ? 1 : 0));
     }
     case 0x6F: {
       uint8_t value = mIsp ? 0x80 : 0x00;
+      bool busy = false;
       if (Counts(mProgramBusy)) {
         value |= 0x20;
+        busy = true;
       } else if (mIsp && mBuffer.empty()) {
         value |= 0x10;
       }
-      if (Counts(mCrcBusy)) value |= 0x04;
+      if (Counts(mCrcBusy)) {
+        value |= 0x04;
+        busy = true;
+      }
+      if (busy) mFaults.NoteBusyAnswer();
       return value;
     }
     case 0xF5: return mSub == PageSelect() ? mPage : Indirect(mPage, mSub);

@@ -33,6 +33,17 @@ void CLabSerialFlash::SetData(std::vector<uint8_t> data_I) {
   data_I.resize(mData.size(), 0xFF);
   mData = std::move(data_I);
   ++mRevision;
+  Touch(0, mData.size());
+}
+
+void CLabSerialFlash::Touch(size_t begin_I, size_t end_I) {
+  if (mDirtyBegin == mDirtyEnd) {
+    mDirtyBegin = begin_I;
+    mDirtyEnd = end_I;
+    return;
+  }
+  mDirtyBegin = std::min(mDirtyBegin, begin_I);
+  mDirtyEnd = std::max(mDirtyEnd, end_I);
 }
 
 std::vector<uint8_t> CLabSerialFlash::Execute(uint8_t opcode_I, const std::vector<uint8_t>& out_I,
@@ -116,6 +127,7 @@ void CLabSerialFlash::Erase(uint32_t address_I) {
   }
   std::fill_n(mData.begin() + static_cast<std::ptrdiff_t>(first), kBlockSize, 0xFF);
   ++mRevision;
+  Touch(first, first + kBlockSize);
   ++mErases;
 }
 
@@ -128,6 +140,7 @@ void CLabSerialFlash::Program(uint32_t address_I, const std::vector<uint8_t>& da
   }
   bool overwrote = false;
   ++mRevision;
+  Touch(address_I, address_I + data_I.size());
   for (size_t i = 0; i < data_I.size(); ++i) {
     uint8_t& cell = mData[address_I + i];
     overwrote |= (cell & data_I[i]) != data_I[i];
@@ -143,7 +156,9 @@ uint8_t CLabSerialFlash::Crc(uint32_t first_I, uint32_t last_I) const {
 }
 
 void CLabSerialFlash::Save(CLabStateFile& state_IO) const {
-  state_IO.PutBytes("flash", mData, mRevision);
+  state_IO.PutBytes("flash", mData, mRevision, mSavedRevision, mDirtyBegin, mDirtyEnd);
+  mSavedRevision = mRevision;
+  mDirtyBegin = mDirtyEnd = 0;
   state_IO.PutBytes("flashStatus", {mStatus[0], mStatus[1], mStatus[2]});
 }
 
@@ -151,6 +166,7 @@ void CLabSerialFlash::Load(const CLabStateFile& state_I) {
   std::vector<uint8_t> bytes;
   if (state_I.GetBytes("flash", bytes) && bytes.size() == mData.size()) mData = bytes;
   ++mRevision;
+  Touch(0, mData.size());
   if (state_I.GetBytes("flashStatus", bytes) && bytes.size() == 3) {
     std::copy(bytes.begin(), bytes.end(), mStatus);
   }

@@ -49,6 +49,8 @@ class CLabSerialFlash {
   // Goes up with every change of what Save writes.
   uint64_t GetRevision() const { return mRevision; }
 
+  // Puts the data, comparing only what changed since the last Save where
+  // the state file took that one.
   void Save(CLabStateFile& state_IO) const;
   void Load(const CLabStateFile& state_I);
 
@@ -56,11 +58,16 @@ class CLabSerialFlash {
   bool WriteAllowed(const std::string& what_I);
   void Erase(uint32_t address_I);
   void WriteStatus(size_t register_I, uint8_t value_I, bool protectPinHigh_I);
+  void Touch(size_t begin_I, size_t end_I);
 
   std::vector<uint8_t> mData;
   // Goes up with every change of mData and mStatus: saving after each
   // transfer then costs nothing while nothing was programmed.
   uint64_t mRevision = 1;
+  // The revision of the last Save, and the bytes of mData changed since.
+  mutable uint64_t mSavedRevision = 0;
+  mutable size_t mDirtyBegin = 0;
+  mutable size_t mDirtyEnd = 0;
   bool mThreeStatusRegisters;
   LabViolationSink mViolation;
   uint8_t mStatus[3] = {kFactoryStatus, 0, 0};

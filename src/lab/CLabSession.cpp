@@ -32,9 +32,9 @@ bool CLabSession::Finish() {
   for (const auto& board : mBus->GetBoards()) {
     TavLog::Info("Lab board %s: %llu reports\n", board->GetName().c_str(),
                  static_cast<unsigned long long>(board->Faults().GetReportCount()));
-    if (board->GetBusyAnswers() > 0) {
+    if (board->Faults().GetBusyAnswers() != 0) {
       TavLog::Info("Lab board %s: %llu busy answers\n", board->GetName().c_str(),
-                   static_cast<unsigned long long>(board->GetBusyAnswers()));
+                   static_cast<unsigned long long>(board->Faults().GetBusyAnswers()));
     }
   }
   TavLog::Info("Lab clock: %.3f s\n", CClock::Get()->Now() - mStartTime);

@@ -8,11 +8,10 @@
 //
 // At its end the run logs what it cost the boards: "Lab board NAME: N
 // reports" for each (every transfer that reached the board, failed or not),
-// "Lab board NAME: N busy answers" for each that answered status reads with
-// busy (reads that a polling host had to make again), "Lab clock: S s",
-// the time the run took on the lab's clock, and "Lab waits: S s", the part
-// of it in which the program was asleep (on the virtual clock, where only
-// sleeps move time, the two agree).
+// "Lab board NAME: N busy answers" for a board that made the host wait,
+// "Lab clock: S s", the time the run took on the lab's clock, and "Lab
+// waits: S s", the part of it in which the program was asleep (on the
+// virtual clock, where only sleeps move time, the two agree).
 
 #include <memory>
 

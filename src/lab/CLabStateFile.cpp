@@ -23,12 +23,32 @@ void CLabStateFile::PutBytes(const std::string& key_I, const std::vector<uint8_t
     mChanges.push_back({key_I, bytes.size(), 0, bytes.size()});
     return;
   }
+  CopyChanged(key_I, bytes, bytes_I, 0, bytes.size());
+}
+
+void CLabStateFile::PutBytes(const std::string& key_I, const std::vector<uint8_t>& bytes_I,
+                             uint64_t revision_I, uint64_t since_I, size_t begin_I, size_t end_I) {
+  auto known = mRevisions.find(key_I);
+  auto entry = mEntries.find(key_I);
+  const bool tookSince = since_I != 0 && known != mRevisions.end() && known->second == since_I &&
+                         entry != mEntries.end() && entry->second.size() == bytes_I.size();
+  if (!tookSince || revision_I == 0) {
+    PutBytes(key_I, bytes_I, revision_I);
+    return;
+  }
+  known->second = revision_I;
+  CopyChanged(key_I, entry->second, bytes_I, std::min(begin_I, bytes_I.size()),
+              std::min(end_I, bytes_I.size()));
+}
+
+void CLabStateFile::CopyChanged(const std::string& key_I, std::vector<uint8_t>& entry_IO,
+                                const std::vector<uint8_t>& bytes_I, size_t begin_I, size_t end_I) {
   // Compared before copied, chunk by chunk: a page programmed changes one.
-  for (size_t offset = 0; offset < bytes.size(); offset += kChunkSize) {
-    const size_t length = std::min(kChunkSize, bytes.size() - offset);
-    if (std::memcmp(bytes.data() + offset, bytes_I.data() + offset, length) == 0) continue;
-    std::memcpy(bytes.data() + offset, bytes_I.data() + offset, length);
-    mChanges.push_back({key_I, bytes.size(), offset, length});
+  for (size_t offset = begin_I / kChunkSize * kChunkSize; offset < end_I; offset += kChunkSize) {
+    const size_t length = std::min(kChunkSize, entry_IO.size() - offset);
+    if (std::memcmp(entry_IO.data() + offset, bytes_I.data() + offset, length) == 0) continue;
+    std::memcpy(entry_IO.data() + offset, bytes_I.data() + offset, length);
+    mChanges.push_back({key_I, entry_IO.size(), offset, length});
   }
 }
 

@@ -13,7 +13,8 @@
 
 class CLabStateFile {
  public:
-  static constexpr size_t kChunkSize = 4096;
+  // A flash page: a page programmed is written through as itself.
+  static constexpr size_t kChunkSize = 256;
 
   // A part of an entry that a Put changed; `size` is the entry's size.
   struct SChange {
@@ -28,6 +29,12 @@ class CLabStateFile {
   // flash contents are put after every report.
   void PutBytes(const std::string& key_I, const std::vector<uint8_t>& bytes_I,
                 uint64_t revision_I = 0);
+  // As above, from one who knows that since revision `since_I` only the
+  // bytes in [begin_I, end_I) can have changed: where this file took that
+  // revision, only those are compared. A page programmed then costs a page,
+  // not the flash.
+  void PutBytes(const std::string& key_I, const std::vector<uint8_t>& bytes_I, uint64_t revision_I,
+                uint64_t since_I, size_t begin_I, size_t end_I);
   // The entry becomes `size_I` bytes long (new bytes zero), with `length_I`
   // bytes of `data_I` at `offset_I`, which must fit.
   void PutRange(const std::string& key_I, size_t size_I, size_t offset_I, const uint8_t* data_I,
@@ -47,6 +54,10 @@ class CLabStateFile {
   bool Load(const std::string& path_I);
 
  private:
+  // Copies the chunks of [begin_I, end_I) that differ, noting each.
+  void CopyChanged(const std::string& key_I, std::vector<uint8_t>& entry_IO,
+                   const std::vector<uint8_t>& bytes_I, size_t begin_I, size_t end_I);
+
   std::map<std::string, std::vector<uint8_t>> mEntries;
   std::map<std::string, uint64_t> mRevisions;
   std::vector<SChange> mChanges;

@@ -1,5 +1,6 @@
 #include "scalar/CI2CConnectorFTDI.h"
 
+#include <array>
 #include <cstdint>
 
 #include "common/CClock.h"
@@ -56,10 +57,14 @@ CFTDIExAPI32& Api() {
 
 void* ByValue(uint32_t value_I) { return reinterpret_cast<void*>(static_cast<uintptr_t>(value_I)); }
 
-void AppendPins(std::vector<uint8_t>& command_IO, uint8_t value_I, uint8_t direction_I,
-                int times_I) {
+// `times_I` pin commands of value and direction, from `at_IO` on.
+template <size_t N>
+void AppendPins(std::array<uint8_t, N>& command_IO, size_t& at_IO, uint8_t value_I,
+                uint8_t direction_I, int times_I) {
   for (int i = 0; i < times_I; ++i) {
-    command_IO.insert(command_IO.end(), {SET_DATA_BITS_LOW_BYTE, value_I, direction_I});
+    command_IO[at_IO++] = SET_DATA_BITS_LOW_BYTE;
+    command_IO[at_IO++] = value_I;
+    command_IO[at_IO++] = direction_I;
   }
 }
 
@@ -258,65 +263,64 @@ FT_STATUS CI2CConnectorFTDI::WriteAndCheckQueueEmpty(uint8_t command_I) {
   return FT_OK;
 }
 
-FT_STATUS CI2CConnectorFTDI::I2CWrite(const std::vector<uint8_t>& bytes_I) {
-  ScalarTrace::Bytes("I2CWrite buffer", bytes_I);
+FT_STATUS CI2CConnectorFTDI::I2CWrite(const uint8_t* bytes_I, size_t size_I) {
+  ScalarTrace::Bytes("I2CWrite buffer", bytes_I, size_I);
   uint32_t written = 0;
   const FT_STATUS status =
-      Api().FT_Write(mHandle, bytes_I.data(), static_cast<uint32_t>(bytes_I.size()), &written);
+      Api().FT_Write(mHandle, bytes_I, static_cast<uint32_t>(size_I), &written);
   if (status != FT_OK) {
     SCALAR_TRACE(Error, "FT_Write failed (%i)\n", status);
     return status;
   }
-  if (written != bytes_I.size()) {
-    SCALAR_TRACE(Error, "I2CWrite had %lu sent %i\n", bytes_I.size(), written);
+  if (written != size_I) {
+    SCALAR_TRACE(Error, "I2CWrite had %lu sent %i\n", size_I, written);
     return kStatusShortTransfer;
   }
   return FT_OK;
 }
 
 FT_STATUS CI2CConnectorFTDI::I2CStart() {
-  std::vector<uint8_t> command;
-  command.reserve(36);
-  AppendPins(command, BOTH_LINES, BOTH_LINES, 4);  // both lines high
-  AppendPins(command, SCL, BOTH_LINES, 4);         // SDA falls while SCL is high
-  AppendPins(command, 0x00, BOTH_LINES, 4);        // both low
+  std::array<uint8_t, 36> command;
+  size_t at = 0;
+  AppendPins(command, at, BOTH_LINES, BOTH_LINES, 4);  // both lines high
+  AppendPins(command, at, SCL, BOTH_LINES, 4);         // SDA falls while SCL is high
+  AppendPins(command, at, 0x00, BOTH_LINES, 4);        // both low
   // A failed start shows at the first byte's acknowledge.
-  I2CWrite(command);
+  I2CWrite(command.data(), at);
   return FT_OK;
 }
 
 FT_STATUS CI2CConnectorFTDI::I2CStop() {
-  std::vector<uint8_t> command;
-  command.reserve(27);
-  AppendPins(command, SCL, BOTH_LINES, 4);         // SCL high, SDA low
-  AppendPins(command, BOTH_LINES, BOTH_LINES, 4);  // SDA rises: both high
-  AppendPins(command, SDA_O, BOTH_LINES, 1);       // SCL low, SDA high: idle
-  return I2CWrite(command);
+  std::array<uint8_t, 27> command;
+  size_t at = 0;
+  AppendPins(command, at, SCL, BOTH_LINES, 4);         // SCL high, SDA low
+  AppendPins(command, at, BOTH_LINES, BOTH_LINES, 4);  // SDA rises: both high
+  AppendPins(command, at, SDA_O, BOTH_LINES, 1);       // SCL low, SDA high: idle
+  return I2CWrite(command.data(), at);
 }
 
 FT_STATUS CI2CConnectorFTDI::I2CSendByte(uint8_t byte_I, bool wait_I) {
-  std::vector<uint8_t> command;
-  command.reserve(13);
-  command = {MSB_FALLING_EDGE_CLOCK_BYTE_OUT,
-             0x00,
-             0x00,
-             byte_I,
-             SET_DATA_BITS_LOW_BYTE,
-             0x00,
-             SCL,  // SCL driven low, SDA released
-             MSB_RISING_EDGE_CLOCK_BIT_IN,
-             0x00,  // the acknowledge bit
-             SEND_ANSWER_BACK_IMMEDIATE,
-             SET_DATA_BITS_LOW_BYTE,
-             0x00,
-             BOTH_LINES};
-  FT_STATUS status = I2CWrite(command);
+  const std::array<uint8_t, 13> command{MSB_FALLING_EDGE_CLOCK_BYTE_OUT,
+                                        0x00,
+                                        0x00,
+                                        byte_I,
+                                        SET_DATA_BITS_LOW_BYTE,
+                                        0x00,
+                                        SCL,  // SCL driven low, SDA released
+                                        MSB_RISING_EDGE_CLOCK_BIT_IN,
+                                        0x00,  // the acknowledge bit
+                                        SEND_ANSWER_BACK_IMMEDIATE,
+                                        SET_DATA_BITS_LOW_BYTE,
+                                        0x00,
+                                        BOTH_LINES};
+  FT_STATUS status = I2CWrite(command.data(), command.size());
   if (status != FT_OK) {
     SCALAR_TRACE(Error, "I2CSendByte write failed (%i)\n", status);
     return status;
   }
   // SDA released high, SCL low, whatever the slave answered.
-  status = I2CWrite({SET_DATA_BITS_LOW_BYTE, SDA_O, BOTH_LINES});
+  static constexpr uint8_t kReleaseSda[] = {SET_DATA_BITS_LOW_BYTE, SDA_O, BOTH_LINES};
+  status = I2CWrite(kReleaseSda, sizeof kReleaseSda);
   if (status != FT_OK) SCALAR_TRACE(Error, "I2CSendByte direction reset failed (%i)\n", status);
   if (wait_I) TavSleep(kByteWaitSeconds);
 
@@ -333,21 +337,20 @@ FT_STATUS CI2CConnectorFTDI::I2CSendByte(uint8_t byte_I, bool wait_I) {
 }
 
 std::pair<FT_STATUS, uint8_t> CI2CConnectorFTDI::I2CGetByte(bool ack_I) {
-  std::vector<uint8_t> command;
-  command.reserve(13);
-  command = {SET_DATA_BITS_LOW_BYTE,
-             0x00,
-             SCL,  // SDA released
-             MSB_FALLING_EDGE_CLOCK_BYTE_IN,
-             0x00,
-             0x00,
-             SET_DATA_BITS_LOW_BYTE,
-             0x00,
-             BOTH_LINES,
-             MSB_FALLING_EDGE_CLOCK_BIT_OUT,
-             0x00,
-             static_cast<uint8_t>(ack_I ? 0x00 : 0x80)};  // the master's acknowledge
-  const FT_STATUS status = I2CWrite(command);
+  const std::array<uint8_t, 12> command{
+      SET_DATA_BITS_LOW_BYTE,
+      0x00,
+      SCL,  // SDA released
+      MSB_FALLING_EDGE_CLOCK_BYTE_IN,
+      0x00,
+      0x00,
+      SET_DATA_BITS_LOW_BYTE,
+      0x00,
+      BOTH_LINES,
+      MSB_FALLING_EDGE_CLOCK_BIT_OUT,
+      0x00,
+      static_cast<uint8_t>(ack_I ? 0x00 : 0x80)};  // the master's acknowledge
+  const FT_STATUS status = I2CWrite(command.data(), command.size());
   if (status != FT_OK) return {status, 0};
   return I2CRead1();
 }

@@ -89,7 +89,12 @@ class CI2CConnectorFTDI : public Connector {
   FT_STATUS SendBadCommand(bool check_I);
   FT_STATUS WriteAndCheckQueueEmpty(uint8_t command_I);
 
-  FT_STATUS I2CWrite(const std::vector<uint8_t>& bytes_I);
+  FT_STATUS I2CWrite(const std::vector<uint8_t>& bytes_I) {
+    return I2CWrite(bytes_I.data(), bytes_I.size());
+  }
+  // The primitives build their few bytes on the stack: hundreds of
+  // thousands of them go out in one update.
+  FT_STATUS I2CWrite(const uint8_t* bytes_I, size_t size_I);
   FT_STATUS I2CStart();
   FT_STATUS I2CStop();
   FT_STATUS I2CSendByte(uint8_t byte_I, bool wait_I);

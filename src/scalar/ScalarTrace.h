@@ -17,6 +17,9 @@ namespace ScalarTrace {
 
 // With tracing on: the title on its own line (none when empty), then the bytes as two
 // upper-case hexadecimal digits and a blank, 16 to a line.
-void Bytes(const char* title_I, const std::vector<uint8_t>& bytes_I);
+void Bytes(const char* title_I, const uint8_t* bytes_I, size_t size_I);
+inline void Bytes(const char* title_I, const std::vector<uint8_t>& bytes_I) {
+  Bytes(title_I, bytes_I.data(), bytes_I.size());
+}
 
 }  // namespace ScalarTrace

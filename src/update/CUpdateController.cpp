@@ -328,9 +328,9 @@ CUpdateController::InterfacePtr CUpdateController::GetLoaderMode() {
     ProcessStateChange(ESTATE_WAIT_LOADER);
 
     // A vendor-class interface takes requests only once it is claimed, so it
-    // is opened before its switch. A HID interface's switch opens it itself;
-    // opened here first, it would be sent an alive probe for nothing.
-    if (active->GetInterfaceType() != EHID_INTERFACE && !active->Open()) {
+    // is opened before its switch. A HID or I2C interface's switch opens it
+    // itself; opened here first, it would be sent an alive probe for nothing.
+    if (active->GetInterfaceType() == EBULK_INTERFACE && !active->Open()) {
       CallbackLog("Could not open the interface before the switch");
     }
     if (!active->SwitchToBLMode()) {

@@ -3,11 +3,13 @@
 #include <gtest/gtest.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <set>
 
+#include "lab/CLabSerialFlash.h"
 #include "lab/CLabStateJournal.h"
 
 namespace {
@@ -47,7 +49,8 @@ class LabStateJournal : public ::testing::Test {
 
 TEST_F(LabStateJournal, AKillBetweenAnyTwoWritesLeavesTheStateOfAWholeReport) {
   CLabStateJournal journal;
-  Bytes flash(3 * CLabStateFile::kChunkSize, 0xFF);
+  constexpr size_t kChunk = CLabStateFile::kChunkSize;
+  Bytes flash(4 * kChunk, 0xFF);
   journal.State().PutBytes("flash", flash);
   journal.State().PutNumber("mode", 0);
   ASSERT_TRUE(journal.Open(mPath));
@@ -62,9 +65,9 @@ TEST_F(LabStateJournal, AKillBetweenAnyTwoWritesLeavesTheStateOfAWholeReport) {
   };
   const SStep steps[] = {{0, 256, 0x11, 0, false},
                          {0, 0, 0, 1, false},
-                         {4000, 4500, 0x22, 1, true},
+                         {kChunk - 96, kChunk + 404, 0x22, 1, true},
                          {0, 0, 0, 1, true},
-                         {8100, 200, 0x00, 0, true}};
+                         {2 * kChunk - 92, 200, 0x00, 0, true}};
   std::vector<SLoaded> after{Snapshot(journal.State())};
   std::vector<size_t> logSizes{0};
   for (const SStep& step : steps) {
@@ -104,7 +107,7 @@ TEST_F(LabStateJournal, AKillBetweenAnyTwoWritesLeavesTheStateOfAWholeReport) {
 
 TEST_F(LabStateJournal, FoldingEmptiesTheLogAndALogLeftOverFromBeforeChangesNothing) {
   CLabStateJournal journal;
-  Bytes flash(2 * CLabStateFile::kChunkSize, 0xFF);
+  Bytes flash(std::max<size_t>(2 * CLabStateFile::kChunkSize, 8 * 256), 0xFF);
   journal.State().PutBytes("flash", flash);
   ASSERT_TRUE(journal.Open(mPath));
   for (int page = 0; page < 8; ++page) {
@@ -121,6 +124,42 @@ TEST_F(LabStateJournal, FoldingEmptiesTheLogAndALogLeftOverFromBeforeChangesNoth
   // A kill between the new snapshot and emptying the log.
   WriteFile(CLabStateJournal::LogPath(mPath), log, log.size());
   EXPECT_EQ(LoadFolder(mPath), folded);
+}
+
+// The flash compares only what changed since a file took its last save;
+// a file that missed a save in between is compared whole, so what changed
+// before that save still reaches it.
+TEST(LabSerialFlashSave, EachFileSeesEveryChangeSinceItLastTookTheFlash) {
+  CLabSerialFlash flash(2, false, [](const std::string&) {});
+  const auto program = [&flash](uint32_t address_I, uint8_t value_I) {
+    flash.Execute(0x06, {}, 0, true);
+    flash.Execute(0x01, {0x00}, 0, true);  // protection off
+    flash.Execute(0x06, {}, 0, true);
+    flash.Program(address_I, Bytes(256, value_I));
+  };
+  const auto offsets = [](CLabStateFile& state_I) {
+    std::set<size_t> changed;
+    for (const auto& change : state_I.TakeChanges()) {
+      if (change.key == "flash") changed.insert(change.offset);
+    }
+    return changed;
+  };
+  CLabStateFile journal, other;
+  flash.Save(journal);
+  journal.TakeChanges();
+  program(0x1000, 0x11);
+  flash.Save(other);
+  program(0x9000, 0x22);
+  flash.Save(journal);
+  const auto chunk = [](size_t address_I) {
+    return address_I / CLabStateFile::kChunkSize * CLabStateFile::kChunkSize;
+  };
+  EXPECT_EQ(offsets(journal), (std::set<size_t>{chunk(0x1000), chunk(0x9000)}));
+  EXPECT_EQ(journal.Entry("flash"), flash.GetData());
+  program(0xA100, 0x33);
+  flash.Save(journal);
+  EXPECT_EQ(offsets(journal), (std::set<size_t>{chunk(0xA100)}));
+  EXPECT_EQ(journal.Entry("flash"), flash.GetData());
 }
 
 }  // namespace

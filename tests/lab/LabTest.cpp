@@ -7,9 +7,11 @@
 #include <thread>
 
 #include "common/CClock.h"
+#include "lab/CLabBluetooth.h"
 #include "lab/CLabDeviceRegistry.h"
 #include "lab/CLabFlash.h"
 #include "lab/CLabHidNode.h"
+#include "lab/CLabI2CMaster.h"
 #include "lab/CLabOptions.h"
 #include "lab/CLabPenController.h"
 #include "lab/CLabScalarHid.h"
@@ -235,7 +237,7 @@ TEST_F(LabBus, AProgrammingBoardRefusesABadPageAndStaysInvalid) {
   EXPECT_EQ(status(), CLabProgrammingBoard::kStatusBusy);
   EXPECT_EQ(status(), CLabProgrammingBoard::kStatusBusy);
   EXPECT_EQ(status(), CLabProgrammingBoard::kStatusReady);
-  EXPECT_EQ(scalar->GetBusyAnswers(), 3u) << "the erase and the two faults";
+  EXPECT_EQ(scalar->Faults().GetBusyAnswers(), 3u) << "the erase and the two faults";
 
   // Cut off mid-update, the board comes back under its loader identity.
   ASSERT_EQ(node.SetFeatureReport(frame(1)), EHidStatus::eSuccess);
@@ -351,6 +353,56 @@ TEST_F(LabBus, ASessionEndsWithWhatItCostTheBoards) {
   EXPECT_TRUE(log.LogContains("Lab board polled: 1 busy answers\n"));
   EXPECT_TRUE(log.LogContains("Lab clock: 2.500 s\n"));
   EXPECT_TRUE(log.LogContains("Lab waits: 2.500 s\n"));
+  std::filesystem::remove_all(folder);
+}
+
+// Polls whose length the chip decides are told apart by the busy answers
+// the summary names: a Bluetooth module erasing after its start, a tunnel
+// master whose controller is restarting. A board that never made the host
+// wait gets no such line.
+TEST_F(LabBus, TheSummaryCountsTheAnswersThatMadeTheHostWait) {
+  const std::filesystem::path folder =
+      std::filesystem::temp_directory_path() / ("tavik-lab-busy-" + std::to_string(::getpid()));
+  auto module = std::make_shared<CLabBluetooth>(CLabBluetooth::EChip::eAB1555, "module");
+  SLabI2CDescription tunnel;
+  tunnel.name = "tunnel";
+  auto master = std::make_shared<CLabI2CMaster>(tunnel);
+  auto idle = std::make_shared<CLabPenController>(SLabPenDescription{.name = "idle"});
+  mBus->Plug(module);
+  mBus->Plug(master);
+  mBus->Plug(idle);
+  CLabOptions options;
+  options.SetStateFolder(folder.string());
+  LogCapture log;
+  {
+    CLabSession session(mBus, options);
+    session.Start();
+    CLabHidNode moduleNode(mBus), masterNode(mBus), idleNode(mBus);
+    ASSERT_EQ(moduleNode.Open(Listed(*module)), EHidStatus::eSuccess);
+    ASSERT_EQ(masterNode.Open(Listed(*master)), EHidStatus::eSuccess);
+    ASSERT_EQ(idleNode.Open(Listed(*idle)), EHidStatus::eSuccess);
+    Bytes start(512, 0);
+    start[0] = 0xE4, start[1] = 6, start[2] = 1;
+    moduleNode.SetFeatureReport(start);
+    EXPECT_EQ(masterNode.SetFeatureReport({0xB0, 0, 0}), EHidStatus::eSuccess);
+    Bytes status(512, 0), mode{0xB0, 0xFF, 0xFF}, idleStatus{0x14, 0, 0, 0, 0};
+    for (int read = 0; read < 2; ++read) {
+      status[0] = 0xE4;
+      ASSERT_EQ(moduleNode.GetFeatureReport(status), EHidStatus::eSuccess);
+      EXPECT_EQ(status[3], 1) << "erasing";
+      EXPECT_NE(masterNode.GetFeatureReport(mode), EHidStatus::eSuccess) << "restarting";
+      idleNode.GetFeatureReport(idleStatus);
+    }
+    TavSleep(5.0);
+    status[0] = 0xE4;
+    ASSERT_EQ(moduleNode.GetFeatureReport(status), EHidStatus::eSuccess);
+    EXPECT_EQ(status[3], 0);
+    EXPECT_EQ(masterNode.GetFeatureReport(mode), EHidStatus::eSuccess);
+  }
+  EXPECT_TRUE(log.LogContains("Lab board module: 4 reports\n"));
+  EXPECT_TRUE(log.LogContains("Lab board module: 2 busy answers\n"));
+  EXPECT_TRUE(log.LogContains("Lab board tunnel: 2 busy answers\n"));
+  EXPECT_FALSE(log.LogContains("Lab board idle: 0 busy answers"));
   std::filesystem::remove_all(folder);
 }
 

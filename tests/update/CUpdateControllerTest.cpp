@@ -216,10 +216,10 @@ TEST_F(Failure, EachFaultEndsInItsStatesErrorsAndCalls) {
     {"init fails", programFails,
      {Error(EERROR_INTERFACE, "InitCheckForSRecData: Error Initializing Board"), general}, 3.0,
      afterInit, [this] { mLoader->mFails = {"Init"}; }},
-    // Opened once for the switch; never again as a loader.
+    // The switch opens the board itself; never opened again as a loader.
     {"an I2C board does not enter its loader", toLoader,
      {Error(EERROR_PROGRAM, "I2C Device failed to switch to Loader mode")}, 0.0,
-     {"pen.RegisterCallback", "pen.Open", "pen.SwitchToBLMode"},
+     {"pen.RegisterCallback", "pen.SwitchToBLMode"},
      [this] { ConnectPenOf(EI2C_INTERFACE, true); mPen->mFails = {"SwitchToBLMode"}; }},
     // Reported twice, and no waits on I2C.
     {"an I2C board does not leave its loader", leaveFails,
