@@ -3,8 +3,10 @@
 // it holds, as text or JSON, and can write the loaded image as flat bytes.
 // Nothing is sent to a device.
 
+#include <cstdint>
 #include <cstdio>
 #include <string>
+#include <vector>
 
 #include "common/TavTypes.h"
 
@@ -25,9 +27,13 @@ class CFirmwareReportCommand {
 
  private:
   bool Load(CSRec& source_IO, std::string& reason_O) const;
-  void PrintText(const CSRec& source_I, std::FILE* out_IO) const;
-  void PrintJson(const CSRec& source_I, std::FILE* out_IO) const;
-  bool WriteImage(const CSRec& source_I, std::string& reason_O) const;
+  // sums_I: the byte sum of each S-record block, in list order.
+  void PrintText(const CSRec& source_I, const std::vector<uint64_t>& sums_I,
+                 std::FILE* out_IO) const;
+  void PrintJson(const CSRec& source_I, const std::vector<uint64_t>& sums_I,
+                 std::FILE* out_IO) const;
+  bool WriteImage(const CSRec& source_I, std::vector<uint64_t>& sums_O,
+                  std::string& reason_O) const;
 
   std::string mFile;
   std::string mInterfaceName;
