@@ -9,6 +9,7 @@
 #include <charconv>
 #include <cstdio>
 #include <cstring>
+#include <memory>
 #include <vector>
 
 #include "app/CCommandLine.h"
@@ -84,6 +85,14 @@ std::vector<uint64_t> ByteSums(const std::vector<SContinuousDataBlock>& blocks_I
     sums[i] = ByteSum(blocks_I[i].data);
   }
   return sums;
+}
+
+// Freeing the many blocks of a large image costs more than the rest of the
+// ending: the last source loaded is kept, reachable, until the process ends.
+void KeepUntilExit(std::unique_ptr<CSRec> source_I) {
+  static CSRec* sKept = nullptr;
+  delete sKept;
+  sKept = source_I.release();
 }
 
 // The reader's own words: its first error line, or, where it only raised an
@@ -246,7 +255,9 @@ int CFirmwareReportCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
                  mInterfaceName.c_str());
     return ERUN_USAGE;
   }
-  CSRec source;
+  auto kept = std::make_unique<CSRec>();
+  CSRec& source = *kept;
+  KeepUntilExit(std::move(kept));
   std::string reason;
   // A FIFO would block the reader and an oversized binary be read whole:
   // such a file is refused before it is opened.
