@@ -154,8 +154,12 @@ bool CSRec::LoadSRecFile(const std::string& path_I) {
   if (fstat(fileno(file), &status) == 0 && S_ISREG(status.st_mode)) {
     mBlockBuilder.ReserveFor(static_cast<uint64_t>(status.st_size));
   }
-  CTextLineReader reader(file);
-  const bool read = ReadSRecLines(reader);
+  bool read = false;
+  {
+    // The reader's buffer goes before the blocks are built.
+    CTextLineReader reader(file);
+    read = ReadSRecLines(reader);
+  }
   std::fclose(file);
   return read && FinishSRecData();
 }

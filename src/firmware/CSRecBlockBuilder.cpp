@@ -9,6 +9,11 @@
 
 void CSRecBlockBuilder::Clear() {
   mRecords = {};
+  mStaged = {};
+  mPendingFirst = 0;
+  mPendingData = {};
+  mImage.Clear();
+  mImage.SetBudget(0);
   mData.Clear();
   mAscending = true;
   mLastEnd = 0;
@@ -21,16 +26,42 @@ void CSRecBlockBuilder::ReserveFor(uint64_t textBytes_I) {
   static constexpr uint64_t kShortestRecord = 11;
   static constexpr uint64_t kMostReserved = uint64_t{1} << 26;
   mRecords.reserve(static_cast<size_t>(std::min(textBytes_I / kShortestRecord, kMostReserved)));
+  static constexpr uint64_t kPartlyUsed = 16 * CStagingImage::kPageSize;
+  mImage.SetBudget(textBytes_I / 2 + kPartlyUsed);
 }
 
 void CSRecBlockBuilder::Add(uint32_t address_I, const uint8_t* data_I, size_t size_I) {
   mRecords.push_back({address_I, static_cast<uint32_t>(size_I)});
-  if (size_I > 0) std::memcpy(mData.Append(size_I), data_I, size_I);
   mAscending = mAscending && size_I > 0 && address_I >= mLastEnd;
   mLastEnd = uint64_t{address_I} + size_I;
+  // Records in address order fill their blocks in file order as they are:
+  // they are not staged.
+  if (mAscending) {
+    mStaged.push_back(false);
+    if (size_I > 0) std::memcpy(mData.Append(size_I), data_I, size_I);
+    mPendingFirst = mRecords.size();
+    return;
+  }
+  mImage.Expect(address_I);
+  mPendingData.insert(mPendingData.end(), data_I, data_I + size_I);
+  if (mRecords.size() - mPendingFirst == kPendingRecords) StagePending();
+}
+
+void CSRecBlockBuilder::StagePending() {
+  const uint8_t* data = mPendingData.data();
+  for (size_t record = mPendingFirst; record < mRecords.size(); ++record) {
+    const size_t size = mRecords[record].size;
+    const bool staged = mImage.Place(mRecords[record].address, data, size);
+    mStaged.push_back(staged);
+    if (!staged && size > 0) std::memcpy(mData.Append(size), data, size);
+    data += size;
+  }
+  mPendingFirst = mRecords.size();
+  mPendingData.clear();
 }
 
 std::vector<SContinuousDataBlock> CSRecBlockBuilder::Build() {
+  StagePending();
   mBlockOf.assign(mRecords.size(), kDropped);
   mBlocks.clear();
   mBlocks.reserve(mRecords.size());  // address space only, as above
@@ -50,7 +81,7 @@ std::vector<SContinuousDataBlock> CSRecBlockBuilder::Build() {
   // them resident; hand their pages back before the blocks are filled,
   // when memory peaks.
   malloc_trim(0);
-  std::vector<SContinuousDataBlock> blocks = Fill(placeOf);
+  std::vector<SContinuousDataBlock> blocks = Fill(placeOf, mAscending || !placeOf.empty());
   Clear();
   return blocks;
 }
@@ -197,29 +228,42 @@ void CSRecBlockBuilder::MergeOneByOne() {
   }
 }
 
-// Copies each kept record to its place in its block, in file order, so that
-// the stored data is given back as it is used. A block filled from its start
-// upwards grows as it fills instead of being cleared first.
-std::vector<SContinuousDataBlock> CSRecBlockBuilder::Fill(const std::vector<uint32_t>& placeOf_I) {
+// Takes each block's bytes from the staging image, then lays the records
+// kept apart over them, in file order. Every byte of a block belongs to one
+// of its records, and a staged record's bytes were never staged over, so
+// the result is each record's own data. With the list in address order the
+// blocks are filled front to back and the staging given back behind them.
+std::vector<SContinuousDataBlock> CSRecBlockBuilder::Fill(const std::vector<uint32_t>& placeOf_I,
+                                                          bool sorted_I) {
+  mImage.ForgetStaged();
   const auto place = [&placeOf_I](uint32_t block_I) {
     return placeOf_I.empty() ? block_I : placeOf_I[block_I];
   };
-  std::vector<SContinuousDataBlock> blocks(mBlocks.size());
-  for (uint32_t i = 0; i < mBlocks.size(); ++i) {
-    blocks[place(i)].startAddress = static_cast<uint32_t>(mBlocks[i].start);
+  std::vector<SBounds> bounds(mBlocks.size());
+  for (uint32_t i = 0; i < mBlocks.size(); ++i) bounds[place(i)] = mBlocks[i];
+  const bool allStaged = std::find(mStaged.begin(), mStaged.end(), false) == mStaged.end();
+  const bool anyStaged = std::find(mStaged.begin(), mStaged.end(), true) != mStaged.end();
+  if (allStaged) {
+    // Only the bounds are needed from here on.
+    mRecords = {};
+    mBlockOf = {};
+    mBlocks = {};
   }
-  static constexpr size_t kAhead = 16;
+
+  std::vector<SContinuousDataBlock> blocks(bounds.size());
+  for (size_t at = 0; at < bounds.size(); ++at) {
+    SContinuousDataBlock& block = blocks[at];
+    block.startAddress = static_cast<uint32_t>(bounds[at].start);
+    if (sorted_I) mImage.ReleaseBelow(bounds[at].start);
+    const size_t size = static_cast<size_t>(bounds[at].end - bounds[at].start);
+    block.data.reserve(size);
+    if (anyStaged) mImage.CopyOut(bounds[at].start, size, block.data, sorted_I);
+  }
+  mImage.Clear();
+  if (allStaged) return blocks;
+
   for (size_t record = 0; record < mRecords.size(); ++record) {
-    // The blocks of a shuffled file are visited at random: ask for the
-    // bookkeeping of a record well ahead, and for its block's data nearer.
-    if (record + kAhead < mRecords.size() && mBlockOf[record + kAhead] != kDropped) {
-      const uint32_t later = mBlockOf[record + kAhead];
-      __builtin_prefetch(&mBlocks[later]);
-      __builtin_prefetch(&blocks[place(later)]);
-    }
-    if (record + kAhead / 2 < mRecords.size() && mBlockOf[record + kAhead / 2] != kDropped) {
-      __builtin_prefetch(blocks[place(mBlockOf[record + kAhead / 2])].data.data());
-    }
+    if (mStaged[record]) continue;
     const size_t size = mRecords[record].size;
     const uint8_t* data = mData.ReadNext(size);
     const uint32_t block = mBlockOf[record];
@@ -227,7 +271,7 @@ std::vector<SContinuousDataBlock> CSRecBlockBuilder::Fill(const std::vector<uint
     std::vector<uint8_t>& target = blocks[place(block)].data;
     const size_t blockSize = static_cast<size_t>(mBlocks[block].end - mBlocks[block].start);
     const size_t offset = static_cast<size_t>(mRecords[record].address - mBlocks[block].start);
-    if (target.capacity() == 0) target.reserve(blockSize);
+    // Blocks that took nothing staged grow as they fill from their start.
     if (offset == target.size()) {
       target.insert(target.end(), data, data + size);
     } else {
