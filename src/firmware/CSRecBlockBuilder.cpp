@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <cstring>
+#include <memory>
 
 #include "firmware/CBlockMergeIndex.h"
 
@@ -100,19 +101,42 @@ std::vector<uint32_t> CSRecBlockBuilder::PlacesByAddress(
 }
 
 // Record numbers in address order, ties in file order: a stable radix sort
-// of the addresses with the record number in the low half of each key.
+// of the addresses with the record number in the low half of each key. Only
+// as many digits as the highest address needs, with every digit's counts
+// taken in one pass.
 std::vector<uint32_t> CSRecBlockBuilder::SortByAddress() const {
-  static constexpr unsigned kDigitBits = 11;
-  static constexpr size_t kDigits = size_t{1} << kDigitBits;
+  static constexpr unsigned kMostDigitBits = 12;
   const size_t count = mRecords.size();
-  std::vector<uint64_t> keys(count);
-  std::vector<uint64_t> sorted(count);
-  for (size_t i = 0; i < count; ++i) keys[i] = uint64_t{mRecords[i].address} << 32 | i;
-  for (unsigned shift = 32; shift < 64; shift += kDigitBits) {
-    std::vector<size_t> starts(kDigits + 1, 0);
-    for (uint64_t key : keys) ++starts[((key >> shift) & (kDigits - 1)) + 1];
-    for (size_t digit = 1; digit <= kDigits; ++digit) starts[digit] += starts[digit - 1];
-    for (uint64_t key : keys) sorted[starts[(key >> shift) & (kDigits - 1)]++] = key;
+  uint32_t highest = 0;
+  for (const SRecord& record : mRecords) highest = std::max(highest, record.address);
+  const unsigned bits = highest == 0 ? 0 : 32 - static_cast<unsigned>(__builtin_clz(highest));
+  const unsigned passes = (bits + kMostDigitBits - 1) / kMostDigitBits;
+  const unsigned digitBits = passes == 0 ? 0 : (bits + passes - 1) / passes;
+  const size_t digits = size_t{1} << digitBits;
+
+  // Neither buffer needs clearing: every key is written before it is read.
+  std::unique_ptr<uint64_t[]> keys(new uint64_t[count]);
+  std::unique_ptr<uint64_t[]> sorted(new uint64_t[passes > 0 ? count : 0]);
+  std::vector<size_t> starts(passes * digits + 1, 0);
+  for (size_t i = 0; i < count; ++i) {
+    keys[i] = uint64_t{mRecords[i].address} << 32 | i;
+    for (unsigned pass = 0; pass < passes; ++pass) {
+      ++starts[pass * digits + ((mRecords[i].address >> (pass * digitBits)) & (digits - 1))];
+    }
+  }
+  for (unsigned pass = 0; pass < passes; ++pass) {
+    size_t* start = &starts[pass * digits];
+    size_t sum = 0;
+    for (size_t digit = 0; digit < digits; ++digit) {
+      const size_t here = start[digit];
+      start[digit] = sum;
+      sum += here;
+    }
+    const unsigned shift = 32 + pass * digitBits;
+    for (size_t i = 0; i < count; ++i) {
+      const uint64_t key = keys[i];
+      sorted[start[(key >> shift) & (digits - 1)]++] = key;
+    }
     keys.swap(sorted);
   }
   std::vector<uint32_t> byAddress(count);
