@@ -8,18 +8,28 @@
 
 #include "firmware/CBlockMergeIndex.h"
 
+namespace {
+
+// Gives the storage back: assigning {} would only empty the list and keep it.
+template <typename T>
+void Release(T& list_IO) {
+  T().swap(list_IO);
+}
+
+}  // namespace
+
 void CSRecBlockBuilder::Clear() {
-  mRecords = {};
-  mStaged = {};
+  Release(mRecords);
+  Release(mStaged);
   mPendingFirst = 0;
-  mPendingData = {};
+  Release(mPendingData);
   mImage.Clear();
   mImage.SetBudget(0);
   mData.Clear();
   mAscending = true;
   mLastEnd = 0;
-  mBlockOf = {};
-  mBlocks = {};
+  Release(mBlockOf);
+  Release(mBlocks);
 }
 
 void CSRecBlockBuilder::ReserveFor(uint64_t textBytes_I) {
@@ -27,7 +37,7 @@ void CSRecBlockBuilder::ReserveFor(uint64_t textBytes_I) {
   static constexpr uint64_t kShortestRecord = 11;
   static constexpr uint64_t kMostReserved = uint64_t{1} << 26;
   mRecords.reserve(static_cast<size_t>(std::min(textBytes_I / kShortestRecord, kMostReserved)));
-  static constexpr uint64_t kPartlyUsed = 16 * CStagingImage::kPageSize;
+  static constexpr uint64_t kPartlyUsed = 2 * CStagingImage::kPageSize;
   mImage.SetBudget(textBytes_I / 2 + kPartlyUsed);
 }
 
@@ -63,27 +73,34 @@ void CSRecBlockBuilder::StagePending() {
 
 std::vector<SContinuousDataBlock> CSRecBlockBuilder::Build() {
   StagePending();
+  mImage.ForgetStaged();
+  // Sorted before the rest of the bookkeeping is made: the sort needs the
+  // most room.
+  std::vector<uint32_t> byAddress;
+  if (!mAscending) byAddress = SortByAddress();
   mBlockOf.assign(mRecords.size(), kDropped);
   mBlocks.clear();
   mBlocks.reserve(mRecords.size());  // address space only, as above
   std::vector<uint32_t> placeOf;
   if (mAscending) {
     JoinNeighbours({});
+  } else if (Disjoint(byAddress)) {
+    JoinNeighbours(byAddress);
+    placeOf = PlacesByAddress(byAddress);
   } else {
-    const std::vector<uint32_t> byAddress = SortByAddress();
-    if (Disjoint(byAddress)) {
-      JoinNeighbours(byAddress);
-      placeOf = PlacesByAddress(byAddress);
-    } else {
-      MergeOneByOne();
-    }
+    MergeOneByOne();
   }
+  Release(byAddress);
   // The sort's buffers may have come from the heap, where freeing keeps
   // them resident; hand their pages back before the blocks are filled,
   // when memory peaks.
   malloc_trim(0);
   std::vector<SContinuousDataBlock> blocks = Fill(placeOf, mAscending || !placeOf.empty());
   Clear();
+  // The bookkeeping freed here lies below the blocks in the heap, where it
+  // would stay resident for as long as the blocks live.
+  Release(placeOf);
+  malloc_trim(0);
   return blocks;
 }
 
@@ -259,19 +276,33 @@ void CSRecBlockBuilder::MergeOneByOne() {
 // blocks are filled front to back and the staging given back behind them.
 std::vector<SContinuousDataBlock> CSRecBlockBuilder::Fill(const std::vector<uint32_t>& placeOf_I,
                                                           bool sorted_I) {
-  mImage.ForgetStaged();
   const auto place = [&placeOf_I](uint32_t block_I) {
     return placeOf_I.empty() ? block_I : placeOf_I[block_I];
   };
   std::vector<SBounds> bounds(mBlocks.size());
   for (uint32_t i = 0; i < mBlocks.size(); ++i) bounds[place(i)] = mBlocks[i];
-  const bool allStaged = std::find(mStaged.begin(), mStaged.end(), false) == mStaged.end();
-  const bool anyStaged = std::find(mStaged.begin(), mStaged.end(), true) != mStaged.end();
-  if (allStaged) {
-    // Only the bounds are needed from here on.
-    mRecords = {};
-    mBlockOf = {};
-    mBlocks = {};
+  const auto overlayOf = [&](size_t record_I) {
+    const uint32_t block = mBlockOf[record_I];
+    const uint32_t size = mRecords[record_I].size;
+    if (block == kDropped) return SOverlay{kDropped, 0, size};
+    const uint64_t offset = mRecords[record_I].address - mBlocks[block].start;
+    return SOverlay{place(block), static_cast<uint32_t>(offset), size};
+  };
+  // Where few records were kept apart, only what they need is kept, and the
+  // bookkeeping of all records goes before the blocks take their room.
+  const size_t keptApart = static_cast<size_t>(std::count(mStaged.begin(), mStaged.end(), false));
+  const bool anyStaged = keptApart < mStaged.size();
+  const bool compact = keptApart <= mRecords.size() / 4;
+  std::vector<SOverlay> overlays;
+  if (compact) {
+    overlays.reserve(keptApart);
+    for (size_t record = 0; record < mRecords.size(); ++record) {
+      if (!mStaged[record]) overlays.push_back(overlayOf(record));
+    }
+    Release(mRecords);
+    Release(mStaged);
+    Release(mBlockOf);
+    Release(mBlocks);
   }
 
   std::vector<SContinuousDataBlock> blocks(bounds.size());
@@ -284,17 +315,18 @@ std::vector<SContinuousDataBlock> CSRecBlockBuilder::Fill(const std::vector<uint
     if (anyStaged) mImage.CopyOut(bounds[at].start, size, block.data, sorted_I);
   }
   mImage.Clear();
-  if (allStaged) return blocks;
 
-  for (size_t record = 0; record < mRecords.size(); ++record) {
-    if (mStaged[record]) continue;
-    const size_t size = mRecords[record].size;
+  const size_t count = compact ? overlays.size() : mRecords.size();
+  for (size_t i = 0; i < count; ++i) {
+    if (!compact && mStaged[i]) continue;
+    const SOverlay overlay = compact ? overlays[i] : overlayOf(i);
+    const size_t size = overlay.size;
     const uint8_t* data = mData.ReadNext(size);
-    const uint32_t block = mBlockOf[record];
-    if (block == kDropped || size == 0) continue;
-    std::vector<uint8_t>& target = blocks[place(block)].data;
-    const size_t blockSize = static_cast<size_t>(mBlocks[block].end - mBlocks[block].start);
-    const size_t offset = static_cast<size_t>(mRecords[record].address - mBlocks[block].start);
+    if (overlay.place == kDropped || size == 0) continue;
+    std::vector<uint8_t>& target = blocks[overlay.place].data;
+    const SBounds& span = bounds[overlay.place];
+    const size_t blockSize = static_cast<size_t>(span.end - span.start);
+    const size_t offset = overlay.offset;
     // Blocks that took nothing staged grow as they fill from their start.
     if (offset == target.size()) {
       target.insert(target.end(), data, data + size);

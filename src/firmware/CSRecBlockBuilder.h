@@ -58,6 +58,13 @@ class CSRecBlockBuilder {
     uint64_t start;
     uint64_t end;
   };
+  // A record kept apart from the staging: its block's place in the list
+  // (kDropped when the record was dropped), where in the block, how long.
+  struct SOverlay {
+    uint32_t place;
+    uint32_t offset;
+    uint32_t size;
+  };
 
   std::vector<uint32_t> SortByAddress() const;
   bool Disjoint(const std::vector<uint32_t>& byAddress_I) const;

@@ -6,26 +6,34 @@
 #include <cstring>
 #include <new>
 
-CStagingImage::~CStagingImage() { Clear(); }
+namespace {
 
-CStagingImage::SPage* CStagingImage::FindPage(uint64_t key_I) const {
-  const std::unique_ptr<CTable>& table = mTables[key_I >> kTableBits];
-  if (!table) return nullptr;
-  SPage& page = (*table)[key_I & (kTableSize - 1)];
-  return page.data == nullptr ? nullptr : &page;
+// Memory straight from the system, so that what is given back leaves the
+// process at once; aligned to its size when asked.
+uint8_t* MapAligned(size_t size_I, size_t alignment_I) {
+  const size_t mapped = size_I + alignment_I;
+  void* base = mmap(nullptr, mapped, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+  if (base == MAP_FAILED) throw std::bad_alloc();
+  const auto address = reinterpret_cast<uintptr_t>(base);
+  const uintptr_t aligned = (address + alignment_I - 1) & ~(uintptr_t{alignment_I} - 1);
+  if (aligned > address) munmap(base, aligned - address);
+  if (aligned + size_I < address + mapped) {
+    munmap(reinterpret_cast<void*>(aligned + size_I), address + mapped - aligned - size_I);
+  }
+  return reinterpret_cast<uint8_t*>(aligned);
 }
 
-// Pages come straight from the system, so that each one given back leaves
-// the process at once.
+}  // namespace
+
+CStagingImage::~CStagingImage() { Clear(); }
+
 CStagingImage::SPage& CStagingImage::MakePage(uint64_t key_I) {
-  std::unique_ptr<CTable>& table = mTables[key_I >> kTableBits];
-  if (!table) table = std::make_unique<CTable>();
-  SPage& page = (*table)[key_I & (kTableSize - 1)];
+  SPage& page = mPages[key_I];
   if (page.data != nullptr) return page;
-  page.staged = std::make_unique<uint64_t[]>(kWordsPerPage);
-  void* base = mmap(nullptr, kPageSize, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
-  if (base == MAP_FAILED) throw std::bad_alloc();
-  page.data = static_cast<uint8_t*>(base);
+  page.staged = reinterpret_cast<uint64_t*>(MapAligned(kStagedBytes, 4096));
+  page.data = MapAligned(kPageSize, kPageSize);
+  // Only a wish: without huge pages the page is taken 4 KiB at a time.
+  madvise(page.data, kPageSize, MADV_HUGEPAGE);
   ++mPagesTaken;
   return page;
 }
@@ -44,7 +52,7 @@ bool CStagingImage::Place(uint64_t address_I, const uint8_t* data_I, size_t size
     }
     const uint64_t from = std::max(address_I, key << kPageBits);
     const uint64_t to = std::min(end, (key + 1) << kPageBits);
-    if (AnyStaged(page->staged.get(), from & (kPageSize - 1), to - from)) return false;
+    if (AnyStaged(page->staged, from & (kPageSize - 1), to - from)) return false;
   }
   if ((mPagesTaken + newPages) * kPageSize > mBudget) return false;
   for (uint64_t key = firstKey; key <= lastKey; ++key) {
@@ -53,17 +61,19 @@ bool CStagingImage::Place(uint64_t address_I, const uint8_t* data_I, size_t size
     const uint64_t to = std::min(end, (key + 1) << kPageBits);
     const size_t offset = from & (kPageSize - 1);
     std::memcpy(page.data + offset, data_I + (from - address_I), to - from);
-    MarkStaged(page.staged.get(), offset, to - from);
+    MarkStaged(page.staged, offset, to - from);
   }
   return true;
 }
 
 void CStagingImage::ForgetStaged() {
   mPlacing = false;
-  for (std::unique_ptr<CTable>& table : mTables) {
-    if (!table) continue;
-    for (SPage& page : *table) page.staged.reset();
-  }
+  for (uint64_t key = 0; key < kPageCount; ++key) ForgetStaged(mPages[key]);
+}
+
+void CStagingImage::ForgetStaged(SPage& page_IO) {
+  if (page_IO.staged != nullptr) munmap(page_IO.staged, kStagedBytes);
+  page_IO.staged = nullptr;
 }
 
 void CStagingImage::CopyOut(uint64_t address_I, size_t size_I, std::vector<uint8_t>& out_IO,
@@ -86,24 +96,11 @@ void CStagingImage::CopyOut(uint64_t address_I, size_t size_I, std::vector<uint8
 
 void CStagingImage::ReleaseBelow(uint64_t address_I) {
   const uint64_t below = std::min(address_I >> kPageBits, kPageCount);
-  for (; mReleasedKeys < below; ++mReleasedKeys) {
-    // A table never made holds no page: step over it whole.
-    if (!mTables[mReleasedKeys >> kTableBits]) {
-      mReleasedKeys |= kTableSize - 1;
-      continue;
-    }
-    SPage* page = FindPage(mReleasedKeys);
-    if (page != nullptr) ReleasePage(*page);
-  }
+  for (; mReleasedKeys < below; ++mReleasedKeys) ReleasePage(mPages[mReleasedKeys]);
 }
 
 void CStagingImage::Clear() {
-  for (std::unique_ptr<CTable>& table : mTables) {
-    if (!table) continue;
-    for (SPage& page : *table) ReleasePage(page);
-    table.reset();
-  }
-  mPagesTaken = 0;
+  for (uint64_t key = 0; key < kPageCount; ++key) ReleasePage(mPages[key]);
   mReleasedKeys = 0;
   mPlacing = true;
 }
@@ -114,7 +111,7 @@ void CStagingImage::ReleasePage(SPage& page_IO) {
     --mPagesTaken;
   }
   page_IO.data = nullptr;
-  page_IO.staged.reset();
+  ForgetStaged(page_IO);
 }
 
 bool CStagingImage::AnyStaged(const uint64_t* bits_I, size_t first_I, size_t count_I) {

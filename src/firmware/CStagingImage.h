@@ -7,9 +7,11 @@
 // is staged is then exactly the data of the record that put it there. The
 // address line is taken in pages as records come, up to a budget; a record
 // that would pass the budget, or meets staged bytes, is refused and kept
-// elsewhere by the caller.
+// elsewhere by the caller. A page is 2 MiB, aligned and offered to the
+// system as a huge page where it has them: records of a shuffled file land
+// anywhere in the image, and small pages would cost a fault and a missed
+// translation for nearly every one.
 
-#include <array>
 #include <cstddef>
 #include <cstdint>
 #include <memory>
@@ -17,7 +19,7 @@
 
 class CStagingImage {
  public:
-  static constexpr unsigned kPageBits = 16;
+  static constexpr unsigned kPageBits = 21;
   static constexpr size_t kPageSize = size_t{1} << kPageBits;
 
   CStagingImage() = default;
@@ -49,23 +51,25 @@ class CStagingImage {
   void Clear();
 
  private:
-  static constexpr unsigned kTableBits = 8;
-  static constexpr size_t kTableSize = size_t{1} << kTableBits;
   static constexpr uint64_t kPageCount = (uint64_t{1} << 32) >> kPageBits;
-  static constexpr size_t kWordsPerPage = kPageSize / 64;
+  static constexpr size_t kStagedBytes = kPageSize / 8;
   struct SPage {
     uint8_t* data = nullptr;
-    std::unique_ptr<uint64_t[]> staged;  // a bit a byte
+    uint64_t* staged = nullptr;  // a bit a byte
   };
-  using CTable = std::array<SPage, kTableSize>;
 
-  SPage* FindPage(uint64_t key_I) const;
+  SPage* FindPage(uint64_t key_I) const {
+    SPage* page = &mPages[key_I];
+    return page->data == nullptr ? nullptr : page;
+  }
   SPage& MakePage(uint64_t key_I);
   static bool AnyStaged(const uint64_t* bits_I, size_t first_I, size_t count_I);
   static void MarkStaged(uint64_t* bits_IO, size_t first_I, size_t count_I);
   void ReleasePage(SPage& page_IO);
+  static void ForgetStaged(SPage& page_IO);
 
-  std::array<std::unique_ptr<CTable>, (kPageCount >> kTableBits)> mTables;
+  // A page of every 2 MiB below 4 GiB: 32 KiB.
+  std::unique_ptr<SPage[]> mPages{new SPage[kPageCount]{}};
   uint64_t mBudget = 0;
   uint64_t mPagesTaken = 0;
   uint64_t mReleasedKeys = 0;  // pages below this one are given back

@@ -10,6 +10,7 @@
 
 #include "firmware/CBlockMergeIndex.h"
 #include "firmware/CSRec.h"
+#include "firmware/CStagingImage.h"
 #include "firmware/CTextLineReader.h"
 #include "firmware/FirmwareFiles.h"
 #include "firmware/SRecReferenceMerge.h"
@@ -56,13 +57,15 @@ CRecords Scattered(std::mt19937& rng_IO, uint32_t base_I, size_t window_I, size_
   return records;
 }
 
-// Records around the edges of many 64 KiB pages, more than a small file may
-// stage: some records are staged, others kept apart, some straddle two pages.
+// Records around the edges of the staging's pages, on more pages than a
+// small file may stage: some records are staged, others kept apart, some
+// straddle two pages.
 CRecords AroundPageEdges(std::mt19937& rng_IO, size_t count_I) {
+  static constexpr unsigned kBits = CStagingImage::kPageBits;
   CRecords records;
-  const uint32_t firstPage = static_cast<uint32_t>(Below(rng_IO, 0xFF00));
+  const uint32_t firstPage = 1 + static_cast<uint32_t>(Below(rng_IO, (1u << (32 - kBits)) - 9));
   for (size_t i = 0; i < count_I; ++i) {
-    const uint32_t edge = (firstPage + static_cast<uint32_t>(Below(rng_IO, 40))) << 16;
+    const uint32_t edge = (firstPage + static_cast<uint32_t>(Below(rng_IO, 8))) << kBits;
     records.push_back({edge - 64 + static_cast<uint32_t>(Below(rng_IO, 128)),
                        RandomData(rng_IO, 1 + Below(rng_IO, 64))});
   }
