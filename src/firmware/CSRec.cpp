@@ -67,8 +67,8 @@ bool ReadEightBytes(const char* text_I, uint8_t* bytes_O, unsigned& sum_IO) {
   // A 16-bit lane holds a byte's high digit in its low half.
   const __m128i high = _mm_and_si128(values, _mm_set1_epi16(0x00FF));
   const __m128i low = _mm_srli_epi16(values, 8);
-  const __m128i bytes = _mm_packus_epi16(_mm_or_si128(_mm_slli_epi16(high, 4), low),
-                                         _mm_setzero_si128());
+  const __m128i bytes =
+      _mm_packus_epi16(_mm_or_si128(_mm_slli_epi16(high, 4), low), _mm_setzero_si128());
   _mm_storel_epi64(reinterpret_cast<__m128i*>(bytes_O), bytes);
   sum_IO += static_cast<unsigned>(_mm_cvtsi128_si32(_mm_sad_epu8(bytes, _mm_setzero_si128())));
   return true;

@@ -7,11 +7,11 @@
 //
 // The records are kept compactly while the file is read and resolved at the
 // end. Their data is staged at its own addresses where it shares no byte
-// with data staged before, and kept in file order otherwise. Where no two records share a byte, which is what tools write, a record
-// can only join the block of the record just below it or just above it in
-// address order, and a single pass over them in file order settles every
-// block. Any other file is merged record by record through CBlockMergeIndex.
-// Both give exactly the blocks of the plain walk over all blocks.
+// with data staged before, and kept in file order otherwise. Where no two
+// records share a byte, which is what tools write, a record can only join
+// the block of the record just below it or just above it in address order,
+// and a single pass over them in file order settles every block. Any other file is merged record by
+// record through CBlockMergeIndex. Both give exactly the blocks of the plain walk over all blocks.
 
 #include <cstddef>
 #include <cstdint>

@@ -107,8 +107,8 @@ TEST(SRecReader, ReadsEveryDigitOfALongRecordByTheDigitRules) {
   const struct {
     size_t at;  // in the data characters
     char with;
-  } cases[] = {{0, 'a'}, {1, 'a'}, {7, 'f'}, {15, 'G'}, {16, '@'}, {17, ':'}, {30, 'z'},
-               {31, '/'}, {47, 'F'}, {63, 'b'}, {79, 'e'}};
+  } cases[] = {{0, 'a'},  {1, 'a'},  {7, 'f'},  {15, 'G'}, {16, '@'}, {17, ':'},
+               {30, 'z'}, {31, '/'}, {47, 'F'}, {63, 'b'}, {79, 'e'}};
   for (const auto& c : cases) {
     SCOPED_TRACE(c.at);
     std::string line = plain.substr(0, plain.size() - 2);  // without its checksum
