@@ -10,8 +10,9 @@
 // with data staged before, and kept in file order otherwise. Where no two
 // records share a byte, which is what tools write, a record can only join
 // the block of the record just below it or just above it in address order,
-// and a single pass over them in file order settles every block. Any other file is merged record by
-// record through CBlockMergeIndex. Both give exactly the blocks of the plain walk over all blocks.
+// and a single pass over them in file order settles every block. Any other
+// file is merged record by record through CBlockMergeIndex. Both give
+// exactly the blocks of the plain walk over all blocks.
 
 #include <cstddef>
 #include <cstdint>
