@@ -30,7 +30,14 @@ CStagingImage::~CStagingImage() { Clear(); }
 CStagingImage::SPage& CStagingImage::MakePage(uint64_t key_I) {
   SPage& page = mPages[key_I];
   if (page.data != nullptr) return page;
-  page.staged = reinterpret_cast<uint64_t*>(MapAligned(kStagedBytes, 4096));
+  if (mNotes == nullptr) {
+    // The budget bounds the pages made while records are placed.
+    const size_t most = static_cast<size_t>(mBudget / kPageSize) * kStagedBytes;
+    mNotesMapped = (most + kPageSize - 1) & ~(kPageSize - 1);
+    mNotes = MapAligned(mNotesMapped, kPageSize);
+    madvise(mNotes, mNotesMapped, MADV_HUGEPAGE);
+  }
+  page.staged = reinterpret_cast<uint64_t*>(mNotes + mPagesMade++ * kStagedBytes);
   page.data = MapAligned(kPageSize, kPageSize);
   // Only a wish: without huge pages the page is taken 4 KiB at a time.
   madvise(page.data, kPageSize, MADV_HUGEPAGE);
@@ -68,12 +75,15 @@ bool CStagingImage::Place(uint64_t address_I, const uint8_t* data_I, size_t size
 
 void CStagingImage::ForgetStaged() {
   mPlacing = false;
-  for (uint64_t key = 0; key < kPageCount; ++key) ForgetStaged(mPages[key]);
+  ForgetStagedNotes();
 }
 
-void CStagingImage::ForgetStaged(SPage& page_IO) {
-  if (page_IO.staged != nullptr) munmap(page_IO.staged, kStagedBytes);
-  page_IO.staged = nullptr;
+void CStagingImage::ForgetStagedNotes() {
+  for (uint64_t key = 0; key < kPageCount; ++key) mPages[key].staged = nullptr;
+  if (mNotes != nullptr) munmap(mNotes, mNotesMapped);
+  mNotes = nullptr;
+  mNotesMapped = 0;
+  mPagesMade = 0;
 }
 
 void CStagingImage::CopyOut(uint64_t address_I, size_t size_I, std::vector<uint8_t>& out_IO,
@@ -101,6 +111,7 @@ void CStagingImage::ReleaseBelow(uint64_t address_I) {
 
 void CStagingImage::Clear() {
   for (uint64_t key = 0; key < kPageCount; ++key) ReleasePage(mPages[key]);
+  ForgetStagedNotes();
   mReleasedKeys = 0;
   mPlacing = true;
 }
@@ -111,7 +122,7 @@ void CStagingImage::ReleasePage(SPage& page_IO) {
     --mPagesTaken;
   }
   page_IO.data = nullptr;
-  ForgetStaged(page_IO);
+  page_IO.staged = nullptr;
 }
 
 bool CStagingImage::AnyStaged(const uint64_t* bits_I, size_t first_I, size_t count_I) {

@@ -66,10 +66,15 @@ class CStagingImage {
   static bool AnyStaged(const uint64_t* bits_I, size_t first_I, size_t count_I);
   static void MarkStaged(uint64_t* bits_IO, size_t first_I, size_t count_I);
   void ReleasePage(SPage& page_IO);
-  static void ForgetStaged(SPage& page_IO);
+  void ForgetStagedNotes();
 
   // A page of every 2 MiB below 4 GiB: 32 KiB.
   std::unique_ptr<SPage[]> mPages{new SPage[kPageCount]{}};
+  // The notes of all pages in one mapping, a page's share after another's in
+  // the order the pages are made, offered as huge pages like the data.
+  uint8_t* mNotes = nullptr;
+  size_t mNotesMapped = 0;
+  size_t mPagesMade = 0;
   uint64_t mBudget = 0;
   uint64_t mPagesTaken = 0;
   uint64_t mReleasedKeys = 0;  // pages below this one are given back
