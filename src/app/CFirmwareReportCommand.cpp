@@ -10,6 +10,7 @@
 #include <cstdio>
 #include <cstring>
 #include <memory>
+#include <thread>
 #include <vector>
 
 #include "app/CCommandLine.h"
@@ -199,6 +200,7 @@ class CImageWriter {
         break;
       }
       size_t taken = static_cast<size_t>(done);
+      mWritten += taken;
       while (left > 0 && taken >= piece->iov_len) {
         taken -= piece->iov_len;
         ++piece;
@@ -210,6 +212,18 @@ class CImageWriter {
       }
     }
     mPieces.clear();
+    StartWriteBack();
+  }
+
+  // The disk starts on what is written while the rest is still being
+  // written, so that the closing fsync has only the end left to wait for.
+  // Only a hint: the fsync reports what goes wrong.
+  void StartWriteBack() {
+    static constexpr uint64_t kStep = uint64_t{4} << 20;
+    if (mFailed || mWritten - mWrittenBack < kStep) return;
+    sync_file_range(mFd, static_cast<off_t>(mWrittenBack),
+                    static_cast<off_t>(mWritten - mWrittenBack), SYNC_FILE_RANGE_WRITE);
+    mWrittenBack = mWritten;
   }
 
   void Fail() {
@@ -223,6 +237,8 @@ class CImageWriter {
   std::vector<iovec> mPieces;
   bool mFailed = false;
   int mError = 0;
+  uint64_t mWritten = 0;
+  uint64_t mWrittenBack = 0;
 };
 
 }  // namespace
@@ -275,14 +291,21 @@ int CFirmwareReportCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
   // The blocks' sums are taken while the image is written, where each block
   // is read anyway; the listing comes after.
   std::vector<uint64_t> sums;
-  const bool written = mOutputBinary.empty() || WriteImage(source, sums, reason);
-  if (IsSRecord(source.GetDataSourceFormat()) && sums.empty()) {
-    sums = ByteSums(source.GetSRecDataRef());
-  }
-  if (mJson) {
-    PrintJson(source, sums, out_IO);
+  const auto print = [&] {
+    if (IsSRecord(source.GetDataSourceFormat()) && sums.empty()) {
+      sums = ByteSums(source.GetSRecDataRef());
+    }
+    if (mJson) {
+      PrintJson(source, sums, out_IO);
+    } else {
+      PrintText(source, sums, out_IO);
+    }
+  };
+  bool written = true;
+  if (mOutputBinary.empty()) {
+    print();
   } else {
-    PrintText(source, sums, out_IO);
+    written = WriteImage(source, sums, print, reason);
   }
   if (!written) {
     std::fprintf(err_IO, "%s: %s\n", TAV_PROGRAM_NAME, reason.c_str());
@@ -399,6 +422,7 @@ void CFirmwareReportCommand::PrintJson(const CSRec& source_I, const std::vector<
 // 0xFF, and their sums taken on the way; the other formats are written as
 // their reader holds them.
 bool CFirmwareReportCommand::WriteImage(const CSRec& source_I, std::vector<uint64_t>& sums_O,
+                                        const std::function<void()>& whileClosing_I,
                                         std::string& reason_O) const {
   // The writer takes the bytes where they lie, until it is closed.
   std::vector<uint8_t> rtdIspImage;
@@ -437,5 +461,16 @@ bool CFirmwareReportCommand::WriteImage(const CSRec& source_I, std::vector<uint6
       left -= now;
     }
   }
-  return writer.Close(reason_O);
+  // The disk takes its time over the last of the image: the listing is
+  // printed meanwhile.
+  bool closed = false;
+  std::thread closing([&] { closed = writer.Close(reason_O); });
+  try {
+    whileClosing_I();
+  } catch (...) {
+    closing.join();
+    throw;
+  }
+  closing.join();
+  return closed;
 }

@@ -5,6 +5,7 @@
 
 #include <cstdint>
 #include <cstdio>
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -32,8 +33,10 @@ class CFirmwareReportCommand {
                  std::FILE* out_IO) const;
   void PrintJson(const CSRec& source_I, const std::vector<uint64_t>& sums_I,
                  std::FILE* out_IO) const;
+  // Runs whileClosing_I once the image is written, while it is flushed to
+  // the disk and put in place.
   bool WriteImage(const CSRec& source_I, std::vector<uint64_t>& sums_O,
-                  std::string& reason_O) const;
+                  const std::function<void()>& whileClosing_I, std::string& reason_O) const;
 
   std::string mFile;
   std::string mInterfaceName;
