@@ -32,7 +32,8 @@ CStagingImage::SPage& CStagingImage::MakePage(uint64_t key_I) {
   if (page.data != nullptr) return page;
   if (mNotes == nullptr) {
     // The budget bounds the pages made while records are placed.
-    const size_t most = static_cast<size_t>(mBudget / kPageSize) * kStagedBytes;
+    const uint64_t pages = std::min(mBudget / kPageSize, kPageCount);
+    const size_t most = static_cast<size_t>(pages) * kStagedBytes;
     mNotesMapped = (most + kPageSize - 1) & ~(kPageSize - 1);
     mNotes = MapAligned(mNotesMapped, kPageSize);
     madvise(mNotes, mNotesMapped, MADV_HUGEPAGE);
