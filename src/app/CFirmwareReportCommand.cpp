@@ -1,5 +1,7 @@
 #include "app/CFirmwareReportCommand.h"
 
+#include <fcntl.h>
+#include <sys/uio.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -7,6 +9,8 @@
 #include <charconv>
 #include <cstdio>
 #include <cstring>
+#include <memory>
+#include <thread>
 #include <vector>
 
 #include "app/CCommandLine.h"
@@ -75,6 +79,23 @@ uint64_t ByteSum(const std::vector<uint8_t>& data_I) {
   return sum;
 }
 
+std::vector<uint64_t> ByteSums(const std::vector<SContinuousDataBlock>& blocks_I) {
+  std::vector<uint64_t> sums(blocks_I.size());
+  for (size_t i = 0; i < blocks_I.size(); ++i) {
+    if (i + kAhead < blocks_I.size()) __builtin_prefetch(blocks_I[i + kAhead].data.data());
+    sums[i] = ByteSum(blocks_I[i].data);
+  }
+  return sums;
+}
+
+// Freeing the many blocks of a large image costs more than the rest of the
+// ending: the last source loaded is kept, reachable, until the process ends.
+void KeepUntilExit(std::unique_ptr<CSRec> source_I) {
+  static CSRec* sKept = nullptr;
+  delete sKept;
+  sKept = source_I.release();
+}
+
 // The reader's own words: its first error line, or, where it only raised an
 // assertion, the assertion's text.
 class CReasonListener {
@@ -117,38 +138,45 @@ class CReasonListener {
   std::string mAssertion;
 };
 
+// Writes the image beside its path and puts it in place only once whole. The
+// pieces are handed to the system many at a time straight from where they
+// lie: an image of small blocks would otherwise cost a call or a copy each.
 class CImageWriter {
  public:
-  // Writes beside `path_I` and takes its place only once whole.
   explicit CImageWriter(const std::string& path_I)
       : mPath(path_I),
         mTemporary(path_I + ".tmp" + std::to_string(getpid())),
-        mFile(std::fopen(mTemporary.c_str(), "wb")) {
-    if (mFile == nullptr) Fail();
+        mFd(open(mTemporary.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666)) {
+    if (mFd < 0) Fail();
+    mPieces.reserve(kMostPieces);
   }
   ~CImageWriter() {
-    if (mFile != nullptr) std::fclose(mFile);
-    if (mFile != nullptr || mFailed) std::remove(mTemporary.c_str());
+    if (mFd >= 0) close(mFd);
+    if (mFd >= 0 || mFailed) std::remove(mTemporary.c_str());
   }
   CImageWriter(const CImageWriter&) = delete;
   CImageWriter& operator=(const CImageWriter&) = delete;
 
+  // The bytes must stay where they are until Close.
   void Write(const uint8_t* data_I, size_t size_I) {
-    if (mFile != nullptr && size_I > 0 && std::fwrite(data_I, 1, size_I, mFile) != size_I) Fail();
+    if (mFd < 0 || mFailed || size_I == 0) return;
+    mPieces.push_back({const_cast<uint8_t*>(data_I), size_I});
+    if (mPieces.size() == kMostPieces) Flush();
   }
   void Fill(uint64_t size_I) {
     static const std::vector<uint8_t> kErased(size_t{1} << 16, 0xFF);
-    while (size_I > 0 && mFile != nullptr) {
+    while (size_I > 0 && mFd >= 0 && !mFailed) {
       const size_t now = static_cast<size_t>(std::min<uint64_t>(size_I, kErased.size()));
       Write(kErased.data(), now);
       size_I -= now;
     }
   }
   bool Close(std::string& reason_O) {
-    if (mFile != nullptr) {
-      if (std::fflush(mFile) != 0 || fsync(fileno(mFile)) != 0) Fail();
-      if (std::fclose(mFile) != 0) Fail();
-      mFile = nullptr;
+    if (mFd >= 0) {
+      Flush();
+      if (!mFailed && fsync(mFd) != 0) Fail();
+      if (close(mFd) != 0) Fail();
+      mFd = -1;
     }
     if (!mFailed && std::rename(mTemporary.c_str(), mPath.c_str()) != 0) Fail();
     if (!mFailed) return true;
@@ -157,6 +185,47 @@ class CImageWriter {
   }
 
  private:
+  static constexpr size_t kMostPieces = IOV_MAX;
+
+  // A short write goes on from where it stopped.
+  void Flush() {
+    iovec* piece = mPieces.data();
+    size_t left = mPieces.size();
+    while (left > 0 && !mFailed) {
+      const ssize_t done = writev(mFd, piece, static_cast<int>(left));
+      if (done < 0 && errno == EINTR) continue;
+      if (done <= 0) {
+        if (done == 0) errno = EIO;
+        Fail();
+        break;
+      }
+      size_t taken = static_cast<size_t>(done);
+      mWritten += taken;
+      while (left > 0 && taken >= piece->iov_len) {
+        taken -= piece->iov_len;
+        ++piece;
+        --left;
+      }
+      if (taken > 0) {
+        piece->iov_base = static_cast<uint8_t*>(piece->iov_base) + taken;
+        piece->iov_len -= taken;
+      }
+    }
+    mPieces.clear();
+    StartWriteBack();
+  }
+
+  // The disk starts on what is written while the rest is still being
+  // written, so that the closing fsync has only the end left to wait for.
+  // Only a hint: the fsync reports what goes wrong.
+  void StartWriteBack() {
+    static constexpr uint64_t kStep = uint64_t{4} << 20;
+    if (mFailed || mWritten - mWrittenBack < kStep) return;
+    sync_file_range(mFd, static_cast<off_t>(mWrittenBack),
+                    static_cast<off_t>(mWritten - mWrittenBack), SYNC_FILE_RANGE_WRITE);
+    mWrittenBack = mWritten;
+  }
+
   void Fail() {
     if (!mFailed) mError = errno;
     mFailed = true;
@@ -164,9 +233,12 @@ class CImageWriter {
 
   std::string mPath;
   std::string mTemporary;
-  std::FILE* mFile;
+  int mFd;
+  std::vector<iovec> mPieces;
   bool mFailed = false;
   int mError = 0;
+  uint64_t mWritten = 0;
+  uint64_t mWrittenBack = 0;
 };
 
 }  // namespace
@@ -199,7 +271,9 @@ int CFirmwareReportCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
                  mInterfaceName.c_str());
     return ERUN_USAGE;
   }
-  CSRec source;
+  auto kept = std::make_unique<CSRec>();
+  CSRec& source = *kept;
+  KeepUntilExit(std::move(kept));
   std::string reason;
   // A FIFO would block the reader and an oversized binary be read whole:
   // such a file is refused before it is opened.
@@ -214,12 +288,26 @@ int CFirmwareReportCommand::Run(std::FILE* out_IO, std::FILE* err_IO) {
     }
     return 1;
   }
-  if (mJson) {
-    PrintJson(source, out_IO);
+  // The blocks' sums are taken while the image is written, where each block
+  // is read anyway; the listing comes after.
+  std::vector<uint64_t> sums;
+  const auto print = [&] {
+    if (IsSRecord(source.GetDataSourceFormat()) && sums.empty()) {
+      sums = ByteSums(source.GetSRecDataRef());
+    }
+    if (mJson) {
+      PrintJson(source, sums, out_IO);
+    } else {
+      PrintText(source, sums, out_IO);
+    }
+  };
+  bool written = true;
+  if (mOutputBinary.empty()) {
+    print();
   } else {
-    PrintText(source, out_IO);
+    written = WriteImage(source, sums, print, reason);
   }
-  if (!mOutputBinary.empty() && !WriteImage(source, reason)) {
+  if (!written) {
     std::fprintf(err_IO, "%s: %s\n", TAV_PROGRAM_NAME, reason.c_str());
     return 1;
   }
@@ -240,29 +328,35 @@ bool CFirmwareReportCommand::Load(CSRec& source_IO, std::string& reason_O) const
   return false;
 }
 
-void CFirmwareReportCommand::PrintText(const CSRec& source_I, std::FILE* out_IO) const {
+void CFirmwareReportCommand::PrintText(const CSRec& source_I, const std::vector<uint64_t>& sums_I,
+                                       std::FILE* out_IO) const {
   const EDataSourceFormat format = source_I.GetDataSourceFormat();
   std::fprintf(out_IO, "File: %s\n", mFile.c_str());
   std::fprintf(out_IO, "Format: %s (%s)\n", TextOf(format).name, TextOf(format).description);
   if (IsSRecord(format)) {
     const std::vector<SContinuousDataBlock>& blocks = source_I.GetSRecDataRef();
+    // The lines go out a piece at a time, not as one text the size of the
+    // listing.
+    static constexpr size_t kPiece = size_t{1} << 16;
     uint64_t total = 0;
     std::string text = "Blocks: ";
-    text.reserve(blocks.size() * 48 + 64);
+    text.reserve(kPiece + 64);
     AppendNumber(text, blocks.size());
     text += '\n';
     for (size_t i = 0; i < blocks.size(); ++i) {
       const SContinuousDataBlock& block = blocks[i];
-      // Small blocks lie all over the heap; ask for one well ahead.
-      if (i + kAhead < blocks.size()) __builtin_prefetch(blocks[i + kAhead].data.data());
       text += "  start 0x";
       AppendHex8(text, block.startAddress);
       text += "  size ";
       AppendNumber(text, block.data.size());
       text += "  sum ";
-      AppendNumber(text, ByteSum(block.data));
+      AppendNumber(text, sums_I[i]);
       text += '\n';
       total += block.data.size();
+      if (text.size() >= kPiece) {
+        std::fwrite(text.data(), 1, text.size(), out_IO);
+        text.clear();
+      }
     }
     text += "Bytes: ";
     AppendNumber(text, total);
@@ -282,7 +376,8 @@ void CFirmwareReportCommand::PrintText(const CSRec& source_I, std::FILE* out_IO)
   }
 }
 
-void CFirmwareReportCommand::PrintJson(const CSRec& source_I, std::FILE* out_IO) const {
+void CFirmwareReportCommand::PrintJson(const CSRec& source_I, const std::vector<uint64_t>& sums_I,
+                                       std::FILE* out_IO) const {
   const EDataSourceFormat format = source_I.GetDataSourceFormat();
   std::string json = "{\"file\":" + JsonString(mFile) + ",\"format\":\"" + TextOf(format).name +
                      "\",\"formatValue\":" + std::to_string(format) +
@@ -291,13 +386,15 @@ void CFirmwareReportCommand::PrintJson(const CSRec& source_I, std::FILE* out_IO)
     uint64_t total = 0;
     json += ",\"blocks\":[";
     bool first = true;
-    for (const SContinuousDataBlock& block : source_I.GetSRecDataRef()) {
+    const std::vector<SContinuousDataBlock>& blocks = source_I.GetSRecDataRef();
+    for (size_t i = 0; i < blocks.size(); ++i) {
+      const SContinuousDataBlock& block = blocks[i];
       json += first ? "{\"start\":" : ",{\"start\":";
       AppendNumber(json, block.startAddress);
       json += ",\"size\":";
       AppendNumber(json, block.data.size());
       json += ",\"sum\":";
-      AppendNumber(json, ByteSum(block.data));
+      AppendNumber(json, sums_I[i]);
       json += '}';
       total += block.data.size();
       first = false;
@@ -322,16 +419,24 @@ void CFirmwareReportCommand::PrintJson(const CSRec& source_I, std::FILE* out_IO)
 }
 
 // S-record blocks are laid out from the lowest start with gaps erased to
-// 0xFF; the other formats are written as their reader holds them.
-bool CFirmwareReportCommand::WriteImage(const CSRec& source_I, std::string& reason_O) const {
+// 0xFF, and their sums taken on the way; the other formats are written as
+// their reader holds them.
+bool CFirmwareReportCommand::WriteImage(const CSRec& source_I, std::vector<uint64_t>& sums_O,
+                                        const std::function<void()>& whileClosing_I,
+                                        std::string& reason_O) const {
+  // The writer takes the bytes where they lie, until it is closed.
+  std::vector<uint8_t> rtdIspImage;
   CImageWriter writer(mOutputBinary);
   const EDataSourceFormat format = source_I.GetDataSourceFormat();
   if (IsSRecord(format)) {
     const std::vector<SContinuousDataBlock>& blocks = source_I.GetSRecDataRef();
     uint64_t next = blocks.empty() ? 0 : blocks.front().startAddress;
+    sums_O.resize(blocks.size());
     for (size_t i = 0; i < blocks.size(); ++i) {
       const SContinuousDataBlock& block = blocks[i];
+      // Small blocks lie all over the heap; ask for one well ahead.
       if (i + kAhead < blocks.size()) __builtin_prefetch(blocks[i + kAhead].data.data());
+      sums_O[i] = ByteSum(block.data);
       if (block.startAddress > next) writer.Fill(block.startAddress - next);
       writer.Write(block.data.data(), block.data.size());
       next = uint64_t{block.startAddress} + block.data.size();
@@ -343,8 +448,8 @@ bool CFirmwareReportCommand::WriteImage(const CSRec& source_I, std::string& reas
     const CBinaryAiroFlash& binary = *source_I.GetBinaryAiroFlashData();
     writer.Write(binary.GetData(), binary.Size());
   } else if (format == EDS_SCALAR_RTDISP) {
-    const std::vector<uint8_t> image = source_I.GetScalarRtdIspData()->GetData();
-    writer.Write(image.data(), image.size());
+    rtdIspImage = source_I.GetScalarRtdIspData()->GetData();
+    writer.Write(rtdIspImage.data(), rtdIspImage.size());
   } else if (format == EDS_SCALAR_BINARY) {
     // The blocks hold the image; the last one is padded past the size.
     const CScalarBinary& binary = *source_I.GetScalarBinaryData();
@@ -356,5 +461,16 @@ bool CFirmwareReportCommand::WriteImage(const CSRec& source_I, std::string& reas
       left -= now;
     }
   }
-  return writer.Close(reason_O);
+  // The disk takes its time over the last of the image: the listing is
+  // printed meanwhile.
+  bool closed = false;
+  std::thread closing([&] { closed = writer.Close(reason_O); });
+  try {
+    whileClosing_I();
+  } catch (...) {
+    closing.join();
+    throw;
+  }
+  closing.join();
+  return closed;
 }

@@ -3,8 +3,11 @@
 // it holds, as text or JSON, and can write the loaded image as flat bytes.
 // Nothing is sent to a device.
 
+#include <cstdint>
 #include <cstdio>
+#include <functional>
 #include <string>
+#include <vector>
 
 #include "common/TavTypes.h"
 
@@ -25,9 +28,15 @@ class CFirmwareReportCommand {
 
  private:
   bool Load(CSRec& source_IO, std::string& reason_O) const;
-  void PrintText(const CSRec& source_I, std::FILE* out_IO) const;
-  void PrintJson(const CSRec& source_I, std::FILE* out_IO) const;
-  bool WriteImage(const CSRec& source_I, std::string& reason_O) const;
+  // sums_I: the byte sum of each S-record block, in list order.
+  void PrintText(const CSRec& source_I, const std::vector<uint64_t>& sums_I,
+                 std::FILE* out_IO) const;
+  void PrintJson(const CSRec& source_I, const std::vector<uint64_t>& sums_I,
+                 std::FILE* out_IO) const;
+  // Runs whileClosing_I once the image is written, while it is flushed to
+  // the disk and put in place.
+  bool WriteImage(const CSRec& source_I, std::vector<uint64_t>& sums_O,
+                  const std::function<void()>& whileClosing_I, std::string& reason_O) const;
 
   std::string mFile;
   std::string mInterfaceName;

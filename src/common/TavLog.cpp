@@ -89,10 +89,13 @@ void Debug(const char* format_I, ...) {
   }
 }
 
-#define TAV_LOG_AT_LEVEL(level)                                 \
-  va_list args;                                                 \
-  va_start(args, format_I);                                     \
-  PassToSink(level, FormatWithLevel(level, format_I), args);    \
+// With no output attached a line is not even given its tag: an S-record
+// load logs each of the file's lines.
+#define TAV_LOG_AT_LEVEL(level)                              \
+  if (Outputs().mCount.load() == 0) return;                  \
+  va_list args;                                              \
+  va_start(args, format_I);                                  \
+  PassToSink(level, FormatWithLevel(level, format_I), args); \
   va_end(args);
 
 void Info(const char* format_I, ...) { TAV_LOG_AT_LEVEL(eInfo) }

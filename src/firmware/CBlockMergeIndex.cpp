@@ -13,11 +13,11 @@ CBlockMergeIndex::CBlockMergeIndex(unsigned pageBits_I)
       mOffsetMask((uint32_t{1} << mPageBits) - 1) {}
 
 void CBlockMergeIndex::Clear() {
-  mSlots = {};
+  std::vector<SSlot>().swap(mSlots);
   mUsedSlots = 0;
   mSlotBits = 0;
   mOtherStarts = {};
-  mScratch = {};
+  std::vector<SEntry>().swap(mScratch);
   mCachedKey = UINT64_MAX;
   mCachedPage = nullptr;
   mHintPage = nullptr;

@@ -38,7 +38,7 @@ const uint8_t* CByteArena::ReadNext(size_t size_I) {
 
 void CByteArena::Clear() {
   for (SChunk& chunk : mChunks) Release(chunk);
-  mChunks = {};
+  std::vector<SChunk>().swap(mChunks);
   mReadChunk = 0;
   mReadOffset = 0;
 }

@@ -4,16 +4,32 @@
 
 #include <algorithm>
 #include <cstring>
+#include <memory>
 
 #include "firmware/CBlockMergeIndex.h"
 
+namespace {
+
+// Gives the storage back: assigning {} would only empty the list and keep it.
+template <typename T>
+void Release(T& list_IO) {
+  T().swap(list_IO);
+}
+
+}  // namespace
+
 void CSRecBlockBuilder::Clear() {
-  mRecords = {};
+  Release(mRecords);
+  Release(mStaged);
+  mPendingFirst = 0;
+  Release(mPendingData);
+  mImage.Clear();
+  mImage.SetBudget(0);
   mData.Clear();
   mAscending = true;
   mLastEnd = 0;
-  mBlockOf = {};
-  mBlocks = {};
+  Release(mBlockOf);
+  Release(mBlocks);
 }
 
 void CSRecBlockBuilder::ReserveFor(uint64_t textBytes_I) {
@@ -21,37 +37,70 @@ void CSRecBlockBuilder::ReserveFor(uint64_t textBytes_I) {
   static constexpr uint64_t kShortestRecord = 11;
   static constexpr uint64_t kMostReserved = uint64_t{1} << 26;
   mRecords.reserve(static_cast<size_t>(std::min(textBytes_I / kShortestRecord, kMostReserved)));
+  static constexpr uint64_t kPartlyUsed = 2 * CStagingImage::kPageSize;
+  mImage.SetBudget(textBytes_I / 2 + kPartlyUsed);
 }
 
 void CSRecBlockBuilder::Add(uint32_t address_I, const uint8_t* data_I, size_t size_I) {
   mRecords.push_back({address_I, static_cast<uint32_t>(size_I)});
-  if (size_I > 0) std::memcpy(mData.Append(size_I), data_I, size_I);
   mAscending = mAscending && size_I > 0 && address_I >= mLastEnd;
   mLastEnd = uint64_t{address_I} + size_I;
+  // Records in address order fill their blocks in file order as they are:
+  // they are not staged.
+  if (mAscending) {
+    mStaged.push_back(false);
+    if (size_I > 0) std::memcpy(mData.Append(size_I), data_I, size_I);
+    mPendingFirst = mRecords.size();
+    return;
+  }
+  mImage.Expect(address_I);
+  mPendingData.insert(mPendingData.end(), data_I, data_I + size_I);
+  if (mRecords.size() - mPendingFirst == kPendingRecords) StagePending();
+}
+
+void CSRecBlockBuilder::StagePending() {
+  const uint8_t* data = mPendingData.data();
+  for (size_t record = mPendingFirst; record < mRecords.size(); ++record) {
+    const size_t size = mRecords[record].size;
+    const bool staged = mImage.Place(mRecords[record].address, data, size);
+    mStaged.push_back(staged);
+    if (!staged && size > 0) std::memcpy(mData.Append(size), data, size);
+    data += size;
+  }
+  mPendingFirst = mRecords.size();
+  mPendingData.clear();
 }
 
 std::vector<SContinuousDataBlock> CSRecBlockBuilder::Build() {
+  StagePending();
+  mImage.ForgetStaged();
+  // Sorted before the rest of the bookkeeping is made: the sort needs the
+  // most room.
+  std::vector<uint32_t> byAddress;
+  if (!mAscending) byAddress = SortByAddress();
   mBlockOf.assign(mRecords.size(), kDropped);
   mBlocks.clear();
   mBlocks.reserve(mRecords.size());  // address space only, as above
   std::vector<uint32_t> placeOf;
   if (mAscending) {
     JoinNeighbours({});
+  } else if (Disjoint(byAddress)) {
+    JoinNeighbours(byAddress);
+    placeOf = PlacesByAddress(byAddress);
   } else {
-    const std::vector<uint32_t> byAddress = SortByAddress();
-    if (Disjoint(byAddress)) {
-      JoinNeighbours(byAddress);
-      placeOf = PlacesByAddress(byAddress);
-    } else {
-      MergeOneByOne();
-    }
+    MergeOneByOne();
   }
+  Release(byAddress);
   // The sort's buffers may have come from the heap, where freeing keeps
   // them resident; hand their pages back before the blocks are filled,
   // when memory peaks.
   malloc_trim(0);
-  std::vector<SContinuousDataBlock> blocks = Fill(placeOf);
+  std::vector<SContinuousDataBlock> blocks = Fill(placeOf, mAscending || !placeOf.empty());
   Clear();
+  // The bookkeeping freed here lies below the blocks in the heap, where it
+  // would stay resident for as long as the blocks live.
+  Release(placeOf);
+  malloc_trim(0);
   return blocks;
 }
 
@@ -69,19 +118,42 @@ std::vector<uint32_t> CSRecBlockBuilder::PlacesByAddress(
 }
 
 // Record numbers in address order, ties in file order: a stable radix sort
-// of the addresses with the record number in the low half of each key.
+// of the addresses with the record number in the low half of each key. Only
+// as many digits as the highest address needs, with every digit's counts
+// taken in one pass.
 std::vector<uint32_t> CSRecBlockBuilder::SortByAddress() const {
-  static constexpr unsigned kDigitBits = 11;
-  static constexpr size_t kDigits = size_t{1} << kDigitBits;
+  static constexpr unsigned kMostDigitBits = 12;
   const size_t count = mRecords.size();
-  std::vector<uint64_t> keys(count);
-  std::vector<uint64_t> sorted(count);
-  for (size_t i = 0; i < count; ++i) keys[i] = uint64_t{mRecords[i].address} << 32 | i;
-  for (unsigned shift = 32; shift < 64; shift += kDigitBits) {
-    std::vector<size_t> starts(kDigits + 1, 0);
-    for (uint64_t key : keys) ++starts[((key >> shift) & (kDigits - 1)) + 1];
-    for (size_t digit = 1; digit <= kDigits; ++digit) starts[digit] += starts[digit - 1];
-    for (uint64_t key : keys) sorted[starts[(key >> shift) & (kDigits - 1)]++] = key;
+  uint32_t highest = 0;
+  for (const SRecord& record : mRecords) highest = std::max(highest, record.address);
+  const unsigned bits = highest == 0 ? 0 : 32 - static_cast<unsigned>(__builtin_clz(highest));
+  const unsigned passes = (bits + kMostDigitBits - 1) / kMostDigitBits;
+  const unsigned digitBits = passes == 0 ? 0 : (bits + passes - 1) / passes;
+  const size_t digits = size_t{1} << digitBits;
+
+  // Neither buffer needs clearing: every key is written before it is read.
+  std::unique_ptr<uint64_t[]> keys(new uint64_t[count]);
+  std::unique_ptr<uint64_t[]> sorted(new uint64_t[passes > 0 ? count : 0]);
+  std::vector<size_t> starts(passes * digits + 1, 0);
+  for (size_t i = 0; i < count; ++i) {
+    keys[i] = uint64_t{mRecords[i].address} << 32 | i;
+    for (unsigned pass = 0; pass < passes; ++pass) {
+      ++starts[pass * digits + ((mRecords[i].address >> (pass * digitBits)) & (digits - 1))];
+    }
+  }
+  for (unsigned pass = 0; pass < passes; ++pass) {
+    size_t* start = &starts[pass * digits];
+    size_t sum = 0;
+    for (size_t digit = 0; digit < digits; ++digit) {
+      const size_t here = start[digit];
+      start[digit] = sum;
+      sum += here;
+    }
+    const unsigned shift = 32 + pass * digitBits;
+    for (size_t i = 0; i < count; ++i) {
+      const uint64_t key = keys[i];
+      sorted[start[(key >> shift) & (digits - 1)]++] = key;
+    }
     keys.swap(sorted);
   }
   std::vector<uint32_t> byAddress(count);
@@ -197,37 +269,65 @@ void CSRecBlockBuilder::MergeOneByOne() {
   }
 }
 
-// Copies each kept record to its place in its block, in file order, so that
-// the stored data is given back as it is used. A block filled from its start
-// upwards grows as it fills instead of being cleared first.
-std::vector<SContinuousDataBlock> CSRecBlockBuilder::Fill(const std::vector<uint32_t>& placeOf_I) {
+// Takes each block's bytes from the staging image, then lays the records
+// kept apart over them, in file order. Every byte of a block belongs to one
+// of its records, and a staged record's bytes were never staged over, so
+// the result is each record's own data. With the list in address order the
+// blocks are filled front to back and the staging given back behind them.
+std::vector<SContinuousDataBlock> CSRecBlockBuilder::Fill(const std::vector<uint32_t>& placeOf_I,
+                                                          bool sorted_I) {
   const auto place = [&placeOf_I](uint32_t block_I) {
     return placeOf_I.empty() ? block_I : placeOf_I[block_I];
   };
-  std::vector<SContinuousDataBlock> blocks(mBlocks.size());
-  for (uint32_t i = 0; i < mBlocks.size(); ++i) {
-    blocks[place(i)].startAddress = static_cast<uint32_t>(mBlocks[i].start);
+  std::vector<SBounds> bounds(mBlocks.size());
+  for (uint32_t i = 0; i < mBlocks.size(); ++i) bounds[place(i)] = mBlocks[i];
+  const auto overlayOf = [&](size_t record_I) {
+    const uint32_t block = mBlockOf[record_I];
+    const uint32_t size = mRecords[record_I].size;
+    if (block == kDropped) return SOverlay{kDropped, 0, size};
+    const uint64_t offset = mRecords[record_I].address - mBlocks[block].start;
+    return SOverlay{place(block), static_cast<uint32_t>(offset), size};
+  };
+  // Where few records were kept apart, only what they need is kept, and the
+  // bookkeeping of all records goes before the blocks take their room.
+  const size_t keptApart = static_cast<size_t>(std::count(mStaged.begin(), mStaged.end(), false));
+  const bool anyStaged = keptApart < mStaged.size();
+  const bool compact = keptApart <= mRecords.size() / 4;
+  std::vector<SOverlay> overlays;
+  if (compact) {
+    overlays.reserve(keptApart);
+    for (size_t record = 0; record < mRecords.size(); ++record) {
+      if (!mStaged[record]) overlays.push_back(overlayOf(record));
+    }
+    Release(mRecords);
+    Release(mStaged);
+    Release(mBlockOf);
+    Release(mBlocks);
   }
-  static constexpr size_t kAhead = 16;
-  for (size_t record = 0; record < mRecords.size(); ++record) {
-    // The blocks of a shuffled file are visited at random: ask for the
-    // bookkeeping of a record well ahead, and for its block's data nearer.
-    if (record + kAhead < mRecords.size() && mBlockOf[record + kAhead] != kDropped) {
-      const uint32_t later = mBlockOf[record + kAhead];
-      __builtin_prefetch(&mBlocks[later]);
-      __builtin_prefetch(&blocks[place(later)]);
-    }
-    if (record + kAhead / 2 < mRecords.size() && mBlockOf[record + kAhead / 2] != kDropped) {
-      __builtin_prefetch(blocks[place(mBlockOf[record + kAhead / 2])].data.data());
-    }
-    const size_t size = mRecords[record].size;
+
+  std::vector<SContinuousDataBlock> blocks(bounds.size());
+  for (size_t at = 0; at < bounds.size(); ++at) {
+    SContinuousDataBlock& block = blocks[at];
+    block.startAddress = static_cast<uint32_t>(bounds[at].start);
+    if (sorted_I) mImage.ReleaseBelow(bounds[at].start);
+    const size_t size = static_cast<size_t>(bounds[at].end - bounds[at].start);
+    block.data.reserve(size);
+    if (anyStaged) mImage.CopyOut(bounds[at].start, size, block.data, sorted_I);
+  }
+  mImage.Clear();
+
+  const size_t count = compact ? overlays.size() : mRecords.size();
+  for (size_t i = 0; i < count; ++i) {
+    if (!compact && mStaged[i]) continue;
+    const SOverlay overlay = compact ? overlays[i] : overlayOf(i);
+    const size_t size = overlay.size;
     const uint8_t* data = mData.ReadNext(size);
-    const uint32_t block = mBlockOf[record];
-    if (block == kDropped || size == 0) continue;
-    std::vector<uint8_t>& target = blocks[place(block)].data;
-    const size_t blockSize = static_cast<size_t>(mBlocks[block].end - mBlocks[block].start);
-    const size_t offset = static_cast<size_t>(mRecords[record].address - mBlocks[block].start);
-    if (target.capacity() == 0) target.reserve(blockSize);
+    if (overlay.place == kDropped || size == 0) continue;
+    std::vector<uint8_t>& target = blocks[overlay.place].data;
+    const SBounds& span = bounds[overlay.place];
+    const size_t blockSize = static_cast<size_t>(span.end - span.start);
+    const size_t offset = overlay.offset;
+    // Blocks that took nothing staged grow as they fill from their start.
     if (offset == target.size()) {
       target.insert(target.end(), data, data + size);
     } else {

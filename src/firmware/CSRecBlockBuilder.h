@@ -6,17 +6,20 @@
 // at its front. Blocks that become adjacent stay apart.
 //
 // The records are kept compactly while the file is read and resolved at the
-// end. Where no two records share a byte, which is what tools write, a record
-// can only join the block of the record just below it or just above it in
-// address order, and a single pass over them in file order settles every
-// block. Any other file is merged record by record through CBlockMergeIndex.
-// Both give exactly the blocks of the plain walk over all blocks.
+// end. Their data is staged at its own addresses where it shares no byte
+// with data staged before, and kept in file order otherwise. Where no two
+// records share a byte, which is what tools write, a record can only join
+// the block of the record just below it or just above it in address order,
+// and a single pass over them in file order settles every block. Any other
+// file is merged record by record through CBlockMergeIndex. Both give
+// exactly the blocks of the plain walk over all blocks.
 
 #include <cstddef>
 #include <cstdint>
 #include <vector>
 
 #include "firmware/CByteArena.h"
+#include "firmware/CStagingImage.h"
 #include "firmware/SContinuousDataBlock.h"
 
 class CSRecBlockBuilder {
@@ -33,7 +36,9 @@ class CSRecBlockBuilder {
   void Clear();
   // Room for every record a text of this many bytes can hold. Only address
   // space: the pages are touched as records come, and the list never has to
-  // move to grow, which would hold it twice for a moment.
+  // move to grow, which would hold it twice for a moment. Also what staging
+  // may take: the most data such a text holds, and some room for pages
+  // that are only partly used.
   void ReserveFor(uint64_t textBytes_I);
   // Keeps a copy of the record's data.
   void Add(uint32_t address_I, const uint8_t* data_I, size_t size_I);
@@ -54,16 +59,33 @@ class CSRecBlockBuilder {
     uint64_t start;
     uint64_t end;
   };
+  // A record kept apart from the staging: its block's place in the list
+  // (kDropped when the record was dropped), where in the block, how long.
+  struct SOverlay {
+    uint32_t place;
+    uint32_t offset;
+    uint32_t size;
+  };
 
   std::vector<uint32_t> SortByAddress() const;
   bool Disjoint(const std::vector<uint32_t>& byAddress_I) const;
   void JoinNeighbours(const std::vector<uint32_t>& byAddress_I);
   void MergeOneByOne();
   std::vector<uint32_t> PlacesByAddress(const std::vector<uint32_t>& byAddress_I) const;
-  // placeOf_I empty: blocks stay in their order of creation.
-  std::vector<SContinuousDataBlock> Fill(const std::vector<uint32_t>& placeOf_I);
+  // placeOf_I empty: blocks stay in their order of creation. sorted_I: the
+  // blocks' places are in the order of their starts.
+  std::vector<SContinuousDataBlock> Fill(const std::vector<uint32_t>& placeOf_I, bool sorted_I);
+
+  void StagePending();
 
   std::vector<SRecord> mRecords;
+  std::vector<bool> mStaged;  // per record: its data is in mImage, not mData
+  // Records not yet staged, and their data: a few at a time, so that the
+  // places of all of them are asked for before the first is written.
+  static constexpr size_t kPendingRecords = 16;
+  size_t mPendingFirst = 0;
+  std::vector<uint8_t> mPendingData;
+  CStagingImage mImage;
   CByteArena mData;
   // Whether every record so far starts at or after the end of the one before
   // and has data: then the file order is the address order.

@@ -105,6 +105,31 @@ TEST(InspectCommand, WritesTheLoadedImageAsFlatBytes) {
   EXPECT_EQ(Inspect({"--inspect", pen, "--output-binary", folder.Path("no/such/dir")}).status, 1);
 }
 
+// More blocks and gaps than one batch of writes holds, and a listing longer
+// than one piece of output.
+TEST(InspectCommand, WritesAndListsAnImageOfManySmallBlocks) {
+  CTempFolder folder;
+  static constexpr uint32_t kBlocks = 2500;
+  std::string text;
+  std::string image;
+  std::string listing = "Blocks: " + std::to_string(kBlocks) + "\n";
+  char line[64];
+  for (uint32_t i = 0; i < kBlocks; ++i) {
+    const std::vector<uint8_t> data{static_cast<uint8_t>(i), static_cast<uint8_t>(i >> 8)};
+    text += SRecLine('2', 4 * i, data) + "\n";
+    image += std::string(data.begin(), data.end());
+    if (i + 1 < kBlocks) image += "\xFF\xFF";
+    std::snprintf(line, sizeof line, "  start 0x%08X  size 2  sum %u\n", 4 * i, data[0] + data[1]);
+    listing += line;
+  }
+  listing += "Bytes: " + std::to_string(2 * kBlocks) + "\n";
+  const std::string out = folder.Path("image.out");
+  const SRun run = Inspect({"--inspect", folder.Write("many.pen", text), "--output-binary", out});
+  ASSERT_EQ(run.status, 0) << run.err;
+  EXPECT_EQ(CTempFolder::Read(out), image);
+  EXPECT_EQ(run.out.substr(run.out.find("Blocks: ")), listing);
+}
+
 TEST(InspectCommand, RefusesAFileThatDoesNotLoadInTheReadersWords) {
   CTempFolder folder;
   const std::string image = folder.Path("image.out");

@@ -1,5 +1,7 @@
 #include <gtest/gtest.h>
 
+#include <cstdio>
+
 #include "firmware/CIntelHex.h"
 #include "firmware/CSRec.h"
 #include "firmware/FirmwareFiles.h"
@@ -94,4 +96,34 @@ TEST(SRecReader, DecidesTheDataByTheLineAndSkipsWhatItDoesNotRead) {
   ASSERT_TRUE(loads("S0garbage!!\nS5ZZZZZZZZZ\nS7nonsense!\nS8........\nthis is a comment line\n" +
                     SRecLine('2', 0x10, Bytes(2)) + "\n"));
   EXPECT_EQ(source.GetSRecData(), (CBlocks{{0x10, Bytes(2)}}));
+}
+
+// Long data fields are read many digits at a time where they are plain upper
+// case: a character of any other kind, wherever it stands, must still read as
+// the two digit rules say.
+TEST(SRecReader, ReadsEveryDigitOfALongRecordByTheDigitRules) {
+  CTempFolder folder;
+  const std::string plain = SRecLine('3', 0x2000, Bytes(40, 0x9A));
+  const struct {
+    size_t at;  // in the data characters
+    char with;
+  } cases[] = {{0, 'a'},  {1, 'a'},  {7, 'f'},  {15, 'G'}, {16, '@'}, {17, ':'},
+               {30, 'z'}, {31, '/'}, {47, 'F'}, {63, 'b'}, {79, 'e'}};
+  for (const auto& c : cases) {
+    SCOPED_TRACE(c.at);
+    std::string line = plain.substr(0, plain.size() - 2);  // without its checksum
+    line[12 + c.at] = c.with;
+    std::vector<uint8_t> expected;
+    unsigned sum = 0;
+    for (size_t index = 2; index < line.size(); index += 2) {
+      const uint8_t byte = static_cast<uint8_t>(CSRec::ParseByte(line, index));
+      if (index >= 12) expected.push_back(byte);
+      sum += byte;
+    }
+    char checksum[3];
+    std::snprintf(checksum, sizeof checksum, "%02X", ~sum & 0xFF);
+    CSRec source;
+    ASSERT_TRUE(source.Load(folder.Write("long.tav", line + checksum + "\n"), EHID_INTERFACE));
+    EXPECT_EQ(source.GetSRecData(), CBlocks({{0x2000, expected}}));
+  }
 }

@@ -10,6 +10,7 @@
 
 #include "firmware/CBlockMergeIndex.h"
 #include "firmware/CSRec.h"
+#include "firmware/CStagingImage.h"
 #include "firmware/CTextLineReader.h"
 #include "firmware/FirmwareFiles.h"
 #include "firmware/SRecReferenceMerge.h"
@@ -56,6 +57,21 @@ CRecords Scattered(std::mt19937& rng_IO, uint32_t base_I, size_t window_I, size_
   return records;
 }
 
+// Records around the edges of the staging's pages, on more pages than a
+// small file may stage: some records are staged, others kept apart, some
+// straddle two pages.
+CRecords AroundPageEdges(std::mt19937& rng_IO, size_t count_I) {
+  static constexpr unsigned kBits = CStagingImage::kPageBits;
+  CRecords records;
+  const uint32_t firstPage = 1 + static_cast<uint32_t>(Below(rng_IO, (1u << (32 - kBits)) - 9));
+  for (size_t i = 0; i < count_I; ++i) {
+    const uint32_t edge = (firstPage + static_cast<uint32_t>(Below(rng_IO, 8))) << kBits;
+    records.push_back({edge - 64 + static_cast<uint32_t>(Below(rng_IO, 128)),
+                       RandomData(rng_IO, 1 + Below(rng_IO, 64))});
+  }
+  return records;
+}
+
 void InsertAnywhere(std::mt19937& rng_IO, CRecords& records_IO, SContinuousDataBlock record_I) {
   records_IO.insert(
       records_IO.begin() + static_cast<ptrdiff_t>(Below(rng_IO, records_IO.size() + 1)),
@@ -86,10 +102,10 @@ void ExpectSameAsTheWalk(const CRecords& records_I, const CTempFolder& folder_I)
 TEST(SRecMerge, GivesTheBlocksOfThePlainWalk) {
   CTempFolder folder;
   std::mt19937 rng(7);
-  for (int round = 0; round < 450; ++round) {
+  for (int round = 0; round < 540; ++round) {
     SCOPED_TRACE(round);
     CRecords records;
-    switch (round % 5) {
+    switch (round % 6) {
       // Tool-shaped, now and then near the top of the address space, with a
       // record that comes twice with other data: the first one wins.
       case 0:
@@ -106,6 +122,7 @@ TEST(SRecMerge, GivesTheBlocksOfThePlainWalk) {
       case 2: records = Scattered(rng, 0x1000, 200, 1 + Below(rng, 60), 24); break;
       // Long records across the index's pages.
       case 3: records = Scattered(rng, 0x7000, 20000, 1 + Below(rng, 80), 250); break;
+      case 4: records = AroundPageEdges(rng, 1 + Below(rng, 300)); break;
       // Records without data among tiles, also at the tiles' ends.
       default:
         records = Tiles(rng, 0x40, 1 + Below(rng, 60), 20);
