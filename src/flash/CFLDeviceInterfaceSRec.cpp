@@ -3,6 +3,7 @@
 // recognisable as invalid.
 
 #include <algorithm>
+#include <iterator>
 
 #include "common/TavAssert.h"
 #include "flash/ByteOrder.h"
@@ -93,12 +94,16 @@ bool CFLDeviceInterface::LoadSRecData(const std::vector<SContinuousDataBlock>& d
       TAVASSERT_TEXT("flash block word size > 0 and within the block");
       return false;
     }
-    // One pass over the bytes from each end rather than a call a word: a
-    // loader may describe blocks of 16 MiB.
+    // One pass over the bytes from each end rather than a call a word, and
+    // only where data was copied in: a loader may describe blocks of 16 MiB.
     const std::vector<uint8_t>& bytes = block.BlockData();
     const auto written = [](uint8_t byte_I) { return byte_I < 0xFF; };
-    const auto first = std::find_if(bytes.begin(), bytes.end(), written);
-    if (first != bytes.end()) {
+    const size_t copiedTo = std::min<size_t>(block.GetCopiedTo(), bytes.size());
+    const size_t copiedFrom = std::min<size_t>(block.GetCopiedFrom(), copiedTo);
+    const auto spanEnd = bytes.begin() + static_cast<std::ptrdiff_t>(copiedTo);
+    const auto spanBegin = bytes.begin() + static_cast<std::ptrdiff_t>(copiedFrom);
+    const auto first = std::find_if(spanBegin, spanEnd, written);
+    if (first != spanEnd) {
       uint32_t start = static_cast<uint32_t>(first - bytes.begin()) / word * word;
       // A block that is not a whole number of words ends in a short tail;
       // data there is sent as the last whole word, on the grid that counts
@@ -108,8 +113,10 @@ bool CFLDeviceInterface::LoadSRecData(const std::vector<SContinuousDataBlock>& d
       block.SetWriteSize(word);
       if (block.GetSize() >= word) {
         // The last written word on the grid that counts down from the end.
-        const int64_t last =
-            std::find_if(bytes.rbegin(), bytes.rend(), written).base() - bytes.begin() - 1;
+        const int64_t last = std::find_if(std::make_reverse_iterator(spanEnd),
+                                          std::make_reverse_iterator(spanBegin), written)
+                                 .base() -
+                             bytes.begin() - 1;
         const int64_t top = int64_t{block.GetSize()} - word;
         const int64_t offset = last >= top ? top : top - (top - last + word - 1) / word * word;
         if (offset > start) block.SetWriteSize(static_cast<uint32_t>(offset - start + word));

@@ -22,4 +22,6 @@ void FLASH_BLOCK::MakeBlankImage() {
 void FLASH_BLOCK::CopyIn(uint32_t offset_I, const uint8_t* data_I, uint32_t count_I) {
   if (count_I == 0) return;
   std::memcpy(mBlockData.data() + offset_I, data_I, count_I);
+  mCopiedFrom = std::min(mCopiedFrom, offset_I);
+  mCopiedTo = std::max(mCopiedTo, offset_I + count_I);
 }

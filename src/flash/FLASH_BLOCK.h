@@ -34,6 +34,10 @@ class FLASH_BLOCK {
   // Copies `count_I` bytes to `offset_I` of the image; the image must
   // already hold the block's size and the range must lie inside it.
   void CopyIn(uint32_t offset_I, const uint8_t* data_I, uint32_t count_I);
+  // The offsets from which and up to which data was copied in; outside them
+  // the image is blank. From is past to while nothing was copied.
+  uint32_t GetCopiedFrom() const { return mCopiedFrom; }
+  uint32_t GetCopiedTo() const { return mCopiedTo; }
 
  private:
   uint32_t mStartAddr = 0;
@@ -45,4 +49,6 @@ class FLASH_BLOCK {
   uint32_t mWriteSize = 0;
   bool mProtected = false;
   std::vector<uint8_t> mBlockData;
+  uint32_t mCopiedFrom = UINT32_MAX;
+  uint32_t mCopiedTo = 0;
 };
