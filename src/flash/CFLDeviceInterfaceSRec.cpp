@@ -128,7 +128,7 @@ bool CFLDeviceInterface::LoadSRecData(const std::vector<SContinuousDataBlock>& d
   for (uint32_t i = 0; i < blockCount; ++i) {
     const FLASH_BLOCK& block = mFlash.GetBlock(i);
     ReportLog("Checksum Block [0x" + Hex8(block.GetStartAddr()) + "] = 0x" +
-              Hex8(CalculateBlockChecksum(block.BlockData())));
+              Hex8(block.GetImageSum()));
   }
   ReportLog("Total size: " + Dec(mFlash.GetTotalSize()));
   return true;

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstring>
+#include <numeric>
 
 FLASH_BLOCK::FLASH_BLOCK(uint32_t startAddr_I, uint32_t size_I, uint32_t readSize_I,
                          uint32_t writeWordSize_I, uint32_t writeBlockSize_I,
@@ -24,4 +25,14 @@ void FLASH_BLOCK::CopyIn(uint32_t offset_I, const uint8_t* data_I, uint32_t coun
   std::memcpy(mBlockData.data() + offset_I, data_I, count_I);
   mCopiedFrom = std::min(mCopiedFrom, offset_I);
   mCopiedTo = std::max(mCopiedTo, offset_I + count_I);
+}
+
+uint32_t FLASH_BLOCK::GetImageSum() const {
+  const uint32_t to = std::min<uint32_t>(mCopiedTo, static_cast<uint32_t>(mBlockData.size()));
+  const uint32_t from = std::min(mCopiedFrom, to);
+  const uint32_t copied = std::accumulate(mBlockData.begin() + from, mBlockData.begin() + to,
+                                          uint32_t{0});
+  // Wraps as a byte-by-byte sum would.
+  const uint32_t blank = static_cast<uint32_t>(mBlockData.size()) - (to - from);
+  return copied + blank * 0xFFu;
 }

@@ -38,6 +38,9 @@ class FLASH_BLOCK {
   // the image is blank. From is past to while nothing was copied.
   uint32_t GetCopiedFrom() const { return mCopiedFrom; }
   uint32_t GetCopiedTo() const { return mCopiedTo; }
+  // The 32-bit sum of the image's bytes, counting the blank rest without
+  // reading it: a loader may describe blocks of many MiB.
+  uint32_t GetImageSum() const;
 
  private:
   uint32_t mStartAddr = 0;

@@ -6,10 +6,12 @@
 
 #include <functional>
 #include <memory>
+#include <vector>
 
 #include "common/CClock.h"
 #include "common/CVirtualClock.h"
 #include "flash/CFLProtocol.h"
+#include "flash/FLASH_BLOCK.h"
 #include "flash/ScriptedInterface.h"
 #include "support/LogCapture.h"
 
@@ -298,3 +300,33 @@ TEST_F(DeviceInterfaceBase, OnlyTheWordsFromTheFirstToTheLastWrittenAreSent) {
 }
 
 }  // namespace
+
+// The block sum in the log is taken over the copied span only; it must
+// still equal the plain sum of every byte, blank rest and wrap included.
+TEST(FlashBlockImage, SumEqualsTheSumOfEveryByte) {
+  struct Copy {
+    uint32_t offset;
+    std::vector<uint8_t> bytes;
+  };
+  const std::vector<std::vector<Copy>> cases = {
+      {},
+      {{0, {1, 2, 3}}},
+      {{61, {9, 0xFF, 0}}},
+      {{10, {7}}, {40, {0, 0}}},
+      {{5, std::vector<uint8_t>(59, 0)}},
+  };
+  for (const auto& copies : cases) {
+    FLASH_BLOCK block(0x1000, 64, 0, 4, 16, 0, 0, false);
+    EXPECT_EQ(block.GetImageSum(), 0u) << "no image";
+    block.MakeBlankImage();
+    for (const Copy& copy : copies)
+      block.CopyIn(copy.offset, copy.bytes.data(), static_cast<uint32_t>(copy.bytes.size()));
+    uint32_t plain = 0;
+    for (uint8_t byte : block.BlockData()) plain += byte;
+    EXPECT_EQ(block.GetImageSum(), plain) << copies.size() << " copies";
+  }
+  // 32 Mi blank bytes sum past 2^32 and wrap.
+  FLASH_BLOCK large(0, 1u << 25, 0, 4, 16, 0, 0, false);
+  large.MakeBlankImage();
+  EXPECT_EQ(large.GetImageSum(), static_cast<uint32_t>(uint64_t{0xFF} << 25));
+}
