@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
+#include <functional>
 #include <thread>
 
 #include "common/CClock.h"
@@ -166,7 +167,23 @@ TEST(LabCrc, TheChipsCheckValues) {
   EXPECT_EQ(LabCrc::BluetoothPage(zeroes.data(), zeroes.size()), 0x00);
 }
 
-class LabBus : public LabFixture {};
+class LabBus : public LabFixture {
+ protected:
+  // Runs `body_I` in a started session with a state folder of its own; the
+  // session logs its summary as it ends.
+  void InSession(const std::function<void()>& body_I) {
+    const std::filesystem::path folder =
+        std::filesystem::temp_directory_path() / ("tavik-lab-summary-" + std::to_string(::getpid()));
+    CLabOptions options;
+    options.SetStateFolder(folder.string());
+    {
+      CLabSession session(mBus, options);
+      session.Start();
+      body_I();
+    }
+    std::filesystem::remove_all(folder);
+  }
+};
 
 // A programming-report board as a host would drive it, report by report.
 TEST_F(LabBus, AProgrammingBoardRefusesABadPageAndStaysInvalid) {
@@ -317,18 +334,12 @@ TEST_F(LabBus, TheStateFolderCarriesBoardsIntoTheNextRun) {
 // busy answers of a board that gave any, and the time the run took on the
 // lab's clock.
 TEST_F(LabBus, ASessionEndsWithWhatItCostTheBoards) {
-  const std::filesystem::path folder =
-      std::filesystem::temp_directory_path() / ("tavik-lab-cost-" + std::to_string(::getpid()));
   auto pen = std::make_shared<CLabPenController>(SLabPenDescription{.name = "counted"});
   auto scalar = std::make_shared<CLabScalarHid>("polled");
   mBus->Plug(pen);
   mBus->Plug(scalar);
-  CLabOptions options;
-  options.SetStateFolder(folder.string());
   LogCapture log;
-  {
-    CLabSession session(mBus, options);
-    session.Start();
+  InSession([&] {
     CLabHidNode node(mBus);
     ASSERT_EQ(node.Open(Listed(*pen)), EHidStatus::eSuccess);
     Bytes status{0x14, 0, 0, 0, 0};
@@ -346,14 +357,13 @@ TEST_F(LabBus, ASessionEndsWithWhatItCostTheBoards) {
     scalarNode.GetFeatureReport(programming);
     TavSleep(2.5);
     scalarNode.GetFeatureReport(programming);
-  }
+  });
   EXPECT_TRUE(log.LogContains("Lab board counted: 3 reports\n"));
   EXPECT_FALSE(log.LogContains("Lab board counted: 0 busy answers"));
   EXPECT_TRUE(log.LogContains("Lab board polled: 3 reports\n"));
   EXPECT_TRUE(log.LogContains("Lab board polled: 1 busy answers\n"));
   EXPECT_TRUE(log.LogContains("Lab clock: 2.500 s\n"));
   EXPECT_TRUE(log.LogContains("Lab waits: 2.500 s\n"));
-  std::filesystem::remove_all(folder);
 }
 
 // Polls whose length the chip decides are told apart by the busy answers
@@ -361,8 +371,6 @@ TEST_F(LabBus, ASessionEndsWithWhatItCostTheBoards) {
 // master whose controller is restarting. A board that never made the host
 // wait gets no such line.
 TEST_F(LabBus, TheSummaryCountsTheAnswersThatMadeTheHostWait) {
-  const std::filesystem::path folder =
-      std::filesystem::temp_directory_path() / ("tavik-lab-busy-" + std::to_string(::getpid()));
   auto module = std::make_shared<CLabBluetooth>(CLabBluetooth::EChip::eAB1555, "module");
   SLabI2CDescription tunnel;
   tunnel.name = "tunnel";
@@ -371,12 +379,8 @@ TEST_F(LabBus, TheSummaryCountsTheAnswersThatMadeTheHostWait) {
   mBus->Plug(module);
   mBus->Plug(master);
   mBus->Plug(idle);
-  CLabOptions options;
-  options.SetStateFolder(folder.string());
   LogCapture log;
-  {
-    CLabSession session(mBus, options);
-    session.Start();
+  InSession([&] {
     CLabHidNode moduleNode(mBus), masterNode(mBus), idleNode(mBus);
     ASSERT_EQ(moduleNode.Open(Listed(*module)), EHidStatus::eSuccess);
     ASSERT_EQ(masterNode.Open(Listed(*master)), EHidStatus::eSuccess);
@@ -398,12 +402,11 @@ TEST_F(LabBus, TheSummaryCountsTheAnswersThatMadeTheHostWait) {
     ASSERT_EQ(moduleNode.GetFeatureReport(status), EHidStatus::eSuccess);
     EXPECT_EQ(status[3], 0);
     EXPECT_EQ(masterNode.GetFeatureReport(mode), EHidStatus::eSuccess);
-  }
+  });
   EXPECT_TRUE(log.LogContains("Lab board module: 4 reports\n"));
   EXPECT_TRUE(log.LogContains("Lab board module: 2 busy answers\n"));
   EXPECT_TRUE(log.LogContains("Lab board tunnel: 2 busy answers\n"));
   EXPECT_FALSE(log.LogContains("Lab board idle: 0 busy answers"));
-  std::filesystem::remove_all(folder);
 }
 
 TEST(LabStateFile, ACorruptFileIsRefusedWhole) {
