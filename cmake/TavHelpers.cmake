@@ -17,7 +17,8 @@ if(TAV_SANITIZE STREQUAL "address")
   add_link_options(-fsanitize=address,undefined)
 elseif(TAV_SANITIZE STREQUAL "fuzzer")
   # Instrument every library for coverage; the fuzz targets add the driver.
-  add_compile_options(-fsanitize=fuzzer-no-link,address,undefined -fno-omit-frame-pointer)
+  add_compile_options(-fsanitize=fuzzer-no-link,address,undefined -fno-omit-frame-pointer
+    -fsanitize-coverage-ignorelist=${CMAKE_SOURCE_DIR}/fuzz/coverage-ignore.txt)
   add_link_options(-fsanitize=address,undefined)
 elseif(TAV_SANITIZE STREQUAL "thread")
   add_compile_options(-fsanitize=thread -fno-omit-frame-pointer)
