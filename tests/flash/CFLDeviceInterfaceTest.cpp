@@ -71,13 +71,7 @@ TEST_F(DeviceInterfaceBase, ANestedSafeWriteMakesOnePlainAttempt) {
   EXPECT_DOUBLE_EQ(mClock->GetTotalSlept(), 0.0);
 }
 
-TEST_F(DeviceInterfaceBase, LocationAndSourceCpuFollowPathAndFormat) {
-  mDevice.SetLocation(0x14200000);
-  EXPECT_EQ(mDevice.GetPath(), "337641472");
-  EXPECT_EQ(mDevice.GetLocation(), 0x14200000u);
-  mDevice.SetPath("not a number");
-  EXPECT_EQ(mDevice.GetLocation(), 0u);
-
+TEST_F(DeviceInterfaceBase, SourceCpuFollowsTheFormat) {
   const std::pair<EDataSourceFormat, uint8_t> cpus[] = {
       {EDS_SREC_PEN, 0},      {EDS_SREC_TOUCH, 1}, {EDS_SREC_GENERIC, 0},
       {EDS_INTEL_HEX, 1},     {EDS_AIROFLASH, 2},  {EDS_SCALAR_RTDISP, 5},
