@@ -198,7 +198,6 @@ TEST(CSupportedDeviceInfoTest, HexTextsFollowTheStreamRulesAndInterfaceWordsAreE
     EXPECT_EQ(CSupportedDeviceInfo::ConvertInterfaceParam(word.text, word.fallback), word.expected)
         << '"' << word.text << '"';
   }
-
 }
 
 TEST(CSupportedDeviceInfoTest, OnlyAnArrayOfProductsParsesAndEachParseStartsFromNothing) {
