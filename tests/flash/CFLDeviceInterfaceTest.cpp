@@ -71,13 +71,7 @@ TEST_F(DeviceInterfaceBase, ANestedSafeWriteMakesOnePlainAttempt) {
   EXPECT_DOUBLE_EQ(mClock->GetTotalSlept(), 0.0);
 }
 
-TEST_F(DeviceInterfaceBase, LocationAndSourceCpuFollowPathAndFormat) {
-  mDevice.SetLocation(0x14200000);
-  EXPECT_EQ(mDevice.GetPath(), "337641472");
-  EXPECT_EQ(mDevice.GetLocation(), 0x14200000u);
-  mDevice.SetPath("not a number");
-  EXPECT_EQ(mDevice.GetLocation(), 0u);
-
+TEST_F(DeviceInterfaceBase, SourceCpuFollowsTheFormat) {
   const std::pair<EDataSourceFormat, uint8_t> cpus[] = {
       {EDS_SREC_PEN, 0},      {EDS_SREC_TOUCH, 1}, {EDS_SREC_GENERIC, 0},
       {EDS_INTEL_HEX, 1},     {EDS_AIROFLASH, 2},  {EDS_SCALAR_RTDISP, 5},
@@ -142,7 +136,6 @@ TEST_F(DeviceInterfaceBase, CommandRetriesFollowTheirOwnTable) {
   mDevice.onWrite = [](std::vector<uint8_t>&) { return false; };
   mDevice.onRead = [](std::vector<uint8_t>&) { return false; };
   const std::vector<uint8_t> data(16, 0xAB);
-  std::vector<uint8_t> out;
   const struct {
     const char* command;
     std::function<bool()> run;
@@ -150,9 +143,7 @@ TEST_F(DeviceInterfaceBase, CommandRetriesFollowTheirOwnTable) {
     int ownReopens;  // each with half a second of its own
   } cases[] = {{"erase", [&] { return mDevice.FLProtEraseBlock(1); }, 5, 0},
                {"write block", [&] { return mDevice.FLProtWriteBlock(data, 0x1000); }, 5, 4},
-               {"write word", [&] { return mDevice.FLProtWriteWord(data, 0x1000); }, 5, 0},
-               {"set read address", [&] { return mDevice.FLProtSetReadAddr(0x1000); }, 1, 0},
-               {"read data", [&] { return mDevice.FLProtReadData(out, 3); }, 5, 4}};
+               {"write word", [&] { return mDevice.FLProtWriteWord(data, 0x1000); }, 5, 0}};
   for (const auto& c : cases) {
     mDevice.writes.clear();
     mDevice.reads.clear();
@@ -165,7 +156,6 @@ TEST_F(DeviceInterfaceBase, CommandRetriesFollowTheirOwnTable) {
         << c.command;
   }
   EXPECT_EQ(mNotifier.errors.front(), "Failed erasing block from device");
-  EXPECT_EQ(mNotifier.errors.back(), "Failed reading from device");
 }
 
 TEST_F(DeviceInterfaceBase, CommandsNeedAnOpenLoaderAndTheirSizes) {
@@ -177,16 +167,10 @@ TEST_F(DeviceInterfaceBase, CommandsNeedAnOpenLoaderAndTheirSizes) {
   EXPECT_TRUE(mDevice.writes.empty()) << "unsupported checksums send nothing";
 
   // Sizes of 0 refuse before the wire.
-  std::vector<uint8_t> out;
-  EXPECT_FALSE(mDevice.FLProtReadData(out, 1));
   EXPECT_FALSE(mDevice.FLProtWriteBlock(std::vector<uint8_t>(16), 0));
   EXPECT_FALSE(mDevice.FLProtWriteWord(std::vector<uint8_t>(16), 0));
   BL_HID_REP_GET_FLASH_DESCRIPTOR descriptor;
   EXPECT_FALSE(mDevice.FLProtGetFlashDescriptor(descriptor));
-  BL_HID_REP_GET_BL_PARAMETERS params;
-  params.readSize = 4;
-  mDevice.SetParams(params);
-  EXPECT_FALSE(mDevice.FLProtReadData(out, 0));
   EXPECT_TRUE(mDevice.reads.empty());
 
   // Not in loader mode: nothing is sent.
@@ -204,23 +188,7 @@ TEST_F(DeviceInterfaceBase, CommandsNeedAnOpenLoaderAndTheirSizes) {
 // The commands no programming run sends. The ids and layouts of the others
 // are checked by the lab's loader, which decodes them on its own, in
 // SRecProgrammingTest.
-TEST_F(DeviceInterfaceBase, ReadingFlashResetsAndTheCpuSetOnTheWire) {
-  BL_HID_REP_GET_BL_PARAMETERS params;
-  params.readSize = 4;
-  mDevice.SetParams(params);
-  uint8_t next = 0;
-  mDevice.onRead = [&](std::vector<uint8_t>& report_IO) {
-    for (size_t i = 5; i < report_IO.size(); ++i) report_IO[i] = next++;
-    return true;
-  };
-  // Set the address once, then each repeat reuses it.
-  ASSERT_TRUE(mDevice.FLProtSetReadAddr(0x08001234));
-  std::vector<uint8_t> data{0xEE};
-  ASSERT_TRUE(mDevice.FLProtReadData(data, 2));
-  EXPECT_EQ(data, (std::vector<uint8_t>{0xEE, 0, 1, 2, 3, 4, 5, 6, 7}));
-  ASSERT_EQ(mDevice.reads.size(), 2u);
-  EXPECT_EQ(mDevice.reads[0], (std::vector<uint8_t>{0x10, 0, 0, 0, 0, 0, 0, 0, 0}));
-
+TEST_F(DeviceInterfaceBase, ResetsAndTheCpuSetOnTheWire) {
   // Only multi-CPU loaders, which the lab runs do not use, get a CPU set.
   for (EFLProtocolType protocol : {EFL_PROTOCOL_LOADER, EFL_PROTOCOL_NON_BL}) {
     CFLProtocol::GetInstance()->SetProtocolType(protocol);
@@ -229,8 +197,7 @@ TEST_F(DeviceInterfaceBase, ReadingFlashResetsAndTheCpuSetOnTheWire) {
     ASSERT_TRUE(mDevice.FLProtSetCurrentCPU(1));
   }
   CFLProtocol::GetInstance()->SetProtocolType(EFL_PROTOCOL_LOADER);
-  EXPECT_EQ(mDevice.writes, (std::vector<std::vector<uint8_t>>{{0x13, 0x34, 0x12, 0x00, 0x08},
-                                                               {0x15, 0xA6, 0x50},
+  EXPECT_EQ(mDevice.writes, (std::vector<std::vector<uint8_t>>{{0x15, 0xA6, 0x50},
                                                                {0x15, 0x01, 0, 0, 0},
                                                                {0x20, 0x01, 0x00},
                                                                {0xCD, 0xA6, 0x50},

@@ -91,15 +91,6 @@ TEST_F(RealBinary, UpdatesThePenThroughItsLoaderAndBack) {
   for (const std::string& violation : mPen->GetViolations()) ADD_FAILURE() << violation;
 }
 
-TEST_F(RealBinary, ListsTheTabletWithThePenItFoundThroughUdev) {
-  std::string output;
-  EXPECT_EQ(Run(output, {"--list"}), 0) << output;
-  EXPECT_NE(output.find("Lab Classic Tablet, in normal mode"), std::string::npos) << output;
-  EXPECT_NE(output.find("pen        HID   31325:769:17891328:1:65280         1.20"),
-            std::string::npos)
-      << output;
-}
-
 TEST_F(RealBinary, APenPulledMidUpdateFailsWithItsMessage) {
   // Gone from the bus, and so from sysfs, at its 100th report: in its loader,
   // with blocks erased.

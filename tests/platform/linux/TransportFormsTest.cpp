@@ -113,9 +113,7 @@ TEST_F(I2CTransport, TunnelWriteFramingAndItsLimit) {
   // An echo of another id, a refusal, a foreign reply: all false.
   Bytes small{0x1C, 0, 0, 0, 0};
   mReplies = {WriteStatus(0xF2, 0x1D), WriteStatus(0xF3, 0x1C), {0xB1, 0xF2, 0, 0, 0, 0x1C}};
-  EXPECT_FALSE(mInterface->Write(small));
-  EXPECT_FALSE(mInterface->Write(small));
-  EXPECT_FALSE(mInterface->Write(small));
+  for (int reply = 0; reply < 3; ++reply) EXPECT_FALSE(mInterface->Write(small)) << reply;
   mReplies = {WriteStatus(0xF0, 0)};
   EXPECT_TRUE(mInterface->Write(small));
 }
@@ -204,20 +202,15 @@ class HeldUsbControl : public CLabUsbControl {
 };
 
 TEST_F(BulkTransport, AHeldInterfaceIsWaitedForUpToFifteenMoreTries) {
-  auto held = std::make_unique<HeldUsbControl>(mBus, 15);
-  HeldUsbControl* usb = held.get();
-  CLinuxBulkFLDeviceInterface patient(Listed(*mTouch), std::move(held));
-  EXPECT_TRUE(patient.Open());
-  EXPECT_EQ(usb->claims, 16);
-  EXPECT_NEAR(mClock->GetTotalSlept(), 30.0, 1e-9);
-  patient.Close();
-
-  auto forever = std::make_unique<HeldUsbControl>(mBus, 100);
-  HeldUsbControl* stuck = forever.get();
-  CLinuxBulkFLDeviceInterface refused(Listed(*mTouch), std::move(forever));
-  EXPECT_FALSE(refused.Open());
-  EXPECT_EQ(stuck->claims, 16);
-  EXPECT_FALSE(stuck->IsOpen());
+  for (const auto& [busyClaims, opens] : {std::pair{15, true}, std::pair{100, false}}) {
+    auto held = std::make_unique<HeldUsbControl>(mBus, busyClaims);
+    HeldUsbControl* usb = held.get();
+    CLinuxBulkFLDeviceInterface interface(Listed(*mTouch), std::move(held));
+    EXPECT_EQ(interface.Open(), opens) << busyClaims;
+    EXPECT_EQ(usb->claims, 16);
+    EXPECT_EQ(usb->IsOpen(), opens);
+  }
+  EXPECT_NEAR(mClock->GetTotalSlept(), 2 * 30.0, 1e-9);
 }
 
 }  // namespace
