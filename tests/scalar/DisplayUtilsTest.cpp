@@ -3,7 +3,6 @@
 #include <tuple>
 
 #include "scalar/DisplayUtils.h"
-#include "scalar/HelperUtils.h"
 
 namespace {
 
@@ -68,31 +67,6 @@ TEST_F(DisplayUtilsTest, ListsTheFamilysDisplaysFromTheirEDIDOrWhatTheStackKnows
   EXPECT_TRUE(DisplayUtils::TavikDisplayAttributesWithPID(0x0999).empty());
   DisplayUtils::SetDisplays(nullptr);
   EXPECT_TRUE(DisplayUtils::TavikDisplayAttributes().empty());
-}
-
-TEST_F(DisplayUtilsTest, ADisplayWithoutEDIDGetsABlockTheSearchesRead) {
-  // name, serial, name read back, serial read back
-  // clang-format off
-  const std::vector<std::tuple<std::string, std::string, std::string, std::string>> rows = {
-      {"Pen 24", "NOEDID7", "Pen 24", "NOEDID7"},
-      {"", "", "-", "0"},
-      {"Fifteen chars!!", "S1", "Fifteen chars!!", ""},  // the name runs over the serial's tag
-  };
-  // clang-format on
-  for (const auto& [name, serial, nameBack, serialBack] : rows) {
-    SCOPED_TRACE(name);
-    mDisplays.displays[2].productName = name;
-    mDisplays.displays[2].serialNumber = serial;
-    const Bytes block = DisplayUtils::CreateEDIDOfDisplayID(2);
-    ASSERT_EQ(block.size(), 255u);
-    EXPECT_EQ(Bytes(block.begin(), block.begin() + 8),
-              (Bytes{0x00, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0x00}));
-    EXPECT_EQ(PosOfPatternInBuffer(block, HelperUtils::kMonitorNamePattern), 91);
-    EXPECT_EQ(ExtractMonitorName(block), nameBack);
-    EXPECT_EQ(ExtractSerialNumber(block), serialBack);
-  }
-  EXPECT_EQ(DisplayUtils::CreateEDIDOfDisplayID(0), mDisplays.displays[0].edid);
-  EXPECT_TRUE(DisplayUtils::CreateEDIDOfDisplayID(4).empty());
 }
 
 }  // namespace
