@@ -31,6 +31,10 @@ using Strings = std::vector<std::string>;
 const std::string kAgent = "com.tavik.taviktablet";
 const std::string kDriver = "com.tavik.TabletDriver";
 const std::string kTouch = "com.tavik.TavikTouchDriver";
+// The agent's two configured units, stopped and then started.
+const Strings kStopAndStartJobs = {
+    "StopUnit tavik-test-driver.service replace", "StopUnit tavik-test-tray.service replace",
+    "StartUnit tavik-test-driver.service replace", "StartUnit tavik-test-tray.service replace"};
 
 class CFakePolkit {
  public:
@@ -215,10 +219,7 @@ TEST_F(UpdateHelper, AnAuthorisedCallerStopsAndStartsTheConfiguredUnitsAndProces
   EXPECT_EQ(EndingSignal(driver), SIGTERM);
   EXPECT_EQ(Ask("startLaunchDProcess:withReply:", &processes).Code(), 0);
 
-  EXPECT_EQ(mSystemd.Jobs(), (Strings{"StopUnit tavik-test-driver.service replace",
-                                      "StopUnit tavik-test-tray.service replace",
-                                      "StartUnit tavik-test-driver.service replace",
-                                      "StartUnit tavik-test-tray.service replace"}));
+  EXPECT_EQ(mSystemd.Jobs(), kStopAndStartJobs);
   const std::string question =
       std::string("system-bus-name ") + CPolkitAuthority::kActionId + " unique";
   EXPECT_EQ(mPolkit.Questions(), Strings(3, question));
@@ -396,10 +397,7 @@ TEST(UpdateHelperInstalled, StartedByTheBusItStopsAndRestartsTheDriverForTheClie
     client->startLaunchDProcess(OUpdaterClient::Request{
         {"LaunchAgents", {kAgent}}, {"User", {"1000"}}, {"BundleID", {kAgent, kTouch, kDriver}}});
     TavPollUntil(5.0, 0.01, [&] { return systemd.Jobs().size() >= 4; });
-    EXPECT_EQ(systemd.Jobs(), (Strings{"StopUnit tavik-test-driver.service replace",
-                                       "StopUnit tavik-test-tray.service replace",
-                                       "StartUnit tavik-test-driver.service replace",
-                                       "StartUnit tavik-test-tray.service replace"}));
+    EXPECT_EQ(systemd.Jobs(), kStopAndStartJobs);
     OXPCClient::SetServiceDirectory(OXPCClient::kPrivileged, nullptr);
   }
   std::error_code ignored;

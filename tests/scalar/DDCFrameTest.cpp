@@ -3,7 +3,6 @@
 #include <tuple>
 
 #include "scalar/DDCFrame.h"
-#include "scalar/SensorFamilies.h"
 
 namespace {
 
@@ -54,38 +53,6 @@ TEST(DDCFrame, AReplyIsGoodWhenItsSumSeededWith0x50IsZero) {
   };
   // clang-format on
   for (const auto& [reply, good] : rows) EXPECT_EQ(DDCFrame::IsChecksumGood(reply), good);
-  EXPECT_EQ(DDCFrame::Checksum({}, 0x50), 0x50);
-}
-
-TEST(SensorFamilies, PredicatesTellTheBoardFamilies) {
-  // id, Venus, Brodick 13, Brodick 16, GreyOwl, 16R, 24
-  // clang-format off
-  const std::vector<std::tuple<SENSOR_ID, bool, bool, bool, bool, bool, bool>> rows = {
-      {0x7A5D0390, true, false, false, false, false, false},
-      {0x7A5D03B0, true, false, false, false, false, false},
-      {0x7A5D034D, false, true, false, false, false, false},
-      {0x7A5D039A, false, true, false, false, false, false},
-      {0x7A5D03AC, false, false, true, false, false, false},
-      {0x7A5D039B, false, false, true, false, false, false},
-      {0x7A5D0353, false, false, false, true, false, false},
-      {0x7A5D037C, false, false, false, true, false, false},
-      {0x7A5D0355, false, false, false, true, false, true},
-      {0x7A5D0356, false, false, false, true, false, false},
-      {0x7A5D03B2, false, false, false, false, true, false},  // a GreyOwl, not of the family test
-      {0x12340390, false, false, false, false, false, false},  // another vendor's product half
-      {-1, false, false, false, false, false, false},
-  };
-  // clang-format on
-  for (const auto& [sid, venus, brodick13, brodick16, greyowl, greyowl16r, greyowl24] : rows) {
-    SCOPED_TRACE(sid);
-    EXPECT_EQ(IS_VENUS(sid), venus);
-    EXPECT_EQ(IS_BRODICK_13(sid), brodick13);
-    EXPECT_EQ(IS_BRODICK_16(sid), brodick16);
-    EXPECT_EQ(IS_BRODICK(sid), brodick13 || brodick16);
-    EXPECT_EQ(IS_GREYOWL(sid), greyowl);
-    EXPECT_EQ(IS_GREYOWL_16R(sid), greyowl16r);
-    EXPECT_EQ(IS_GREYOWL_24(sid), greyowl24);
-  }
 }
 
 }  // namespace

@@ -267,15 +267,17 @@ TEST_F(Application, TerminalRunReportsEveryBoardAndCountsEachOne) {
                    T("Result: no supported tablet is connected.")}));
 }
 
-TEST_F(Application, AWindowRunWithoutABoardLeavesBoardAndFileToTheUser) {
+TEST_F(Application, ARunWithoutABoardOptionWaitsForTheUserOrEndsWithTheUsageStatus) {
   AttachPen();
-  FLAppDelegate& window = Make({}, /*terminal=*/false);
-  RunToTheEnd(window);
-  // The full dialog: nothing is asked or programmed until the user acts.
-  EXPECT_FALSE(OFLUpdater::updater()->isCommandLine());
-  EXPECT_FALSE(mWindow.mCalls.Has("ask"));
-  EXPECT_FALSE(mJournal.Has("pen.ProgramBoard"));
-  EXPECT_FALSE(window.HasTerminated());
+  for (const bool terminal : {false, true}) {
+    SCOPED_TRACE(terminal ? "terminal" : "window");
+    FLAppDelegate& app = Make({}, terminal);
+    RunToTheEnd(app);
+    // A window leaves board and file to the user; a terminal has nobody to ask.
+    EXPECT_FALSE(mJournal.Has("pen.ProgramBoard"));
+    EXPECT_EQ(app.HasTerminated(), terminal);
+    EXPECT_EQ(mExitStatus, terminal ? ERUN_USAGE : -100);
+  }
 }
 
 TEST_F(Application, WatchThatCannotBeSetUpEndsTheRunOnARealMainLoop) {
