@@ -7,6 +7,7 @@
 #include <tuple>
 
 #include "scalar/DisplayUtils.h"
+#include "scalar/HelperUtils.h"
 
 namespace {
 
@@ -33,6 +34,34 @@ TEST(DisplayUtilsTest, ADisplayWithoutEDIDIsKnownByWhatTheStackTellsOfIt) {
   EXPECT_EQ(DisplayUtils::TavikDisplayAttributes().size(), 2u) << "a cut EDID is no EDID";
   DisplayUtils::SetDisplays(nullptr);
   EXPECT_TRUE(DisplayUtils::TavikDisplayAttributes().empty());
+}
+
+// The block made for a display whose system gives no EDID must read back
+// through the same searches as a real one.
+TEST(DisplayUtilsTest, ADisplayWithoutEDIDGetsABlockTheSearchesRead) {
+  // name, serial, name read back, serial read back
+  const std::vector<std::tuple<std::string, std::string, std::string, std::string>> rows = {
+      {"Pen 24", "NOEDID7", "Pen 24", "NOEDID7"},
+      {"", "", "-", "0"},
+      {"Fifteen chars!!", "S1", "Fifteen chars!!", ""},  // the name runs over the serial's tag
+  };
+  for (const auto& [name, serial, nameBack, serialBack] : rows) {
+    SCOPED_TRACE(name);
+    CListedDisplays displays;
+    displays.displays = {{"with-edid", {0x00, 0xFF, 0x01}, 0x5B27, 0x0391, "A", ""},
+                         {"without", {}, 0x5B27, 0x0391, serial, name}};
+    DisplayUtils::SetDisplays(&displays);
+    const std::vector<uint8_t> block = DisplayUtils::CreateEDIDOfDisplayID(1);
+    ASSERT_EQ(block.size(), 255u);
+    EXPECT_EQ(std::vector<uint8_t>(block.begin(), block.begin() + 8),
+              (std::vector<uint8_t>{0x00, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0xFF, 0x00}));
+    EXPECT_EQ(PosOfPatternInBuffer(block, HelperUtils::kMonitorNamePattern), 91);
+    EXPECT_EQ(ExtractMonitorName(block), nameBack);
+    EXPECT_EQ(ExtractSerialNumber(block), serialBack);
+    EXPECT_EQ(DisplayUtils::CreateEDIDOfDisplayID(0), displays.displays[0].edid);
+    EXPECT_TRUE(DisplayUtils::CreateEDIDOfDisplayID(4).empty());
+    DisplayUtils::SetDisplays(nullptr);
+  }
 }
 
 }  // namespace

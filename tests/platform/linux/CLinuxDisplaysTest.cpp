@@ -9,6 +9,7 @@
 #include "lab/LabEdid.h"
 #include "platform/linux/CEmulatedUsbBus.h"
 #include "platform/linux/CLinuxDisplays.h"
+#include "scalar/DisplayUtils.h"
 
 namespace {
 
@@ -62,6 +63,17 @@ TEST_F(LinuxDisplays, ConnectedConnectorsInNameOrderWithTheirEdids) {
     EXPECT_EQ(displays[i].edid, expected[i].edid) << expected[i].connector;
     EXPECT_EQ(displays[i].manufacturerId, 0) << "nothing known beyond the EDID";
   }
+
+  // Display identification finds the family's two by their EDIDs.
+  const CLinuxDisplays source;
+  DisplayUtils::SetDisplays(&source);
+  std::vector<std::string> serials;
+  for (const auto& entry : DisplayUtils::TavikDisplayAttributesWithPID(0x1061)) {
+    serials.push_back(entry->StringForKeyWithDefault("AlphanumericSerialNumber", "?"));
+  }
+  EXPECT_EQ(DisplayUtils::TavikDisplayAttributes().size(), 2u);
+  DisplayUtils::SetDisplays(nullptr);
+  EXPECT_EQ(serials, std::vector<std::string>{"LABFQ0711"});
 }
 
 TEST_F(LinuxDisplays, NoDrmDriverGivesNoDisplays) { EXPECT_TRUE(CLinuxDisplays().List().empty()); }
