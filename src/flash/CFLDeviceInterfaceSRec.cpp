@@ -31,6 +31,9 @@ uint32_t ImageWord(const std::vector<uint8_t>& image_I, uint32_t offset_I) {
   return word;
 }
 
+// Words, the last one possibly short, in `bytes_I` bytes.
+uint32_t WordCount(uint32_t bytes_I) { return bytes_I / 4 + (bytes_I % 4 != 0); }
+
 }  // namespace
 
 bool CFLDeviceInterface::InitFlashVector() {
@@ -98,10 +101,9 @@ bool CFLDeviceInterface::LoadSRecData(const std::vector<SContinuousDataBlock>& d
     // only where data was copied in: a loader may describe blocks of 16 MiB.
     const std::vector<uint8_t>& bytes = block.BlockData();
     const auto written = [](uint8_t byte_I) { return byte_I < 0xFF; };
-    const size_t copiedTo = std::min<size_t>(block.GetCopiedTo(), bytes.size());
-    const size_t copiedFrom = std::min<size_t>(block.GetCopiedFrom(), copiedTo);
-    const auto spanEnd = bytes.begin() + static_cast<std::ptrdiff_t>(copiedTo);
-    const auto spanBegin = bytes.begin() + static_cast<std::ptrdiff_t>(copiedFrom);
+    const FLASH_BLOCK::Span copied = block.GetCopiedSpan();
+    const auto spanEnd = bytes.begin() + copied.to;
+    const auto spanBegin = bytes.begin() + copied.from;
     const auto first = std::find_if(spanBegin, spanEnd, written);
     if (first != spanEnd) {
       uint32_t start = static_cast<uint32_t>(first - bytes.begin()) / word * word;
@@ -157,11 +159,12 @@ bool CFLDeviceInterface::CalculateChecksums() {
     if (mChecksumsSupported) mOldChecksum += device.checksums[i];
     const uint32_t start = block.GetWriteStartOffset();
     const uint32_t end = start + block.GetWriteSize();
-    for (uint32_t offset = 0; offset < start; offset += 4) mFWChecksum -= 1;
+    // Counted, not walked: a loader may describe blocks of 16 MiB.
+    const uint32_t blankAfter = block.GetSize() > end ? block.GetSize() - end : 0;
+    mFWChecksum -= WordCount(start) + WordCount(blankAfter);
     for (uint32_t offset = start; offset < end; offset += 4) {
       mFWChecksum += ImageWord(block.BlockData(), offset);
     }
-    for (uint32_t offset = end; offset < block.GetSize(); offset += 4) mFWChecksum -= 1;
   }
   ReportLog(message);
   return true;

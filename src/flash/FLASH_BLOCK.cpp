@@ -27,9 +27,13 @@ void FLASH_BLOCK::CopyIn(uint32_t offset_I, const uint8_t* data_I, uint32_t coun
   mCopiedTo = std::max(mCopiedTo, offset_I + count_I);
 }
 
-uint32_t FLASH_BLOCK::GetImageSum() const {
+FLASH_BLOCK::Span FLASH_BLOCK::GetCopiedSpan() const {
   const uint32_t to = std::min<uint32_t>(mCopiedTo, static_cast<uint32_t>(mBlockData.size()));
-  const uint32_t from = std::min(mCopiedFrom, to);
+  return {std::min(mCopiedFrom, to), to};
+}
+
+uint32_t FLASH_BLOCK::GetImageSum() const {
+  const auto [from, to] = GetCopiedSpan();
   const uint32_t copied = std::accumulate(mBlockData.begin() + from, mBlockData.begin() + to,
                                           uint32_t{0});
   // Wraps as a byte-by-byte sum would.

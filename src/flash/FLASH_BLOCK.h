@@ -34,10 +34,13 @@ class FLASH_BLOCK {
   // Copies `count_I` bytes to `offset_I` of the image; the image must
   // already hold the block's size and the range must lie inside it.
   void CopyIn(uint32_t offset_I, const uint8_t* data_I, uint32_t count_I);
-  // The offsets from which and up to which data was copied in; outside them
-  // the image is blank. From is past to while nothing was copied.
-  uint32_t GetCopiedFrom() const { return mCopiedFrom; }
-  uint32_t GetCopiedTo() const { return mCopiedTo; }
+  // The part of the image that data was copied into, [from, to); outside
+  // it the image is blank. Empty while nothing was copied.
+  struct Span {
+    uint32_t from;
+    uint32_t to;
+  };
+  Span GetCopiedSpan() const;
   // The 32-bit sum of the image's bytes, counting the blank rest without
   // reading it: a loader may describe blocks of many MiB.
   uint32_t GetImageSum() const;

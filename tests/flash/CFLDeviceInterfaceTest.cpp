@@ -231,6 +231,18 @@ TEST_F(DeviceInterfaceBase, AProtectedBlockWithDataIsNeitherErasedNorSummed) {
   EXPECT_EQ(mDevice.GetFWChecksum(), expected);
 }
 
+TEST_F(DeviceInterfaceBase, BlankBytesOffTheFourByteGridCountAsWholeWords) {
+  mDevice.SetDataSourceFormat(EDS_SREC_GENERIC);
+  // One block of 0x12 bytes with 2-byte words: six blank bytes, one word
+  // of data, ten blank bytes.
+  mDevice.SetLayout(0x1000, 0x12, 1, 2, 0x10);
+  ASSERT_TRUE(mDevice.InitFlashVector());
+  ASSERT_TRUE(mDevice.LoadSRecData({Filled(0x1006, 2, 0x11)}));
+  ASSERT_TRUE(mDevice.ProgramBoardSRec());
+  // Two words before, the data word read on past its end, three after.
+  EXPECT_EQ(mDevice.GetFWChecksum(), 0xFFFF1111u - 2 - 3);
+}
+
 TEST_F(DeviceInterfaceBase, ABrokenDescriptorIsRefused) {
   LogCapture capture;
   mDevice.SetLayout(0x1000, 32u << 20, 2, 4, 0x100);
