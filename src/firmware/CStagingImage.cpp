@@ -38,6 +38,7 @@ CStagingImage::SPage& CStagingImage::MakePage(uint64_t key_I) {
     mNotes = MapAligned(mNotesMapped, kPageSize);
     madvise(mNotes, mNotesMapped, MADV_HUGEPAGE);
   }
+  mKeysMade.push_back(static_cast<uint32_t>(key_I));
   page.staged = reinterpret_cast<uint64_t*>(mNotes + mPagesMade++ * kStagedBytes);
   page.data = MapAligned(kPageSize, kPageSize);
   // Only a wish: without huge pages the page is taken 4 KiB at a time.
@@ -80,7 +81,7 @@ void CStagingImage::ForgetStaged() {
 }
 
 void CStagingImage::ForgetStagedNotes() {
-  for (uint64_t key = 0; key < kPageCount; ++key) mPages[key].staged = nullptr;
+  for (const uint32_t key : mKeysMade) mPages[key].staged = nullptr;
   if (mNotes != nullptr) munmap(mNotes, mNotesMapped);
   mNotes = nullptr;
   mNotesMapped = 0;
@@ -111,8 +112,9 @@ void CStagingImage::ReleaseBelow(uint64_t address_I) {
 }
 
 void CStagingImage::Clear() {
-  for (uint64_t key = 0; key < kPageCount; ++key) ReleasePage(mPages[key]);
+  for (const uint32_t key : mKeysMade) ReleasePage(mPages[key]);
   ForgetStagedNotes();
+  mKeysMade.clear();
   mReleasedKeys = 0;
   mPlacing = true;
 }

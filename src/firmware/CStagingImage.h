@@ -78,5 +78,8 @@ class CStagingImage {
   uint64_t mBudget = 0;
   uint64_t mPagesTaken = 0;
   uint64_t mReleasedKeys = 0;  // pages below this one are given back
+  // The pages made since the last clear: clearing visits these, not all
+  // 2048 slots, for a file that touched a few.
+  std::vector<uint32_t> mKeysMade;
   bool mPlacing = true;
 };

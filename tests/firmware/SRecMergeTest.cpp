@@ -85,7 +85,8 @@ void ExpectSameAsTheWalk(const CRecords& records_I, const CTempFolder& folder_I)
     text += SRecLine('3', record.startAddress, record.data) + "\n";
   const auto [blocks, overlapPair] = ReferenceMerge(records_I);
   LogCapture capture;
-  CSRec source;
+  // One reader for every round: each load starts from what the last left.
+  static CSRec source;
   const bool loaded = source.Load(folder_I.Write("merge.tav", text), EHID_INTERFACE);
   EXPECT_EQ(loaded, overlapPair == 0);
   EXPECT_EQ(source.GetSRecData(), blocks);
