@@ -2,6 +2,7 @@
 
 #include <atomic>
 #include <cstdio>
+#include <cstring>
 #include <mutex>
 #include <vector>
 
@@ -74,18 +75,21 @@ std::string FormatWithLevel(int level_I, const char* format_I) {
   return result;
 }
 
+// The line state follows every call, output attached or not: only a
+// line's first part gets the tag.
 void Debug(const char* format_I, ...) {
-  va_list args;
-  va_start(args, format_I);
-  if (gLogNewLine) {
-    PassToSink(eDebug, FormatWithLevel(eDebug, format_I), args);
-  } else {
-    PassToSink(eDebug, format_I == nullptr ? std::string() : std::string(format_I), args);
+  if (Outputs().mCount.load() != 0) {
+    va_list args;
+    va_start(args, format_I);
+    if (gLogNewLine) {
+      PassToSink(eDebug, FormatWithLevel(eDebug, format_I), args);
+    } else {
+      PassToSink(eDebug, format_I == nullptr ? std::string() : std::string(format_I), args);
+    }
+    va_end(args);
   }
-  va_end(args);
   if (format_I != nullptr && format_I[0] != '\0') {
-    const std::string text(format_I);
-    gLogNewLine = text.back() == '\n';
+    gLogNewLine = format_I[std::strlen(format_I) - 1] == '\n';
   }
 }
 
