@@ -3,6 +3,8 @@
 
 #include "flash/CFLDeviceInterface.h"
 
+#include <numeric>
+
 #include "common/CClock.h"
 #include "common/TavAssert.h"
 #include "common/TavLog.h"
@@ -287,9 +289,7 @@ void CFLDeviceInterface::DumpCmd(std::vector<uint8_t> data_I) {
 }
 
 uint32_t CFLDeviceInterface::CalculateBlockChecksum(const std::vector<uint8_t>& data_I) {
-  uint32_t sum = 0;
-  for (uint8_t byte : data_I) sum += byte;
-  return sum;
+  return std::accumulate(data_I.data(), data_I.data() + data_I.size(), uint32_t{0});
 }
 
 bool CFLDeviceInterface::SafeRead(std::vector<uint8_t>& data_IO) {
