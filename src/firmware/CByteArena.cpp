@@ -1,8 +1,6 @@
 #include "firmware/CByteArena.h"
 
-#include <sys/mman.h>
-
-#include <new>
+#include "common/SystemMemory.h"
 
 CByteArena::~CByteArena() { Clear(); }
 
@@ -10,10 +8,7 @@ uint8_t* CByteArena::Append(size_t size_I) {
   if (mChunks.empty() || mChunks.back().mapped - mChunks.back().used < size_I) {
     SChunk chunk;
     chunk.mapped = size_I > kChunkSize ? size_I : kChunkSize;
-    void* base =
-        mmap(nullptr, chunk.mapped, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
-    if (base == MAP_FAILED) throw std::bad_alloc();
-    chunk.base = static_cast<uint8_t*>(base);
+    chunk.base = SystemMemory::Map(chunk.mapped);
     mChunks.push_back(chunk);
   }
   SChunk& chunk = mChunks.back();
@@ -44,6 +39,6 @@ void CByteArena::Clear() {
 }
 
 void CByteArena::Release(SChunk& chunk_IO) {
-  if (chunk_IO.base != nullptr) munmap(chunk_IO.base, chunk_IO.mapped);
+  SystemMemory::Unmap(chunk_IO.base, chunk_IO.mapped);
   chunk_IO = SChunk{};
 }

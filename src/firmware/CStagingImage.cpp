@@ -1,29 +1,9 @@
 #include "firmware/CStagingImage.h"
 
-#include <sys/mman.h>
-
 #include <algorithm>
 #include <cstring>
-#include <new>
 
-namespace {
-
-// Memory straight from the system, so that what is given back leaves the
-// process at once; aligned to its size when asked.
-uint8_t* MapAligned(size_t size_I, size_t alignment_I) {
-  const size_t mapped = size_I + alignment_I;
-  void* base = mmap(nullptr, mapped, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
-  if (base == MAP_FAILED) throw std::bad_alloc();
-  const auto address = reinterpret_cast<uintptr_t>(base);
-  const uintptr_t aligned = (address + alignment_I - 1) & ~(uintptr_t{alignment_I} - 1);
-  if (aligned > address) munmap(base, aligned - address);
-  if (aligned + size_I < address + mapped) {
-    munmap(reinterpret_cast<void*>(aligned + size_I), address + mapped - aligned - size_I);
-  }
-  return reinterpret_cast<uint8_t*>(aligned);
-}
-
-}  // namespace
+#include "common/SystemMemory.h"
 
 CStagingImage::~CStagingImage() { Clear(); }
 
@@ -35,14 +15,13 @@ CStagingImage::SPage& CStagingImage::MakePage(uint64_t key_I) {
     const uint64_t pages = std::min(mBudget / kPageSize, kPageCount);
     const size_t most = static_cast<size_t>(pages) * kStagedBytes;
     mNotesMapped = (most + kPageSize - 1) & ~(kPageSize - 1);
-    mNotes = MapAligned(mNotesMapped, kPageSize);
-    madvise(mNotes, mNotesMapped, MADV_HUGEPAGE);
+    mNotes = SystemMemory::Map(mNotesMapped, kPageSize);
+    SystemMemory::PreferHugePages(mNotes, mNotesMapped);
   }
   mKeysMade.push_back(static_cast<uint32_t>(key_I));
   page.staged = reinterpret_cast<uint64_t*>(mNotes + mPagesMade++ * kStagedBytes);
-  page.data = MapAligned(kPageSize, kPageSize);
-  // Only a wish: without huge pages the page is taken 4 KiB at a time.
-  madvise(page.data, kPageSize, MADV_HUGEPAGE);
+  page.data = SystemMemory::Map(kPageSize, kPageSize);
+  SystemMemory::PreferHugePages(page.data, kPageSize);
   ++mPagesTaken;
   return page;
 }
@@ -82,7 +61,7 @@ void CStagingImage::ForgetStaged() {
 
 void CStagingImage::ForgetStagedNotes() {
   for (const uint32_t key : mKeysMade) mPages[key].staged = nullptr;
-  if (mNotes != nullptr) munmap(mNotes, mNotesMapped);
+  SystemMemory::Unmap(mNotes, mNotesMapped);
   mNotes = nullptr;
   mNotesMapped = 0;
   mPagesMade = 0;
@@ -121,7 +100,7 @@ void CStagingImage::Clear() {
 
 void CStagingImage::ReleasePage(SPage& page_IO) {
   if (page_IO.data != nullptr) {
-    munmap(page_IO.data, kPageSize);
+    SystemMemory::Unmap(page_IO.data, kPageSize);
     --mPagesTaken;
   }
   page_IO.data = nullptr;
