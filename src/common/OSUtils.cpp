@@ -1,5 +1,8 @@
 #include "common/OSUtils.h"
 
+#include <syslog.h>
+#include <unistd.h>
+
 #include <chrono>
 #include <condition_variable>
 #include <exception>
@@ -80,6 +83,11 @@ uint64_t CurrentTimeInMicroseconds() {
   const auto sinceOrigin = std::chrono::steady_clock::now().time_since_epoch();
   return static_cast<uint64_t>(
       std::chrono::duration_cast<std::chrono::microseconds>(sinceOrigin).count());
+}
+
+bool HasSystemLog() {
+  static const bool present = ::access(_PATH_LOG, W_OK) == 0;
+  return present;
 }
 
 }  // namespace OSUtils

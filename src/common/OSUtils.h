@@ -32,4 +32,9 @@ FileVersion GetVersionFromVersNumber(unsigned int number_I);
 // Microseconds of the steady clock, from an arbitrary origin.
 uint64_t CurrentTimeInMicroseconds();
 
+// Whether the system log has a socket to write to. Where it has none (a
+// container, say), syslog drops each line after a failed connect of its own:
+// thousands of them in a scalar update. Looked for once.
+bool HasSystemLog();
+
 }  // namespace OSUtils

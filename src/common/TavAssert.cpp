@@ -8,6 +8,8 @@
 #include <mutex>
 #include <vector>
 
+#include "common/OSUtils.h"
+
 namespace {
 
 struct SObservers {
@@ -32,7 +34,7 @@ void __TAVASSERT(const char* text_I, const char* file_I, int line_I) {
 
   if (isatty(STDERR_FILENO)) {
     std::fprintf(stderr, "[E] %s:%u: failed assertion: %s\n", base, line, text);
-  } else {
+  } else if (OSUtils::HasSystemLog()) {
     syslog(LOG_ERR, "[E] %s:%u: failed assertion: %s\n", base, line, text);
   }
 
