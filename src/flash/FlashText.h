@@ -9,15 +9,17 @@ namespace FlashText {
 // Hexadecimal without prefix; `width_I` digits with fill "0" when given.
 inline std::string Hex(uint32_t value_I, int width_I = 0, bool upper_I = false) {
   const char* digits = upper_I ? "0123456789ABCDEF" : "0123456789abcdef";
+  // Filled from the end, then taken in one piece: the block loop logs a line
+  // for every report it sends.
   char buffer[8];
-  int count = 0;
+  int at = 8;
   do {
-    buffer[count++] = digits[value_I & 0xF];
+    buffer[--at] = digits[value_I & 0xF];
     value_I >>= 4;
   } while (value_I != 0);
-  std::string text;
-  for (int i = count; i < width_I; ++i) text += '0';
-  while (count > 0) text += buffer[--count];
+  const int count = 8 - at;
+  std::string text(width_I > count ? width_I - count : 0, '0');
+  text.append(buffer + at, count);
   return text;
 }
 
