@@ -35,8 +35,8 @@ for target in "$BIN"/fuzz_*; do
   # A hang is a failure too: no single input may take 10 s. A fuzzed loader
   # that takes every report may describe a 16 MiB block and have it sent ten
   # times over: up to 168 million reports. Half that, a block whose tail is
-  # no whole word, took 265 s under ASan; the report budget stops a loop
-  # that would not end.
+  # no whole word, runs for over two minutes under ASan; the report budget
+  # stops a loop that would not end.
   timeout=10
   if [ "$name" = fuzz_loader_replies ]; then timeout=1200; fi
   if "$target" "$LIMIT" -timeout=$timeout -rss_limit_mb=2048 -print_final_stats=1 \
