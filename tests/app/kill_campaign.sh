@@ -11,6 +11,13 @@
 # percentage, or after a time, both drawn from the seed. Every seed is
 # printed; TAV_KILL_SEED=N repeats a campaign.
 #
+# One kill has a known end: the FTDI scalar cut off after its first flash
+# block was erased (it is programmed last) and before that block's first
+# byte was written again runs no firmware, so it gives no serial number,
+# and the program looks for a scalar by its serial number only. There the
+# second run must fail as the README says, without opening the scalar; the
+# campaign counts such kills apart.
+#
 #   tests/app/kill_campaign.sh path/to/tavik-fwupdater
 set -u
 PROGRAM="$1"
@@ -23,6 +30,7 @@ trap 'rm -rf "$WORK"' EXIT
 echo "kill campaign: seed $BASE_SEED, $SAMPLES kill points per procedure"
 failures=0
 kills=0
+unreachable=0
 
 update() {  # STATE PRODUCT FLAG VALUE [more arguments]
   local state="$1" product="$2" flag="$3" value="$4"
@@ -39,6 +47,25 @@ same_boards() {
     [ "$(basename "$file")" = desktop.state ] && continue
     cmp -s "$file" "$2/$(basename "$file")" || { echo "$(basename "$file") differs"; return 1; }
   done
+}
+
+# Whether the program no longer finds the display's scalar in a state
+# folder; asked of a copy, so that the run after the kill meets the folder
+# as the kill left it.
+scalar_lost() {
+  rm -rf "$WORK/probe" && cp -r "$1" "$WORK/probe"
+  "$PROGRAM" --list --lab display-ftdi --lab-state "$WORK/probe" |
+    awk '$1 == "scalar" && $3 == "not" { lost = 1 } END { exit !lost }'
+}
+
+# Whether the first byte of the scalar's flash is blank, read once a run
+# has ended and the lab has folded its journal into the board file, whose
+# two header lines the flash follows.
+scalar_blank() {
+  local file="$1/display-ftdi-scalar.state" at
+  [ -f "$file" ] && [ ! -s "$file.log" ] || return 1
+  at=$(head -n 2 "$file" | wc -c)
+  [ "$(od -An -tx1 -j "$at" -N 1 "$file" | tr -d ' ')" = ff ]
 }
 
 last_progress() {
@@ -104,6 +131,8 @@ for entry in "${procedures[@]}"; do
     kills=$((kills + 1))
     # What the kill left, before the next run changes it.
     ls "$state"/*.state.log >/dev/null 2>&1 && left=1 || left=""
+    lost=""
+    if [ "$name" = ftdi-scalar ] && scalar_lost "$state"; then lost=1; fi
     output="$(update "$state" "$product" "$flag" "$value" 2>&1)"
     status=$?
     what="$name, seed $seed, kill $how (progress ${killed_at:-none})"
@@ -111,6 +140,16 @@ for entry in "${procedures[@]}"; do
       [ -z "$left" ]; then
       echo "FAIL: $what: the kill left nothing of the boards in the state folder"
       failures=$((failures + 1))
+    elif [ -n "$lost" ]; then
+      if [ "$status" -eq 1 ] && [[ "$output" == *"Failed to open device and/or load data"* ]] &&
+        scalar_blank "$state"; then
+        echo "ok: $what, left without firmware: not found by its serial number, as the README says"
+        unreachable=$((unreachable + 1))
+      else
+        echo "FAIL: $what: a scalar without firmware, and the run after the kill exits $status"
+        echo "$output" | tail -5
+        failures=$((failures + 1))
+      fi
     elif [ "$status" -ne 0 ]; then
       echo "FAIL: $what: the run after the kill exits $status"; echo "$output" | tail -5
       failures=$((failures + 1))
@@ -122,5 +161,5 @@ for entry in "${procedures[@]}"; do
     fi
   done
 done
-echo "$kills kills, $failures not recovered (seed $BASE_SEED)"
+echo "$kills kills, $failures not recovered, $unreachable scalars left without firmware (seed $BASE_SEED)"
 [ "$failures" -eq 0 ]
